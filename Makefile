@@ -1,0 +1,74 @@
+# Front door of the build. Every target drives CMake in a build folder of its
+# own, so the plain, sanitizer and 32-bit builds never mix.
+#
+#   make              build (build/)
+#   make demo         run the host program on the example dump
+#   make test         build and run every test for this machine's architecture
+#   make check        the tests again under ASan+UBSan (clang) and as a 32-bit x86 build
+#   make install PREFIX=/opt/corvane   programs to PREFIX/bin, libraries to PREFIX/lib
+#   make fuzz         build the libFuzzer targets (clang) and run each for FUZZ_SECONDS
+#   make bench        build and run the benchmarks
+#   make format       clang-format every C++ source
+#   make clean
+
+PREFIX ?= /usr/local
+JOBS ?= $(shell nproc 2>/dev/null || echo 2)
+FUZZ_SECONDS ?= 60
+CMAKE ?= cmake
+CTEST ?= ctest
+GENERATOR := $(shell command -v ninja >/dev/null 2>&1 && echo "-G Ninja")
+
+BUILD := build
+ASAN_BUILD := build-asan
+M32_BUILD := build-m32
+FUZZ_BUILD := build-fuzz
+EXAMPLE := examples/demo-server.smbios.txt
+
+.PHONY: all build demo test check check-asan check-m32 install fuzz bench format clean
+
+all: build
+
+$(BUILD)/CMakeCache.txt:
+	$(CMAKE) -S . -B $(BUILD) $(GENERATOR) -DCMAKE_BUILD_TYPE=RelWithDebInfo
+
+build: $(BUILD)/CMakeCache.txt
+	$(CMAKE) --build $(BUILD) -j $(JOBS)
+
+demo: build
+	$(BUILD)/out/smbios-inventory --dump $(EXAMPLE)
+
+test: build
+	$(CTEST) --test-dir $(BUILD) --output-on-failure -j $(JOBS)
+
+check: check-asan check-m32
+
+check-asan:
+	CC=clang CXX=clang++ $(CMAKE) -S . -B $(ASAN_BUILD) $(GENERATOR) -DCMAKE_BUILD_TYPE=Debug -DSMBIOS_SANITIZE=ON
+	$(CMAKE) --build $(ASAN_BUILD) -j $(JOBS)
+	ASAN_OPTIONS=detect_leaks=1 UBSAN_OPTIONS=print_stacktrace=1:halt_on_error=1 \
+	  $(CTEST) --test-dir $(ASAN_BUILD) --output-on-failure -j $(JOBS)
+
+check-m32:
+	$(CMAKE) -S . -B $(M32_BUILD) $(GENERATOR) -DCMAKE_BUILD_TYPE=RelWithDebInfo \
+	  -DCMAKE_C_FLAGS=-m32 -DCMAKE_CXX_FLAGS=-m32 -DSMBIOS_BENCH=OFF
+	$(CMAKE) --build $(M32_BUILD) -j $(JOBS)
+	$(CTEST) --test-dir $(M32_BUILD) --output-on-failure -j $(JOBS)
+
+install: build
+	$(CMAKE) --install $(BUILD) --prefix $(PREFIX)
+
+fuzz:
+	CC=clang CXX=clang++ $(CMAKE) -S . -B $(FUZZ_BUILD) $(GENERATOR) -DCMAKE_BUILD_TYPE=RelWithDebInfo \
+	  -DSMBIOS_FUZZ=ON -DSMBIOS_TESTS=OFF -DSMBIOS_BENCH=OFF
+	$(CMAKE) --build $(FUZZ_BUILD) -j $(JOBS)
+	FUZZ_SECONDS=$(FUZZ_SECONDS) fuzz/run-all $(FUZZ_BUILD)/out
+
+bench: build
+	$(BUILD)/out/smbios-bench
+
+format:
+	find platform smbios mi pmem tools tests bench fuzz examples \
+	  \( -name '*.cpp' -o -name '*.h' \) -print0 | xargs -0 clang-format -i
+
+clean:
+	rm -rf $(BUILD) $(ASAN_BUILD) $(M32_BUILD) $(FUZZ_BUILD)

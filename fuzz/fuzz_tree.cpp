@@ -1,0 +1,55 @@
+// Arbitrary bytes as a raw structure table: parsed, grouped by type as the
+// plug-in's initialize groups them, and turned into the whole inventory tree
+// by every builder, including those the agent may call on its own.
+#include <cstdint>
+#include <memory>
+#include <vector>
+
+#include "IC/Number.h"
+#include "QNLog/QNLogger.h"
+#include "mi/SmBiosMI.h"
+#include "smbios/SmBios.h"
+
+namespace {
+
+class FuzzMI : public IC::SmBiosMI {
+public:
+    void build(SD::SmBios const& parsed) {
+        IC::ManagementInterface::initialize(1, IC::Number(0u), IC::Number(0u));
+        std::vector<IC::TableData> storage[256];
+        std::vector<IC::TableData>* lists[256];
+        for (unsigned int type = 0; type < 256; ++type) {
+            lists[type] = &storage[type];
+        }
+        for (SD::SmBios::Table const& t : parsed.getTables()) {
+            storage[t.getType()].push_back(IC::TableData(&t, t.getLength()));
+        }
+        makeRootNode(lists);
+        makeBMCNodes(lists, 2);
+        makeTemperatureSensorNodes(lists, 2, 3);
+        makeVoltageSensorNodes(lists, 2, 3);
+        std::vector<IC::Node*> nodes;
+        getMap(nodes);
+        for (IC::Node* node : nodes) {
+            for (auto const& property : node->getProperties()) {
+                IC::PropertyValue value;
+                node->getProperty(property.first, value);
+            }
+        }
+    }
+};
+
+}  // namespace
+
+extern "C" int LLVMFuzzerInitialize(int*, char***) {
+    QNLog::QNLogger::setLogLevel(QNLog::LEVEL_OFF);
+    QNLog::QNLogger::setTraceLevel(QNLog::LEVEL_OFF);
+    return 0;
+}
+
+extern "C" int LLVMFuzzerTestOneInput(uint8_t const* data, size_t size) {
+    SD::SmBios parsed(std::vector<unsigned char>(data, data + size));
+    FuzzMI mi;
+    mi.build(parsed);
+    return 0;
+}

@@ -1,0 +1,355 @@
+#include "mi/SmBiosMI.h"
+
+#include <memory>
+
+#include "IC/PropertyValue.h"
+#include "IC/Version2.h"
+
+namespace IC {
+
+namespace {
+QNLog::QNLogger logger("Quillon.IC.MI.SmBiosMI.SmBiosMI");
+}  // namespace
+
+SmBiosMI mysmbiosmi;
+Error myerr(0, Number(0u), "");
+std::string const myversionc = "1.0";
+unsigned int tablecount[256];
+
+SmBiosMI::SmBiosMI() = default;
+
+SmBiosMI::~SmBiosMI() = default;
+
+MutableNode* SmBiosMI::addNode(MutableNode* node) {
+    Node* added = node;
+    addNewNode(added);
+    return node;
+}
+
+MutableNode* SmBiosMI::newNode(unsigned int parentId, unsigned int nodeType, unsigned int index) {
+    unsigned int const nodeId = takeNodeId();
+    return addNode(new MutableNode(nodeId, parentId, miIdList, nodeType, index));
+}
+
+Error SmBiosMI::initialize(unsigned int id, Number const& a, Number const& b) {
+    SMBIOS_DETAIL(logger, "initialize entry");
+    std::unique_ptr<std::vector<TableData>> owners[256];
+    std::vector<TableData>* lists[256];
+    for (unsigned int type = 0; type < 256; ++type) {
+        owners[type].reset(new std::vector<TableData>());
+        lists[type] = owners[type].get();
+        tablecount[type] = 0;
+    }
+
+    myerr = ManagementInterface::initialize(id, a, b);
+
+    SD::SmBios smbios;
+    if (smbios.getTables().empty()) {
+        SMBIOS_WARNING(logger, "smbios table size zero");
+    }
+
+    MutableNode* miNode = addNode(new MutableNode(miId, 0, miIdList, 15, 0));
+    miNode->setStatus(1);
+    miNode->setDescription("Corvane SMBIOS Management Interface");
+
+    smbiosMajorVersion = smbios.getMajorVersion();
+    smbiosMinorVersion = smbios.getMinorVersion();
+    Number const version(Version2(smbiosMajorVersion, smbiosMinorVersion));
+    SMBIOS_DETAIL(logger, "SmBios Major Version = " << smbiosMajorVersion);
+    SMBIOS_DETAIL(logger, "SmBios Minor Version = " << smbiosMinorVersion);
+    SMBIOS_DETAIL(logger, "SmBios Version = " << version);
+    miNode->setProperty(306, PropertyValue(version, true));
+    if (smbios.getRevision() != 0) {
+        miNode->setProperty(307, PropertyValue(smbios.getRevision(), true));
+    } else {
+        SMBIOS_DETAIL(logger, "SmBiosMI Revision is 0 or NULL");
+    }
+
+    unsigned int type = 0;
+    for (SD::SmBios::Table const& structure : smbios.getTables()) {
+        try {
+            type = structure.getType();
+            unsigned int const length = structure.getLength();
+            lists[type]->push_back(TableData(&structure, length));
+        } catch (std::exception const& e) {
+            SMBIOS_ERROR(logger, "Exception=" << e.what() << " Type=" << typeid(e).name()
+                                              << "Table " << type);
+        } catch (ICException const& e) {
+            SMBIOS_ERROR(logger, "ICException=" << e.what() << "Table=" << type);
+        } catch (...) {
+            SMBIOS_ERROR(logger, "Error in table " << type);
+        }
+    }
+
+    makeRootNode(lists);
+
+    for (unsigned int t = 0; t < 256; ++t) {
+        if (!lists[t]->empty()) {
+            SMBIOS_DETAIL(logger, "Table(s) for index " << t);
+            for (TableData const& entry : *lists[t]) {
+                SMBIOS_DETAIL(logger, "   Pointer = " << static_cast<void const*>(entry.table)
+                                                      << " length = " << entry.length);
+            }
+        }
+        owners[t].reset();
+        lists[t] = nullptr;
+    }
+
+    Error const result = myerr;
+    SMBIOS_DETAIL(logger, "initialize exit");
+    return result;
+}
+
+// Readers and writers. Offsets are checked against the formatted-area
+// length on plain integers, so an offset near 255 fails rather than wraps.
+// The 16-bit readers check only the offset itself, the 16-bit writers the
+// whole word; the wide boolean writers check the whole field but test only
+// the byte at the offset.
+
+#define SMBIOSMI_FAIL(text, off, length) \
+    SMBIOS_DETAIL(logger, text << static_cast<unsigned int>(off) << " length=" << (length))
+
+bool SmBiosMI::getBool16(SD::SmBios::Table const* t, unsigned char off, unsigned short mask) {
+    unsigned int const length = t->getLength();
+    if (off < length) {
+        return (t->getWord(off) & mask) != 0;
+    }
+    SMBIOSMI_FAIL("getBool16 offset=", off, length);
+    return false;
+}
+
+unsigned int SmBiosMI::getNumber16(SD::SmBios::Table const* t, unsigned char off) {
+    unsigned int const length = t->getLength();
+    if (off < length) {
+        return t->getWord(off);
+    }
+    SMBIOSMI_FAIL("getNumber16 offset=", off, length);
+    return 0;
+}
+
+unsigned int SmBiosMI::getEnumValue16(SD::SmBios::Table const* t, unsigned char off,
+                                      unsigned short mask, unsigned char shift) {
+    unsigned int const length = t->getLength();
+    if (off < length) {
+        return static_cast<unsigned int>(t->getWord(off) & mask) >> shift;
+    }
+    SMBIOSMI_FAIL("gtetEnumValue16 offset=", off, length);
+    return 0;
+}
+
+bool SmBiosMI::getBool8(SD::SmBios::Table const* t, unsigned char off, unsigned char mask) {
+    unsigned int const length = t->getLength();
+    if (off < length) {
+        return (t->getByte(off) & mask) != 0;
+    }
+    SMBIOSMI_FAIL("getBool8 offset=", off, length);
+    return false;
+}
+
+unsigned int SmBiosMI::getNumber8(SD::SmBios::Table const* t, unsigned char off) {
+    unsigned int const length = t->getLength();
+    if (off < length) {
+        return t->getByte(off);
+    }
+    SMBIOSMI_FAIL("getNumber8 offset=", off, length);
+    return 0;
+}
+
+unsigned int SmBiosMI::getEnumValue(SD::SmBios::Table const* t, unsigned char off,
+                                    unsigned char mask) {
+    unsigned int const length = t->getLength();
+    if (off < length) {
+        return static_cast<unsigned int>(t->getByte(off) & mask);
+    }
+    SMBIOSMI_FAIL("getEnumValue offset=", off, length);
+    return 0;
+}
+
+unsigned int SmBiosMI::getNumber8Unprot(SD::SmBios::Table const* t, unsigned int off) {
+    return t->getByteUnprot(off);
+}
+
+std::string SmBiosMI::getStrByIdx(SD::SmBios::Table const* t, unsigned char index) {
+    SD::SmBios::String const s = t->getString(index);
+    return s != nullptr ? std::string(s) : std::string();
+}
+
+std::string SmBiosMI::getString(SD::SmBios::Table const* t, unsigned char off) {
+    unsigned int const length = t->getLength();
+    if (off < length) {
+        return getStrByIdx(t, t->getByte(off));
+    }
+    SMBIOSMI_FAIL("getString invalid offset=", off, length);
+    return std::string();
+}
+
+std::vector<unsigned char> SmBiosMI::getBuffer(SD::SmBios::Table const* t, unsigned char off,
+                                               unsigned char count) {
+    unsigned int const length = t->getLength();
+    std::vector<unsigned char> bytes;
+    if (static_cast<unsigned int>(off) + count <= length) {
+        for (unsigned int i = 0; i < count; ++i) {
+            bytes.push_back(t->getByte(static_cast<unsigned char>(off + i)));
+        }
+        return bytes;
+    }
+    SMBIOSMI_FAIL("propBuffer offset=", off, length);
+    return bytes;
+}
+
+std::vector<unsigned char> SmBiosMI::getBufferUnprot(SD::SmBios::Table const* t, unsigned int off,
+                                                     unsigned int count) {
+    std::vector<unsigned char> bytes;
+    bytes.reserve(count);
+    for (unsigned int i = 0; i < count; ++i) {
+        bytes.push_back(t->getByteUnprot(off + i));
+    }
+    return bytes;
+}
+
+void SmBiosMI::propBool64(SD::SmBios::Table const* t, unsigned char off, unsigned long long mask,
+                          unsigned int id, MutableNode* node) {
+    unsigned int const length = t->getLength();
+    if (off + 7u < length) {
+        node->setProperty(id, PropertyValue(Number((t->getByte(off) & mask) != 0), true));
+        return;
+    }
+    SMBIOSMI_FAIL("propBool64 offset=", off, length);
+}
+
+void SmBiosMI::propBool32(SD::SmBios::Table const* t, unsigned char off, unsigned int mask,
+                          unsigned int id, MutableNode* node) {
+    unsigned int const length = t->getLength();
+    if (off + 3u < length) {
+        node->setProperty(id, PropertyValue(Number((t->getByte(off) & mask) != 0), true));
+        return;
+    }
+    SMBIOSMI_FAIL("propBool32 offset=", off, length);
+}
+
+void SmBiosMI::propBool16(SD::SmBios::Table const* t, unsigned char off, unsigned short mask,
+                          unsigned int id, MutableNode* node) {
+    unsigned int const length = t->getLength();
+    if (off + 1u < length) {
+        node->setProperty(id, PropertyValue(Number((t->getByte(off) & mask) != 0), true));
+        return;
+    }
+    SMBIOSMI_FAIL("propBool16 offset=", off, length);
+}
+
+void SmBiosMI::propBool8(SD::SmBios::Table const* t, unsigned char off, unsigned char mask,
+                         unsigned int id, MutableNode* node) {
+    unsigned int const length = t->getLength();
+    if (off < length) {
+        node->setProperty(id, PropertyValue(Number((t->getByte(off) & mask) != 0), true));
+        return;
+    }
+    SMBIOSMI_FAIL("propBool8 offset=", off, length);
+}
+
+void SmBiosMI::propNumber16(SD::SmBios::Table const* t, unsigned char off, unsigned int id,
+                            MutableNode* node) {
+    unsigned int const length = t->getLength();
+    if (off + 1u < length) {
+        unsigned int const value = t->getWord(off);
+        node->setProperty(id, PropertyValue(Number(value), true));
+        return;
+    }
+    SMBIOSMI_FAIL("propNumber16 offset=", off, length);
+}
+
+void SmBiosMI::propNumber8(SD::SmBios::Table const* t, unsigned char off, unsigned int id,
+                           MutableNode* node) {
+    unsigned int const length = t->getLength();
+    if (off < length) {
+        unsigned int const value = t->getByte(off);
+        node->setProperty(id, PropertyValue(Number(value), true));
+        return;
+    }
+    SMBIOSMI_FAIL("propNumber8 offset=", off, length);
+}
+
+void SmBiosMI::propEnumValue16(SD::SmBios::Table const* t, unsigned char off, unsigned short mask,
+                               unsigned char shift, unsigned int id, MutableNode* node) {
+    unsigned int const length = t->getLength();
+    if (off + 1u < length) {
+        unsigned short const value =
+            static_cast<unsigned short>(static_cast<unsigned int>(t->getWord(off) & mask) >> shift);
+        node->setProperty(id, PropertyValue(EnumValue(value), true));
+        return;
+    }
+    SMBIOSMI_FAIL("propEnumValue16 offset=", off, length);
+}
+
+void SmBiosMI::propEnumValue(SD::SmBios::Table const* t, unsigned char off, unsigned char mask,
+                             unsigned int id, MutableNode* node) {
+    unsigned int const length = t->getLength();
+    if (off < length) {
+        unsigned char const value = static_cast<unsigned char>(t->getByte(off) & mask);
+        node->setProperty(id, PropertyValue(EnumValue(value), true));
+        return;
+    }
+    SMBIOSMI_FAIL("propEnumValue offset=", off, length);
+}
+
+void SmBiosMI::propEnumValue(SD::SmBios::Table const* t, unsigned char off, unsigned int id,
+                             MutableNode* node) {
+    unsigned int const length = t->getLength();
+    if (off < length) {
+        node->setProperty(id, PropertyValue(EnumValue(t->getByte(off)), true));
+        return;
+    }
+    SMBIOSMI_FAIL("propEnumValue offset=", off, length);
+}
+
+void SmBiosMI::propString(SD::SmBios::Table const* t, unsigned char off, unsigned int id,
+                          MutableNode* node) {
+    unsigned int const length = t->getLength();
+    if (off < length) {
+        SD::SmBios::String const s = t->getString(t->getByte(off));
+        node->setProperty(id, PropertyValue(s != nullptr ? s : "", true));
+        return;
+    }
+    SMBIOSMI_FAIL("propString offset=", off, length);
+}
+
+void SmBiosMI::propBuffer(SD::SmBios::Table const* t, unsigned char off, unsigned char count,
+                          unsigned int id, MutableNode* node) {
+    unsigned int const length = t->getLength();
+    if (static_cast<unsigned int>(off) + count <= length) {
+        // Stored backwards: a little-endian field becomes its big-endian bytes.
+        std::vector<unsigned char> bytes;
+        for (unsigned int i = count; i-- > 0;) {
+            bytes.push_back(t->getByte(static_cast<unsigned char>(off + i)));
+        }
+        node->setProperty(id, PropertyValue(bytes, true));
+        return;
+    }
+    SMBIOSMI_FAIL("propBuffer offset=", off, length);
+}
+
+std::string SmBiosMI::pB(unsigned char b) {
+    static char const digits[] = "0123456789ABCDEF";
+    std::string text;
+    text += digits[b >> 4];
+    text += digits[b & 0x0F];
+    return text;
+}
+
+std::string SmBiosMI::pS(char const* s) {
+    std::string text;
+    for (; *s != '\0'; ++s) {
+        text += pB(static_cast<unsigned char>(*s));
+    }
+    return text;
+}
+
+}  // namespace IC
+
+extern "C" int OpenMI(IC::ManagementInterface** mi, IC::Error** err) {
+    SMBIOS_DETAIL(IC::logger, "OpenMI entry");
+    *mi = &IC::mysmbiosmi;
+    *err = &IC::myerr;
+    SMBIOS_DETAIL(IC::logger, "OpenMI exit");
+    return 0;
+}

@@ -1,0 +1,167 @@
+// The SMBIOS management interface: the plug-in object the agent receives
+// from OpenMI. Its initialize acquires the SMBIOS table, groups the
+// structures by type and builds the inventory tree through one builder per
+// kind of hardware component.
+#pragma once
+
+#include <exception>
+#include <string>
+#include <typeinfo>
+#include <utility>
+#include <vector>
+
+#include "IC/Error.h"
+#include "IC/ManagementInterface.h"
+#include "IC/MutableNode.h"
+#include "IC/Number.h"
+#include "smbios/Logging.h"
+#include "smbios/SmBios.h"
+
+namespace IC {
+
+// The plug-in's own exception: one message.
+class ICException {
+public:
+    explicit ICException(std::string const& message) : message_(message) {}
+    virtual ~ICException() = default;
+    virtual char const* what() const { return message_.c_str(); }
+
+private:
+    std::string message_;
+};
+
+// One entry of a structure list: the structure, its formatted-area length
+// and the node a builder made from it (null until then).
+struct TableData {
+    TableData(SD::SmBios::Table const* table, unsigned int length);
+
+    SD::SmBios::Table const* table;
+    unsigned int length;
+    IC::MutableNode* node;
+};
+
+// The structure lists: 256 lists, one per SMBIOS type, indexed by type.
+typedef std::vector<TableData>** TableLists;
+
+class SmBiosMI : public ManagementInterface {
+public:
+    SmBiosMI();
+    ~SmBiosMI() override;
+
+    Error initialize(unsigned int id, Number const& a, Number const& b) override;
+
+    // Builders.
+    void makeRootNode(TableLists lists);
+    void makeComputerNodes(TableLists lists, unsigned int parentId);
+    void makeChassisNodes(TableLists lists, unsigned int parentId);
+    void makePlanarNodes(TableLists tables, unsigned int parentNodeId);
+    void makeCpuNodes(TableLists tables, unsigned int parentNodeId);
+    void makeCacheNodes(TableLists tables, unsigned int parentNodeId, unsigned int handle);
+    void makeSlotNodes(TableLists tables, unsigned int parentNodeId);
+    void makeConnectorNodes(TableLists tables, unsigned int parentNodeId);
+    void makeDimmNodes(TableLists tables, unsigned int parentNodeId);
+    void makeDiskControllerNodes(TableLists tables, unsigned int parentId);
+    void makeFirmwareNodes(TableLists tables, unsigned int parentId);
+    void makeLogNodes(TableLists tables, unsigned int parentId);
+    void makeKVDNode(TableLists tables, unsigned int parentId);
+    void makeTemperatureSensorNodes(TableLists tables, unsigned int parentId,
+                                    unsigned int location);
+    void makeVoltageSensorNodes(TableLists tables, unsigned int parentId, unsigned int location);
+    void makeBMCNodes(TableLists tables, unsigned int parentId);
+    void makeSMBIOSTableNodes(TableLists lists, unsigned int parentId);
+    std::vector<std::pair<unsigned char, unsigned int>> findGroup(TableLists lists,
+                                                                  unsigned int type,
+                                                                  unsigned int handle);
+    void reverse_uuid_byte_order(std::string& uuid);
+    static unsigned int getCIMSlotType(unsigned int smbiosSlotType);
+    bool find_first_number(char const* text, unsigned* out);
+
+    // Readers: a field of the structure, or 0, false or empty when the
+    // offset fails the check against the formatted-area length (logged).
+    bool getBool16(SD::SmBios::Table const* t, unsigned char off, unsigned short mask);
+    unsigned int getNumber16(SD::SmBios::Table const* t, unsigned char off);
+    unsigned int getEnumValue16(SD::SmBios::Table const* t, unsigned char off,
+                                unsigned short mask, unsigned char shift);
+    bool getBool8(SD::SmBios::Table const* t, unsigned char off, unsigned char mask);
+    unsigned int getNumber8(SD::SmBios::Table const* t, unsigned char off);
+    unsigned int getEnumValue(SD::SmBios::Table const* t, unsigned char off, unsigned char mask);
+    unsigned int getNumber8Unprot(SD::SmBios::Table const* t, unsigned int off);
+    std::string getStrByIdx(SD::SmBios::Table const* t, unsigned char index);
+    std::string getString(SD::SmBios::Table const* t, unsigned char off);
+    std::vector<unsigned char> getBuffer(SD::SmBios::Table const* t, unsigned char off,
+                                         unsigned char count);
+    std::vector<unsigned char> getBufferUnprot(SD::SmBios::Table const* t, unsigned int off,
+                                               unsigned int count);
+
+    // Writers: set property id on node from a field, or set nothing when the
+    // field fails the check against the formatted-area length (logged).
+    void propBool64(SD::SmBios::Table const* t, unsigned char off, unsigned long long mask,
+                    unsigned int id, IC::MutableNode* node);
+    void propBool32(SD::SmBios::Table const* t, unsigned char off, unsigned int mask,
+                    unsigned int id, IC::MutableNode* node);
+    void propBool16(SD::SmBios::Table const* t, unsigned char off, unsigned short mask,
+                    unsigned int id, IC::MutableNode* node);
+    void propBool8(SD::SmBios::Table const* t, unsigned char off, unsigned char mask,
+                   unsigned int id, IC::MutableNode* node);
+    void propNumber16(SD::SmBios::Table const* t, unsigned char off, unsigned int id,
+                      IC::MutableNode* node);
+    void propNumber8(SD::SmBios::Table const* t, unsigned char off, unsigned int id,
+                     IC::MutableNode* node);
+    void propEnumValue16(SD::SmBios::Table const* t, unsigned char off, unsigned short mask,
+                         unsigned char shift, unsigned int id, IC::MutableNode* node);
+    void propEnumValue(SD::SmBios::Table const* t, unsigned char off, unsigned char mask,
+                       unsigned int id, IC::MutableNode* node);
+    void propEnumValue(SD::SmBios::Table const* t, unsigned char off, unsigned int id,
+                       IC::MutableNode* node);
+    void propString(SD::SmBios::Table const* t, unsigned char off, unsigned int id,
+                    IC::MutableNode* node);
+    void propBuffer(SD::SmBios::Table const* t, unsigned char off, unsigned char count,
+                    unsigned int id, IC::MutableNode* node);
+
+    // Two upper-case hexadecimal digits of b; the digits of every character
+    // of s.
+    static std::string pB(unsigned char b);
+    static std::string pS(char const* s);
+
+    unsigned int getSmBiosMajorVersion() const { return smbiosMajorVersion; }
+    unsigned int getSmBiosMinorVersion() const { return smbiosMinorVersion; }
+
+protected:
+    // Takes the next node id.
+    unsigned int takeNodeId() { return nextNodeId++; }
+    // Appends a node made by a builder to the node list and returns it.
+    IC::MutableNode* addNode(IC::MutableNode* node);
+    // Makes a node with the next node id under parentId and appends it.
+    IC::MutableNode* newNode(unsigned int parentId, unsigned int nodeType, unsigned int index);
+
+    unsigned int smbiosMajorVersion = 0;
+    unsigned int smbiosMinorVersion = 0;
+};
+
+extern SmBiosMI mysmbiosmi;
+extern Error myerr;
+extern std::string const myversionc;
+extern unsigned int tablecount[256];
+
+}  // namespace IC
+
+// The exported entry point: hands the agent the plug-in object and its
+// error record, and returns 0.
+extern "C" __attribute__((visibility("default"))) int OpenMI(IC::ManagementInterface** mi,
+                                                             IC::Error** err);
+
+// The three handlers that guard the handling of one structure in a builder:
+// the failure is logged and the builder goes on with the next structure.
+#define SMBIOSMI_CATCH_STRUCTURE(logger, tableType, index)                                   \
+    catch (IC::ICException const& e) {                                                       \
+        SMBIOS_ERROR(logger, "ICException=" << e.what() << "Table " << (tableType)           \
+                                            << " index =" << (index));                       \
+    }                                                                                        \
+    catch (std::exception const& e) {                                                        \
+        SMBIOS_ERROR(logger, "Exception=" << e.what() << " Type=" << typeid(e).name()        \
+                                          << "Table " << (tableType) << " index ="           \
+                                          << (index));                                       \
+    }                                                                                        \
+    catch (...) {                                                                            \
+        SMBIOS_ERROR(logger, "Error in table " << (tableType) << " index " << (index));      \
+    }

@@ -1,0 +1,227 @@
+#include "smbios/SmBios.h"
+
+#include <string>
+
+#include "smbios/Logging.h"
+#include "smbios/SmBiosInitializer.h"
+
+namespace SD {
+
+namespace SMBIOS_CLASS {
+SD::Mutex _initMutex;
+SmBiosInitializer* _smbios = nullptr;
+QNLog::QNLogger loggerSmBios("Quillon.IC.SmBios");
+}  // namespace SMBIOS_CLASS
+
+using SMBIOS_CLASS::loggerSmBios;
+
+SmBios::Table::Table() = default;
+
+SmBios::Table::Table(std::vector<unsigned char> const& bytes) : Table(bytes.data(), bytes.size()) {}
+
+// Parses one structure from bytes[0, size): the formatted area as its length
+// byte says (bounded by what is there), then the string set up to its double
+// NUL, where a missing byte after the last one counts as the end. Each NUL
+// inside the set ends one string; the count is one more than those, so an
+// empty string set still counts one (empty) string.
+SmBios::Table::Table(unsigned char const* bytes, size_t size) {
+    if (size <= 3) {
+        SMBIOS_DETAIL(loggerSmBios, "Table::Constructor vector<Byte> too small return");
+        return;
+    }
+    type_ = bytes[0];
+    length_ = bytes[1];
+    handle_ = static_cast<unsigned short>(bytes[2] + 256u * bytes[3]);
+    strCount_ = 0;
+    size_t const formatted = length_ < size ? length_ : size;
+    data_.assign(bytes, bytes + formatted);
+    for (size_t p = length_; p < size; ++p) {
+        if (bytes[p] == 0 && (p + 1 >= size || bytes[p + 1] == 0)) {
+            break;
+        }
+        data_.push_back(bytes[p]);
+        if (bytes[p] == 0) {
+            ++strCount_;
+        }
+    }
+    ++strCount_;
+    data_.push_back(0);
+    data_.push_back(0);
+    SMBIOS_DETAIL(loggerSmBios, "Table::Constructor vector<Byte> good return");
+}
+
+SmBios::Table::~Table() = default;
+
+unsigned char SmBios::Table::getByte(unsigned char off) const {
+    if (off >= data_.size()) {
+        throw std::out_of_range("");
+    }
+    return data_[off];
+}
+
+unsigned short SmBios::Table::getWord(unsigned char off) const {
+    if (off + 2u > length_ || off + 2u > data_.size()) {
+        throw std::out_of_range("");
+    }
+    return static_cast<unsigned short>(data_[off] | (data_[off + 1] << 8));
+}
+
+std::uint32_t SmBios::Table::getDWord(unsigned char off) const {
+    if (off + 4u > length_ || off + 4u > data_.size()) {
+        throw std::out_of_range("");
+    }
+    std::uint32_t value = 0;
+    for (unsigned int i = 4; i-- > 0;) {
+        value = (value << 8) | data_[off + i];
+    }
+    return value;
+}
+
+std::uint64_t SmBios::Table::getQWord(unsigned char off) const {
+    if (off + 8u > length_ || off + 8u > data_.size()) {
+        throw std::out_of_range("");
+    }
+    std::uint64_t value = 0;
+    for (unsigned int i = 8; i-- > 0;) {
+        value = (value << 8) | data_[off + i];
+    }
+    return value;
+}
+
+unsigned char SmBios::Table::getByteUnprot(unsigned int off) const {
+    return off < data_.size() ? data_[off] : 0;
+}
+
+unsigned short SmBios::Table::getWordUnprot(unsigned int off) const {
+    return static_cast<unsigned short>(getByteUnprot(off) | (getByteUnprot(off + 1) << 8));
+}
+
+SmBios::String SmBios::Table::getString(unsigned char index) const {
+    if (index == 0) {
+        SMBIOS_DETAIL(loggerSmBios, "Table::getString index 0, return null char* ponter");
+        return nullptr;
+    }
+    if (index > strCount_) {
+        SMBIOS_DETAIL(loggerSmBios, "Table::getString index "
+                                        << static_cast<unsigned int>(index) << " > max of "
+                                        << strCount_ << " return null char* pointer");
+        return nullptr;
+    }
+    // The string set starts right after the formatted area; the last byte of
+    // the data is the limit no string may start at.
+    size_t const limit = data_.empty() ? 0 : data_.size() - 1;
+    size_t pos = length_;
+    bool found = pos < limit;
+    for (unsigned int skip = 1; found && skip < index; ++skip) {
+        while (pos < limit && data_[pos] != 0) {
+            ++pos;
+        }
+        if (pos < limit) {
+            ++pos;
+        }
+        found = pos < limit;
+    }
+    if (!found) {
+        SMBIOS_ERROR(loggerSmBios, "Table::getString throw out of range exception");
+        throw std::out_of_range("");
+    }
+    String result = reinterpret_cast<String>(&data_[pos]);
+    SMBIOS_DETAIL(loggerSmBios, "Table::getString return good string " << result);
+    return result;
+}
+
+SmBios::SmBios() {
+    SMBIOS_DETAIL(loggerSmBios, "Constructor (void) entry");
+    SMBIOS_CLASS::_initMutex.lock(-1);
+    try {
+        if (SMBIOS_CLASS::_smbios == nullptr) {
+            SMBIOS_CLASS::_smbios = new SmBiosInitializer();
+        }
+    } catch (...) {
+        SMBIOS_CLASS::_initMutex.unlock();
+        throw;
+    }
+    majorVersion_ = SMBIOS_CLASS::_smbios->getMajorVersion();
+    minorVersion_ = SMBIOS_CLASS::_smbios->getMinorVersion();
+    revision_ = SMBIOS_CLASS::_smbios->getRevision();
+    tables_ = SMBIOS_CLASS::_smbios->getTables();
+    SMBIOS_CLASS::_initMutex.unlock();
+    SMBIOS_DETAIL(loggerSmBios, "Constructor (void) exit");
+}
+
+SmBios::SmBios(std::vector<unsigned char> const& raw) {
+    SMBIOS_DETAIL(loggerSmBios, "Constructor (const vector<Byte>) entry");
+    // Each structure is parsed from the remainder of the raw bytes and the
+    // position advances by the size of its data. Parsing ends when fewer than
+    // four bytes are left, or when a last structure without a string set got
+    // a terminator appended that carries the position past the end.
+    size_t pos = 0;
+    while (pos < raw.size()) {
+        Table table(raw.data() + pos, raw.size() - pos);
+        if (table.getData().empty()) {
+            break;
+        }
+        pos += table.getData().size();
+        tables_.push_back(std::move(table));
+    }
+    SMBIOS_DETAIL(loggerSmBios, "Constructor (const vector<Byte>) exit");
+}
+
+SmBios::SmBios(SmBios const& other)
+    : majorVersion_(other.majorVersion_),
+      minorVersion_(other.minorVersion_),
+      revision_(other.revision_),
+      tables_(other.tables_) {
+    SMBIOS_DETAIL(loggerSmBios, "Constructor (const SmBios) entry");
+    SMBIOS_DETAIL(loggerSmBios, "Constructor (const SmBios) exit");
+}
+
+SmBios::~SmBios() { SMBIOS_DETAIL(loggerSmBios, "Destructor  entry-exit"); }
+
+SmBios::Table& SmBios::operator[](unsigned char pos) { return tables_[pos]; }
+
+unsigned char SmBios::find(unsigned char type) {
+    unsigned int const shown = type;
+    SMBIOS_DETAIL(loggerSmBios, "find " << shown << " entry");
+    for (size_t pos = 0; pos < tables_.size(); ++pos) {
+        if (tables_[pos].getType() == type) {
+            SMBIOS_DETAIL(loggerSmBios, "find " << shown << " return found");
+            return static_cast<unsigned char>(tables_.size() - pos);
+        }
+    }
+    SMBIOS_DETAIL(loggerSmBios, "find " << shown << " return not found");
+    return 255;
+}
+
+bool _sort_criterion_handle(SmBios::Table const& a, SmBios::Table const& b) {
+    return a.getHandle() < b.getHandle();
+}
+
+std::ostream& operator<<(std::ostream& out, std::vector<SmBios::Byte> const& bytes) {
+    SMBIOS_DETAIL(loggerSmBios, "<< entry vector<SmBios::Byte>");
+    for (SmBios::Byte b : bytes) {
+        out << "<" << static_cast<unsigned int>(b) << ">";
+    }
+    SMBIOS_DETAIL(loggerSmBios, "<< return vector<SmBios::Byte> =");
+    return out;
+}
+
+std::ostream& operator<<(std::ostream& out, std::vector<SmBios::Word> const& words) {
+    SMBIOS_DETAIL(loggerSmBios, "<< entry vector<SmBios::Word>");
+    for (SmBios::Word w : words) {
+        out << "<" << static_cast<unsigned int>(w) << ">";
+    }
+    SMBIOS_DETAIL(loggerSmBios, "<< return vector<SmBios::Word> =");
+    return out;
+}
+
+std::ostream& operator<<(std::ostream& out, std::vector<SmBios::String> const& strings) {
+    SMBIOS_DETAIL(loggerSmBios, "<< entry vector<SmBios::String>");
+    for (SmBios::String s : strings) {
+        out << "<" << (s != nullptr ? s : "") << ">";
+    }
+    SMBIOS_DETAIL(loggerSmBios, "<< return vector<SmBios::String> =");
+    return out;
+}
+
+}  // namespace SD
