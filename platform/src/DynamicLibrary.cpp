@@ -1,0 +1,37 @@
+// SD::DynamicLibrary: dlopen/dlclose behind the agent's library interface.
+#include "SD/DynamicLibrary.h"
+
+#include <dlfcn.h>
+
+#include "SD/StringConversion.h"
+
+namespace SD {
+
+DynamicLibrary::DynamicLibrary(std::wstring const& fileName) : fileName_(fileName) {}
+
+DynamicLibrary::~DynamicLibrary() { unload(); }
+
+bool DynamicLibrary::load() {
+    if (handle_ != nullptr) {
+        return true;
+    }
+    std::string const path = make_string(fileName_);
+    dlerror();  // forget any earlier failure
+    handle_ = dlopen(path.c_str(), RTLD_NOW | RTLD_LOCAL);
+    if (handle_ == nullptr) {
+        char const* reason = dlerror();
+        lastError_ = reason != nullptr ? reason : "cannot load " + path;
+        return false;
+    }
+    lastError_.clear();
+    return true;
+}
+
+void DynamicLibrary::unload() {
+    if (handle_ != nullptr) {
+        dlclose(handle_);
+        handle_ = nullptr;
+    }
+}
+
+}  // namespace SD
