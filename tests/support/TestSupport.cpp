@@ -1,0 +1,188 @@
+#include "TestSupport.h"
+
+#include <dirent.h>
+#include <sys/stat.h>
+
+#include <algorithm>
+#include <cerrno>
+#include <cstdlib>
+#include <cstring>
+#include <filesystem>
+#include <fstream>
+#include <iterator>
+#include <sstream>
+#include <stdexcept>
+#include <system_error>
+
+#include "QNLog/QNLogger.h"
+
+namespace smbiostest {
+
+namespace {
+
+void writeData(std::string const& path, char const* data, size_t size) {
+    std::ofstream out(path, std::ios::binary | std::ios::trunc);
+    if (!out) {
+        throw std::runtime_error("cannot create " + path + ": " + std::strerror(errno));
+    }
+    out.write(data, static_cast<std::streamsize>(size));
+    out.close();
+    if (!out) {
+        throw std::runtime_error("cannot write " + path);
+    }
+}
+
+bool isDirectory(std::string const& path) {
+    struct stat st;
+    return ::stat(path.c_str(), &st) == 0 && S_ISDIR(st.st_mode);
+}
+
+std::string withoutTrailingSlash(std::string path) {
+    while (path.size() > 1 && path.back() == '/') {
+        path.pop_back();
+    }
+    return path;
+}
+
+}  // namespace
+
+std::vector<uint8_t> fileBytes(std::string const& path) {
+    std::ifstream in(path, std::ios::binary);
+    if (!in) {
+        throw std::runtime_error("cannot open " + path + ": " + std::strerror(errno));
+    }
+    std::vector<uint8_t> bytes((std::istreambuf_iterator<char>(in)),
+                               std::istreambuf_iterator<char>());
+    if (in.bad()) {
+        throw std::runtime_error("cannot read " + path);
+    }
+    return bytes;
+}
+
+void writeFile(std::string const& path, std::vector<uint8_t> const& bytes) {
+    writeData(path, reinterpret_cast<char const*>(bytes.data()), bytes.size());
+}
+
+void writeFile(std::string const& path, std::string const& text) {
+    writeData(path, text.data(), text.size());
+}
+
+void writeFile(std::string const& path, char const* text) {
+    writeData(path, text, std::strlen(text));
+}
+
+TempDir::TempDir() {
+    char const* base = std::getenv("TMPDIR");
+    std::string root = (base != nullptr && *base != '\0') ? withoutTrailingSlash(base) : "/tmp";
+    std::string pattern = root + "/smbios-test-XXXXXX";
+    std::vector<char> buffer(pattern.begin(), pattern.end());
+    buffer.push_back('\0');
+    if (::mkdtemp(buffer.data()) == nullptr) {
+        throw std::runtime_error("mkdtemp in " + root + " failed: " + std::strerror(errno));
+    }
+    path_ = buffer.data();
+}
+
+TempDir::~TempDir() {
+    std::error_code ignored;
+    std::filesystem::remove_all(path_, ignored);
+}
+
+ScopedEnv::ScopedEnv(std::string const& name, char const* value) : name_(name) {
+    char const* old = std::getenv(name.c_str());
+    if (old != nullptr) {
+        hadValue_ = true;
+        oldValue_ = old;
+    }
+    if (value != nullptr) {
+        ::setenv(name.c_str(), value, 1);
+    } else {
+        ::unsetenv(name.c_str());
+    }
+}
+
+ScopedEnv::ScopedEnv(std::string const& name, std::string const& value)
+    : ScopedEnv(name, value.c_str()) {}
+
+ScopedEnv::~ScopedEnv() {
+    if (hadValue_) {
+        ::setenv(name_.c_str(), oldValue_.c_str(), 1);
+    } else {
+        ::unsetenv(name_.c_str());
+    }
+}
+
+LogCapture::LogCapture() {
+    QNLog::QNLogger::startCapture();
+    QNLog::QNLogger::clearCapture();
+}
+
+LogCapture::~LogCapture() { QNLog::QNLogger::stopCapture(); }
+
+bool LogCapture::contains(std::string const& text) const { return count(text) > 0; }
+
+size_t LogCapture::count(std::string const& text) const {
+    size_t n = 0;
+    for (QNLog::QNLogRecord const& record : QNLog::QNLogger::captured()) {
+        if (record.text.find(text) != std::string::npos) {
+            ++n;
+        }
+    }
+    return n;
+}
+
+std::string LogCapture::dump() const {
+    std::vector<QNLog::QNLogRecord> const records = QNLog::QNLogger::captured();
+    std::ostringstream out;
+    out << records.size() << " captured message(s):\n";
+    for (QNLog::QNLogRecord const& record : records) {
+        out << "  [" << record.output << " " << record.level << " " << record.logger << "] "
+            << record.text << "\n";
+    }
+    return out.str();
+}
+
+std::string corpusDir() {
+    char const* dir = std::getenv("SMBIOS_CORPUS_DIR");
+    if (dir == nullptr || *dir == '\0') {
+        return "";
+    }
+    std::string path = withoutTrailingSlash(dir);
+    return isDirectory(path) ? path : "";
+}
+
+std::vector<std::string> corpusNames() {
+    std::vector<std::string> names;
+    std::string const dir = corpusDir();
+    if (dir.empty()) {
+        return names;
+    }
+    DIR* handle = ::opendir(dir.c_str());
+    if (handle == nullptr) {
+        return names;
+    }
+    static std::string const suffix = ".bin";
+    while (dirent* entry = ::readdir(handle)) {
+        std::string const name = entry->d_name;
+        if (name.size() > suffix.size() &&
+            name.compare(name.size() - suffix.size(), suffix.size(), suffix) == 0) {
+            names.push_back(name.substr(0, name.size() - suffix.size()));
+        }
+    }
+    ::closedir(handle);
+    std::sort(names.begin(), names.end());
+    return names;
+}
+
+void writeOverrideDir(std::string const& dataDir, std::vector<uint8_t> const& header,
+                      std::vector<uint8_t> const& table) {
+    std::string const dir = withoutTrailingSlash(dataDir) + "/SmBiosOverride";
+    std::error_code error;
+    std::filesystem::create_directories(dir, error);
+    if (error) {
+        throw std::runtime_error("cannot create " + dir + ": " + error.message());
+    }
+    writeFile(dir + "/smbios.txt", smbiosdump::formatOverride(header, table));
+}
+
+}  // namespace smbiostest

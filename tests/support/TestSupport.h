@@ -1,0 +1,87 @@
+// Helpers shared by the tests: files and temporary folders, environment
+// variables, log capture, the corpus of real SMBIOS dumps, and override
+// files for the plug-in. The structure and table builders come with it.
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <string>
+#include <vector>
+
+#include "DumpFormat.h"
+#include "TableBuilder.h"
+
+namespace smbiostest {
+
+// The whole file. Throws std::runtime_error when it cannot be read.
+std::vector<uint8_t> fileBytes(std::string const& path);
+// Creates or replaces the file. Throws std::runtime_error on failure.
+void writeFile(std::string const& path, std::vector<uint8_t> const& bytes);
+void writeFile(std::string const& path, std::string const& text);
+void writeFile(std::string const& path, char const* text);
+
+// A private folder under $TMPDIR (or /tmp), removed with everything in it
+// when the object goes. path() has no trailing '/'.
+class TempDir {
+public:
+    TempDir();
+    ~TempDir();
+    TempDir(TempDir const&) = delete;
+    TempDir& operator=(TempDir const&) = delete;
+
+    std::string const& path() const { return path_; }
+    // path() + "/" + name
+    std::string file(std::string const& name) const { return path_ + "/" + name; }
+
+private:
+    std::string path_;
+};
+
+// Sets an environment variable for the object's lifetime, then restores its
+// previous value or unsets it again. A null value unsets it meanwhile.
+class ScopedEnv {
+public:
+    ScopedEnv(std::string const& name, char const* value);
+    ScopedEnv(std::string const& name, std::string const& value);
+    ~ScopedEnv();
+    ScopedEnv(ScopedEnv const&) = delete;
+    ScopedEnv& operator=(ScopedEnv const&) = delete;
+
+private:
+    std::string name_;
+    bool hadValue_ = false;
+    std::string oldValue_;
+};
+
+// Captures every log and trace message while it lives (QNLog's in-memory
+// capture, cleared when it starts).
+class LogCapture {
+public:
+    LogCapture();
+    ~LogCapture();
+    LogCapture(LogCapture const&) = delete;
+    LogCapture& operator=(LogCapture const&) = delete;
+
+    // Whether any captured message's text contains `text`.
+    bool contains(std::string const& text) const;
+    // How many captured messages' texts contain `text` (every output; a
+    // message written through both the log and the trace counts twice).
+    size_t count(std::string const& text) const;
+    // The captured messages, one a line, for failure messages.
+    std::string dump() const;
+};
+
+// The folder of real SMBIOS dumps (SMBIOS_CORPUS_DIR), without a trailing
+// '/'; "" when the variable is unset or the folder does not exist.
+std::string corpusDir();
+// The names of the corpus's dumps, sorted: "Asus-UX307LA" for
+// Asus-UX307LA.bin (whose dmidecode decoding is Asus-UX307LA.orig.txt).
+// Empty when there is no corpus.
+std::vector<std::string> corpusNames();
+
+// Writes dataDir/SmBiosOverride/smbios.txt (creating the folder) with the
+// override text of the entry point and table. dataDir may end with '/'.
+void writeOverrideDir(std::string const& dataDir, std::vector<uint8_t> const& header,
+                      std::vector<uint8_t> const& table);
+
+}  // namespace smbiostest
