@@ -1,0 +1,259 @@
+// Shared by the tests of the plug-in frame: a plug-in object whose base
+// state (own id, next node id, id list, node list) the tests can reach, the
+// 256 structure lists made from a parsed table the way initialize makes them,
+// checks of node properties, the captured log in order, and override files
+// for the end-to-end initialize tests.
+#pragma once
+
+#include <gtest/gtest.h>
+
+#include <cstdint>
+#include <sstream>
+#include <string>
+#include <vector>
+
+#include "DumpFormat.h"
+#include "IC/ManagementInterface.h"
+#include "IC/MutableNode.h"
+#include "IC/Node.h"
+#include "IC/Number.h"
+#include "IC/PropertyValue.h"
+#include "IC/Version2.h"
+#include "QNLog/QNLogger.h"
+#include "TestSupport.h"
+#include "mi/SmBiosMI.h"
+#include "smbios/SmBios.h"
+
+namespace frametest {
+
+// The plug-in with its base state in reach. Construction sets the ids as the
+// agent's initialize does (own id 1, next node id 2) through the base class
+// alone, so no SMBIOS table is acquired.
+struct TestMI : IC::SmBiosMI {
+    using IC::SmBiosMI::miId;
+    using IC::SmBiosMI::miIdList;
+    using IC::SmBiosMI::nextNodeId;
+    using IC::SmBiosMI::nodeList;
+
+    explicit TestMI(unsigned int id = 1) {
+        IC::ManagementInterface::initialize(id, IC::Number(0u), IC::Number(0u));
+    }
+};
+
+// The structure lists of a parsed table: one list per SMBIOS type, each
+// holding the structures of that type in table order with their
+// formatted-area lengths. The table must outlive the lists.
+class StructureLists {
+public:
+    explicit StructureLists(SD::SmBios const& parsed) {
+        for (unsigned int type = 0; type < 256; ++type) {
+            lists[type] = &storage[type];
+        }
+        for (SD::SmBios::Table const& table : parsed.getTables()) {
+            storage[table.getType()].push_back(IC::TableData(&table, table.getLength()));
+        }
+    }
+    StructureLists(StructureLists const&) = delete;
+    StructureLists& operator=(StructureLists const&) = delete;
+
+    IC::TableLists get() { return lists; }
+
+    std::vector<IC::TableData> storage[256];
+    std::vector<IC::TableData>* lists[256];
+};
+
+// The raw table of the builder's structures, parsed (version bytes 0, no
+// sorting: the structures stay in the order they were added).
+inline SD::SmBios parse(smbiostest::TableBuilder const& builder) {
+    return SD::SmBios(builder.build());
+}
+
+inline IC::MutableNode const* asMutable(IC::Node const* node) {
+    return dynamic_cast<IC::MutableNode const*>(node);
+}
+
+// The node's type, or a failure when it is not a MutableNode.
+inline ::testing::AssertionResult hasNodeType(IC::Node const* node, unsigned int type) {
+    IC::MutableNode const* mutableNode = asMutable(node);
+    if (mutableNode == nullptr) {
+        return ::testing::AssertionFailure() << "node is not an IC::MutableNode";
+    }
+    if (mutableNode->getNodeType() != type) {
+        return ::testing::AssertionFailure()
+               << "node type " << mutableNode->getNodeType() << ", expected " << type;
+    }
+    return ::testing::AssertionSuccess();
+}
+
+// The property as the agent reads it, checked to be set with its flag true.
+inline ::testing::AssertionResult readProperty(IC::Node const* node, unsigned int id,
+                                               IC::PropertyValue& value) {
+    IC::Error const error = node->getProperty(id, value);
+    if (error.getStatus() != 0) {
+        return ::testing::AssertionFailure() << "property " << id << " not set";
+    }
+    if (!value.getFlag()) {
+        return ::testing::AssertionFailure() << "property " << id << " has its flag false";
+    }
+    return ::testing::AssertionSuccess();
+}
+
+inline ::testing::AssertionResult lacksProperty(IC::Node const* node, unsigned int id) {
+    IC::PropertyValue value;
+    if (node->getProperty(id, value).getStatus() == 0) {
+        return ::testing::AssertionFailure() << "property " << id << " is set: " << value;
+    }
+    return ::testing::AssertionSuccess();
+}
+
+// Property id holds an IC::Number of kind UNSIGNED with the given value.
+inline ::testing::AssertionResult hasUnsigned(IC::Node const* node, unsigned int id,
+                                              unsigned int expected) {
+    IC::PropertyValue value;
+    ::testing::AssertionResult read = readProperty(node, id, value);
+    if (!read) {
+        return read;
+    }
+    if (value.getKind() != IC::PropertyValue::NUMBER) {
+        return ::testing::AssertionFailure()
+               << "property " << id << " is of kind " << value.getKind() << ", not a number";
+    }
+    if (value.getNumber().getKind() != IC::Number::UNSIGNED) {
+        return ::testing::AssertionFailure() << "property " << id << " is a number of kind "
+                                             << value.getNumber().getKind() << ", not unsigned";
+    }
+    if (value.getNumber().getUnsigned() != expected) {
+        return ::testing::AssertionFailure()
+               << "property " << id << " is " << value.getNumber().getUnsigned() << ", expected "
+               << expected;
+    }
+    return ::testing::AssertionSuccess();
+}
+
+// Property id holds a vector of IC::Number, each of kind UNSIGNED, with the
+// given values in order.
+inline ::testing::AssertionResult hasUnsignedList(IC::Node const* node, unsigned int id,
+                                                  std::vector<unsigned int> const& expected) {
+    IC::PropertyValue value;
+    ::testing::AssertionResult read = readProperty(node, id, value);
+    if (!read) {
+        return read;
+    }
+    if (value.getKind() != IC::PropertyValue::NUMBERS) {
+        return ::testing::AssertionFailure() << "property " << id << " is of kind "
+                                             << value.getKind() << ", not a vector of numbers";
+    }
+    std::vector<IC::Number> const& numbers = value.getNumbers();
+    if (numbers.size() != expected.size()) {
+        return ::testing::AssertionFailure()
+               << "property " << id << " holds " << numbers.size() << " numbers, expected "
+               << expected.size() << ": " << value;
+    }
+    for (size_t i = 0; i < numbers.size(); ++i) {
+        if (numbers[i].getKind() != IC::Number::UNSIGNED ||
+            numbers[i].getUnsigned() != expected[i]) {
+            return ::testing::AssertionFailure()
+                   << "property " << id << " element " << i << " is " << numbers[i] << " (kind "
+                   << numbers[i].getKind() << "), expected unsigned " << expected[i];
+        }
+    }
+    return ::testing::AssertionSuccess();
+}
+
+// Property id holds a vector of strings equal to the given one.
+inline ::testing::AssertionResult hasStrings(IC::Node const* node, unsigned int id,
+                                             std::vector<std::string> const& expected) {
+    IC::PropertyValue value;
+    ::testing::AssertionResult read = readProperty(node, id, value);
+    if (!read) {
+        return read;
+    }
+    if (value.getKind() != IC::PropertyValue::STRINGS) {
+        return ::testing::AssertionFailure() << "property " << id << " is of kind "
+                                             << value.getKind() << ", not a vector of strings";
+    }
+    if (value.getStrings() != expected) {
+        std::ostringstream wanted;
+        for (std::string const& s : expected) {
+            wanted << "\"" << s << "\" ";
+        }
+        return ::testing::AssertionFailure()
+               << "property " << id << " is " << value << ", expected " << wanted.str();
+    }
+    return ::testing::AssertionSuccess();
+}
+
+// Property id holds an IC::Number of kind VERSION with the given parts.
+inline ::testing::AssertionResult hasVersion(IC::Node const* node, unsigned int id,
+                                             unsigned int major, unsigned int minor) {
+    IC::PropertyValue value;
+    ::testing::AssertionResult read = readProperty(node, id, value);
+    if (!read) {
+        return read;
+    }
+    if (value.getKind() != IC::PropertyValue::NUMBER ||
+        value.getNumber().getKind() != IC::Number::VERSION) {
+        return ::testing::AssertionFailure() << "property " << id << " is " << value << " (kind "
+                                             << value.getKind() << "), not a version number";
+    }
+    IC::Version2 const& version = value.getNumber().getVersion();
+    if (version != IC::Version2(major, minor)) {
+        return ::testing::AssertionFailure()
+               << "property " << id << " is version " << version.getMajor() << "."
+               << version.getMinor() << ", expected " << major << "." << minor;
+    }
+    return ::testing::AssertionSuccess();
+}
+
+// The texts of the captured messages written through the log output (each
+// message is also written through the trace; this keeps one copy), in the
+// order they were written.
+inline std::vector<std::string> loggedTexts() {
+    std::vector<std::string> texts;
+    for (QNLog::QNLogRecord const& record : QNLog::QNLogger::captured()) {
+        if (record.output == "log") {
+            texts.push_back(record.text);
+        }
+    }
+    return texts;
+}
+
+// The levels of the captured log-output messages whose text contains text.
+inline std::vector<int> loggedLevels(std::string const& text) {
+    std::vector<int> levels;
+    for (QNLog::QNLogRecord const& record : QNLog::QNLogger::captured()) {
+        if (record.output == "log" && record.text.find(text) != std::string::npos) {
+            levels.push_back(record.level);
+        }
+    }
+    return levels;
+}
+
+// The first captured log-output message that contains text, or "".
+inline std::string firstLogged(std::string const& text) {
+    for (std::string const& logged : loggedTexts()) {
+        if (logged.find(text) != std::string::npos) {
+            return logged;
+        }
+    }
+    return "";
+}
+
+// Whether this process has acquired its SMBIOS table already. The table is
+// acquired once per process, so an end-to-end test that brings its own
+// override file must be the first to construct an SD::SmBios; CTest runs
+// every test case in a process of its own.
+inline bool tableAlreadyAcquired() { return SD::SMBIOS_CLASS::_smbios != nullptr; }
+
+// Writes dataDir/SmBiosOverride/smbios.txt with an "_SM_" entry point of
+// the given version that describes the table.
+inline void writeOverride(std::string const& dataDir, std::vector<uint8_t> const& table,
+                          uint8_t major, uint8_t minor) {
+    smbiosdump::TableStats const stats = smbiosdump::tableStats(table);
+    std::vector<uint8_t> const header =
+        smbiosdump::makeSmEntryPoint(major, minor, static_cast<uint16_t>(table.size()),
+                                     smbiosdump::DUMP_BIN_TABLE_OFFSET, stats.count, stats.maxSize);
+    smbiostest::writeOverrideDir(dataDir, header, table);
+}
+
+}  // namespace frametest
