@@ -5,6 +5,7 @@
 #pragma once
 
 #include <exception>
+#include <map>
 #include <string>
 #include <typeinfo>
 #include <utility>
@@ -80,8 +81,8 @@ public:
     // offset fails the check against the formatted-area length (logged).
     bool getBool16(SD::SmBios::Table const* t, unsigned char off, unsigned short mask);
     unsigned int getNumber16(SD::SmBios::Table const* t, unsigned char off);
-    unsigned int getEnumValue16(SD::SmBios::Table const* t, unsigned char off,
-                                unsigned short mask, unsigned char shift);
+    unsigned int getEnumValue16(SD::SmBios::Table const* t, unsigned char off, unsigned short mask,
+                                unsigned char shift);
     bool getBool8(SD::SmBios::Table const* t, unsigned char off, unsigned char mask);
     unsigned int getNumber8(SD::SmBios::Table const* t, unsigned char off);
     unsigned int getEnumValue(SD::SmBios::Table const* t, unsigned char off, unsigned char mask);
@@ -123,6 +124,29 @@ public:
     static std::string pB(unsigned char b);
     static std::string pS(char const* s);
 
+    // The eye-catcher of the preboot diagnostics image's OEM string, and
+    // what such a string carries.
+    static std::string const eyecat;
+    struct KVDVersion {
+        std::string text;
+        unsigned int major = 0;
+        unsigned int minor = 0;
+        std::string build;
+    };
+    // Parses a string holding the eye-catcher; false (logged) when it does
+    // not follow the grammar.
+    bool parseKVDString(std::string const& s, KVDVersion& version);
+
+    // The two kinds of probe the sensor builders turn into nodes.
+    struct ProbeKind {
+        unsigned int smbiosType;
+        unsigned int nodeType;
+        double divisor;
+        char const* nominalLabel;
+    };
+    static ProbeKind const temperatureProbe;
+    static ProbeKind const voltageProbe;
+
     unsigned int getSmBiosMajorVersion() const { return smbiosMajorVersion; }
     unsigned int getSmBiosMinorVersion() const { return smbiosMinorVersion; }
 
@@ -133,10 +157,25 @@ protected:
     IC::MutableNode* addNode(IC::MutableNode* node);
     // Makes a node with the next node id under parentId and appends it.
     IC::MutableNode* newNode(unsigned int parentId, unsigned int nodeType, unsigned int index);
+    // Sets the identification, build id and version properties of a
+    // firmware node from its OEM string.
+    void parseFirmwareOemString(std::string const& s, IC::MutableNode* node);
+    // Sensor nodes of one kind of probe at a location.
+    void makeProbeNodes(TableLists tables, unsigned int parentId, unsigned int location,
+                        ProbeKind const& kind, QNLog::QNLogger const& probeLogger);
 
     unsigned int smbiosMajorVersion = 0;
     unsigned int smbiosMinorVersion = 0;
 };
+
+// A copy of s without its trailing blanks, or, when s starts with blanks,
+// from its last leading blank on, as long as s counted from its start.
+std::string trimstr(std::string s);
+
+namespace SMBIOS_MI_SLOT {
+// SMBIOS slot type to the agent's slot type.
+extern std::map<unsigned int, unsigned int> const slotMap;
+}  // namespace SMBIOS_MI_SLOT
 
 extern SmBiosMI mysmbiosmi;
 extern Error myerr;
@@ -152,16 +191,15 @@ extern "C" __attribute__((visibility("default"))) int OpenMI(IC::ManagementInter
 
 // The three handlers that guard the handling of one structure in a builder:
 // the failure is logged and the builder goes on with the next structure.
-#define SMBIOSMI_CATCH_STRUCTURE(logger, tableType, index)                                   \
-    catch (IC::ICException const& e) {                                                       \
-        SMBIOS_ERROR(logger, "ICException=" << e.what() << "Table " << (tableType)           \
-                                            << " index =" << (index));                       \
-    }                                                                                        \
-    catch (std::exception const& e) {                                                        \
-        SMBIOS_ERROR(logger, "Exception=" << e.what() << " Type=" << typeid(e).name()        \
-                                          << "Table " << (tableType) << " index ="           \
-                                          << (index));                                       \
-    }                                                                                        \
-    catch (...) {                                                                            \
-        SMBIOS_ERROR(logger, "Error in table " << (tableType) << " index " << (index));      \
+#define SMBIOSMI_CATCH_STRUCTURE(logger, tableType, index)                                        \
+    catch (IC::ICException const& e) {                                                            \
+        SMBIOS_ERROR(logger, "ICException=" << e.what() << "Table " << (tableType)                \
+                                            << " index =" << (index));                            \
+    }                                                                                             \
+    catch (std::exception const& e) {                                                             \
+        SMBIOS_ERROR(logger, "Exception=" << e.what() << " Type=" << typeid(e).name() << "Table " \
+                                          << (tableType) << " index =" << (index));               \
+    }                                                                                             \
+    catch (...) {                                                                                 \
+        SMBIOS_ERROR(logger, "Error in table " << (tableType) << " index " << (index));           \
     }

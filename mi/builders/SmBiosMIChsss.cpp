@@ -1,14 +1,204 @@
+#include <algorithm>
+#include <cctype>
+
+#include "IC/PropertyValue.h"
 #include "mi/SmBiosMI.h"
+#include "mi/builders/SmBiosMICmptr.h"
 
 namespace IC {
 
 namespace {
 QNLog::QNLogger logger("Quillon.IC.MI.SmBiosMI.SmBiosMIChsss");
+
+char const* const NO_SYSTEM_TABLE = "Bios system information table does not exist";
+
+// System Enclosure or Chassis (type 3) fields.
+unsigned char const MANUFACTURER = 0x04;
+unsigned char const TYPE = 0x05;
+unsigned char const VERSION = 0x06;
+unsigned char const SERIAL = 0x07;
+unsigned char const ASSET_TAG = 0x08;
+unsigned char const BOOT_UP_STATE = 0x09;
+unsigned char const POWER_SUPPLY_STATE = 0x0A;
+unsigned char const THERMAL_STATE = 0x0B;
+unsigned char const SECURITY_STATUS = 0x0C;
+unsigned char const OEM_DEFINED = 0x0D;
+unsigned char const HEIGHT = 0x11;
+unsigned char const POWER_CORDS = 0x12;
+unsigned char const ELEMENT_COUNT = 0x13;
+unsigned char const ELEMENT_RECORD_LENGTH = 0x14;
+unsigned int const ELEMENTS = 0x15;
+
+unsigned int const EXPANSION_CHASSIS = 0x12;
+
+// What a chassis type becomes: the package type (property 11), the kind of
+// enclosure (213), the name (108, null: "Chassis") and whether it is a main
+// chassis, one that may hold the baseboard.
+struct ChassisKind {
+    unsigned int packageType;
+    unsigned int enclosure;
+    char const* name;
+    bool mainChassis;
+};
+
+ChassisKind chassisKind(unsigned int type) {
+    switch (type) {
+        case 0x07:
+            return {0x07, 3, "Tower Chassis", true};
+        case 0x11:
+            return {0x11, 3, "Main Server Chassis", true};
+        case 0x12:
+            return {0x12, 3, "Expansion Chassis", false};
+        case 0x17:
+            return {0x11, 3, "Rack Mount Chassis", true};
+        case 0x19:
+            return {0x01, 3, "Multi System Chassis", true};
+        case 0x1C:
+            return {0x11, 16, "Blade Chassis", true};
+        case 0x1D:
+            return {0x1C, 17, "Blade Enclosure Chassis", false};
+        default:
+            break;
+    }
+    if (type <= 0x02 || type > 0x1D) {
+        return {0, 3, nullptr, false};
+    }
+    return {type, 3, nullptr, false};
+}
+
+// Baseboard types that make a chassis the planar's home when it contains
+// one: Server Blade, Daughter board, Motherboard.
+bool holdsBaseboard(unsigned int element) { return element == 3 || element == 9 || element == 10; }
+
+std::string lowerCase(std::string text) {
+    std::transform(text.begin(), text.end(), text.begin(),
+                   [](unsigned char c) { return static_cast<char>(std::tolower(c)); });
+    return text;
+}
+
 }  // namespace
 
-// Not built yet: logs its entry and exit only.
-void SmBiosMI::makeChassisNodes(TableLists /*lists*/, unsigned int /*parentId*/) {
+// One chassis node per System Enclosure structure (Expansion Chassis
+// excepted) under the computer system, with the system's texts where the
+// chassis leaves its own empty; then the planar builder, once, under the
+// chassis chosen as the baseboard's home.
+void SmBiosMI::makeChassisNodes(TableLists lists, unsigned int parentId) {
     SMBIOS_DETAIL(logger, "makeChassisNodes entry");
+    std::string systemManufacturer = NO_SYSTEM_TABLE;
+    std::string systemProduct = NO_SYSTEM_TABLE;
+    std::string systemSerial = NO_SYSTEM_TABLE;
+    if (lists[1]->empty()) {
+        SMBIOS_DETAIL(logger,
+                      "makeChassisNodes Smbios required system information table does not exist");
+    } else {
+        SD::SmBios::Table const* system = (*lists[1])[0].table;
+        systemManufacturer = getString(system, 0x04);
+        systemProduct = getString(system, 0x05);
+        systemSerial = getString(system, 0x07);
+        SMBIOS_DETAIL(logger, "makeChassisNodes System model = "
+                                  << systemProduct << " system serial = " << systemSerial);
+    }
+    if (lists[3]->empty()) {
+        SMBIOS_DETAIL(logger, "makeChassisNodes exit");
+        return;
+    }
+
+    unsigned int planarParentId = 0;
+    bool mainChassis = false;
+    bool homeFound = false;
+    for (size_t i = 0; i < lists[3]->size(); ++i) {
+        try {
+            TableData& entry = (*lists[3])[i];
+            SD::SmBios::Table const* t = entry.table;
+            SMBIOS_DETAIL(logger, "Table 3 length = " << entry.length);
+            unsigned int const type = getEnumValue(t, TYPE, 0x7F);
+            if (type == EXPANSION_CHASSIS) {
+                continue;
+            }
+            MutableNode* node = newNode(parentId, 1, static_cast<unsigned int>(i));
+            entry.node = node;
+            node->setStatus(1);
+            node->setDescription("Chassis");
+            unsigned int const nodeId = node->getNodeId();
+
+            std::string manufacturer = getString(t, MANUFACTURER);
+            if (manufacturer.empty() || manufacturer == " " || manufacturer == "none") {
+                manufacturer = systemManufacturer;
+            }
+            node->setProperty(36, PropertyValue(manufacturer, true));
+            std::string const partNumber = getPartNum(systemProduct);
+            if (!partNumber.empty()) {
+                node->setProperty(45, PropertyValue(partNumber, true));
+            }
+            propBool8(t, TYPE, 0x80, 10, node);
+
+            SMBIOS_DETAIL(logger, "Chassis Type = " << type);
+            node->setProperty(108, PropertyValue("Chassis", true));
+            ChassisKind const kind = chassisKind(type);
+            if (kind.name != nullptr) {
+                node->setProperty(108, PropertyValue(kind.name, true));
+            }
+            if (kind.mainChassis) {
+                mainChassis = true;
+            }
+
+            if (i == 0) {
+                planarParentId = nodeId;
+            }
+            if (mainChassis && !homeFound) {
+                planarParentId = nodeId;
+                homeFound = true;
+            }
+
+            node->setProperty(39, PropertyValue(systemProduct, true));
+            node->setProperty(11, PropertyValue(EnumValue(kind.packageType), true));
+            node->setProperty(213, PropertyValue(EnumValue(kind.enclosure), true));
+            propString(t, VERSION, 307, node);
+
+            std::string serial = getString(t, SERIAL);
+            if (serial.empty() || serial == " " || lowerCase(serial) == "none") {
+                serial = systemSerial;
+            }
+            node->setProperty(50, PropertyValue(serial, true));
+
+            propString(t, ASSET_TAG, 2, node);
+            propEnumValue(t, BOOT_UP_STATE, 4, node);
+            propEnumValue(t, POWER_SUPPLY_STATE, 46, node);
+            propEnumValue(t, THERMAL_STATE, 60, node);
+            propEnumValue(t, SECURITY_STATUS, 49, node);
+            propBuffer(t, OEM_DEFINED, 4, 43, node);
+            propNumber8(t, HEIGHT, 21, node);
+            propNumber8(t, POWER_CORDS, 42, node);
+
+            // Contained elements: a record's first byte is an SMBIOS
+            // structure type (bit 7 set) or a baseboard type. The records
+            // are read as they stand, even past the structure's end.
+            unsigned int const count = getNumber8(t, ELEMENT_COUNT);
+            unsigned int const recordLength = getNumber8(t, ELEMENT_RECORD_LENGTH);
+            SMBIOS_DETAIL(logger, "Contained Element Record count=" << count);
+            SMBIOS_DETAIL(logger, "Contained Element Record Length=" << recordLength);
+            if (count != 0 && recordLength != 0) {
+                std::string elements;
+                for (unsigned int r = 0; r < count; ++r) {
+                    unsigned int const element = getNumber8Unprot(t, ELEMENTS + r * recordLength);
+                    if ((element & 0x80) != 0) {
+                        elements += " " + std::to_string(element & 0x7F);
+                    } else {
+                        elements += " " + std::to_string(element);
+                        if (holdsBaseboard(element)) {
+                            planarParentId = nodeId;
+                            homeFound = true;
+                        }
+                    }
+                }
+                SMBIOS_DETAIL(logger, "Contained Elements=" << elements);
+            } else {
+                SMBIOS_DETAIL(logger, " < NONE > ");
+            }
+        }
+        SMBIOSMI_CATCH_STRUCTURE(logger, 3, i)
+    }
+    makePlanarNodes(lists, planarParentId);
     SMBIOS_DETAIL(logger, "makeChassisNodes exit");
 }
 

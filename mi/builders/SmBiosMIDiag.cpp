@@ -1,15 +1,124 @@
+#include "IC/PropertyValue.h"
 #include "mi/SmBiosMI.h"
 
 namespace IC {
 
 namespace {
 QNLog::QNLogger logger("Quillon.IC.MI.SmBiosMI.SmBiosMIDiag");
+
+unsigned char const OEM_COUNT = 0x04;
+
+bool isDigit(char c) { return c >= '0' && c <= '9'; }
+
 }  // namespace
 
-// Not built yet: logs its entry and exit only.
-void SmBiosMI::makeKVDNode(TableLists /*tables*/, unsigned int /*parentId*/) {
-    SMBIOS_DETAIL(logger, "makeKVDNode entry");
-    SMBIOS_DETAIL(logger, "makeKVDNode exit");
+// The eye-catcher the preboot diagnostics image leaves in an OEM string.
+std::string const SmBiosMI::eyecat = "$DS Corvane Preboot Diagnostics (KVD)";
+
+// The version and build id of a preboot-diagnostics string:
+// eye-catcher, blanks, MAJOR "." MINOR, blanks, "-[" BUILD "]-".
+bool SmBiosMI::parseKVDString(std::string const& s, KVDVersion& version) {
+    size_t const length = s.size();
+    size_t p = s.find(eyecat) + eyecat.size();
+    while (p < length && s[p] == ' ') {
+        ++p;
+    }
+    if (p >= length) {
+        SMBIOS_DETAIL(logger, "KVD string missing major version info: " << s);
+        return false;
+    }
+    version.text = s.substr(p);
+    SMBIOS_DETAIL(logger, "Found KVD version string: " << version.text);
+    version.major = 0;
+    while (p < length && isDigit(s[p])) {
+        version.major = version.major * 10 + static_cast<unsigned int>(s[p] - '0');
+        ++p;
+    }
+    if (p >= length || s[p] != '.') {
+        SMBIOS_DETAIL(logger, "KVD string version number is not x.y form: " << s);
+        return false;
+    }
+    ++p;
+    version.minor = 0;
+    while (p < length && isDigit(s[p])) {
+        version.minor = version.minor * 10 + static_cast<unsigned int>(s[p] - '0');
+        ++p;
+    }
+    if (p >= length || s[p] != ' ') {
+        SMBIOS_DETAIL(logger, "KVD string version number missing blank termination: " << s);
+        return false;
+    }
+    while (p < length && s[p] == ' ') {
+        ++p;
+    }
+    if (!(p + 4 < length && s.compare(p, 2, "-[") == 0)) {
+        SMBIOS_DETAIL(logger, "KVD version string missing build id: " << s);
+        return false;
+    }
+    size_t const q = p + 2;
+    size_t i = q + 1;
+    while (i < length && s.compare(i, 2, "]-") != 0) {
+        ++i;
+    }
+    if (i >= length) {
+        SMBIOS_DETAIL(logger, "KVD version string missing build id end ']-': " << s);
+        return false;
+    }
+    version.build = s.substr(q, i - q);
+    return true;
+}
+
+// One diagnostics node per OEM Strings structure holding an accepted
+// preboot-diagnostics string (the first one wins), under the planar.
+void SmBiosMI::makeKVDNode(TableLists tables, unsigned int parentId) {
+    SMBIOS_DETAIL(logger, "make"
+                              << "KVD"
+                              << "Nodes entry");
+    for (size_t k = 0; k < tables[11]->size(); ++k) {
+        unsigned int ix = 0;
+        try {
+            TableData& entry = (*tables[11])[k];
+            SD::SmBios::Table const* t = entry.table;
+            unsigned int const count = getNumber8(t, OEM_COUNT);
+            SMBIOS_DETAIL(logger, "String count = " << count);
+            bool accepted = false;
+            KVDVersion version;
+            for (ix = 1; ix <= count && !accepted; ++ix) {
+                SMBIOS_DETAIL(logger, "Reading ix = " << ix);
+                std::string const s = getStrByIdx(t, static_cast<unsigned char>(ix));
+                SMBIOS_DETAIL(logger, "Read string " << ix << ": " << s);
+                if (s.find(eyecat) == std::string::npos) {
+                    continue;
+                }
+                SMBIOS_DETAIL(logger, "Found KVD string: " << s);
+                accepted = parseKVDString(s, version);
+            }
+            if (accepted) {
+                SMBIOS_DETAIL(logger, "Table " << 11 << " length = " << entry.length);
+                MutableNode* node = newNode(parentId, 53, static_cast<unsigned int>(k));
+                entry.node = node;
+                node->setStatus(1);
+                node->setDescription("Corvane Preboot Diagnostics (KVD)");
+                node->setProperty(134, PropertyValue(version.text, true));
+                node->setProperty(104, PropertyValue(Number(version.major), true));
+                node->setProperty(107, PropertyValue(Number(version.minor), true));
+                node->setProperty(171, PropertyValue(version.build, true));
+            }
+        } catch (ICException const& e) {
+            SMBIOS_ERROR(logger, "ICException=" << e.what() << " Table " << 11 << " index =" << k
+                                                << "string index = " << ix);
+        } catch (std::exception const& e) {
+            SMBIOS_ERROR(logger, "Exception=" << e.what() << " Type=" << typeid(e).name()
+                                              << " Table " << 11 << " index =" << k
+                                              << "string index = " << ix);
+        } catch (...) {
+            SMBIOS_ERROR(logger,
+                         "Error in table " << 11 << " index " << k << "string index = " << ix);
+        }
+    }
+    SMBIOS_DETAIL(logger, "make"
+                              << "KVD"
+                              << "Nodes exit");
 }
 
 }  // namespace IC

@@ -1,15 +1,65 @@
+#include "IC/PropertyValue.h"
 #include "mi/SmBiosMI.h"
 
 namespace IC {
 
 namespace {
 QNLog::QNLogger logger("Quillon.IC.MI.SmBiosMI.SmBiosMIDiskCtrlr");
+
+unsigned char const OEM_COUNT = 0x04;
+char const* const IDE_ENABLED = "$IS IDE Bus Enabled";
+char const* const IDE_DISABLED = "$IS IDE Bus Disabled";
+
+// The text without its trailing blanks; a text of blanks only stays as it is.
+std::string withoutTrailingBlanks(std::string const& text) {
+    size_t const last = text.find_last_not_of(' ');
+    return last == std::string::npos ? text : text.substr(0, last + 1);
+}
+
 }  // namespace
 
-// Not built yet: logs its entry and exit only.
-void SmBiosMI::makeDiskControllerNodes(TableLists /*tables*/, unsigned int /*parentId*/) {
-    SMBIOS_DETAIL(logger, "makeDiskControllerNodes entry");
-    SMBIOS_DETAIL(logger, "makeDiskControllerNodes exit");
+// The on-board IDE bus, announced by an OEM string: one disk-controller node
+// per OEM Strings structure that holds "$IS IDE Bus Enabled" or "... Disabled".
+// Every OEM Strings structure uses up a node id, whether it makes a node or not.
+void SmBiosMI::makeDiskControllerNodes(TableLists tables, unsigned int parentId) {
+    SMBIOS_DETAIL(logger, "make"
+                              << "DiskController"
+                              << "Nodes entry");
+    for (size_t k = 0; k < tables[11]->size(); ++k) {
+        try {
+            TableData& entry = (*tables[11])[k];
+            SD::SmBios::Table const* t = entry.table;
+            unsigned int const count = getNumber8(t, OEM_COUNT);
+            unsigned int const nodeId = takeNodeId();
+            if (count == 0) {
+                continue;
+            }
+            for (unsigned int i = 1; i <= count; ++i) {
+                std::string const text =
+                    withoutTrailingBlanks(getStrByIdx(t, static_cast<unsigned char>(i)));
+                bool const enabled = text == IDE_ENABLED;
+                if (!enabled && text != IDE_DISABLED) {
+                    continue;
+                }
+                MutableNode* node = addNode(new MutableNode(nodeId, parentId, miIdList, 50, 1));
+                entry.node = node;
+                node->setProperty(
+                    125, PropertyValue(std::vector<Number>{Number(1u), Number(16u)}, true));
+                node->setProperty(85, PropertyValue(Number(0u), true));
+                node->setProperty(185, PropertyValue(Number(36u), true));
+                node->setProperty(81, PropertyValue(Number(2u), true));
+                node->setStatus(enabled ? 1 : 16);
+                node->setProperty(128, PropertyValue("IDE Bus", true));
+                node->setDescription("IDE Bus");
+                node->setProperty(44, PropertyValue("Other", true));
+                break;
+            }
+        }
+        SMBIOSMI_CATCH_STRUCTURE(logger, 8, k)
+    }
+    SMBIOS_DETAIL(logger, "make"
+                              << "DiskController"
+                              << "Nodes exit");
 }
 
 }  // namespace IC

@@ -1,15 +1,82 @@
+#include "IC/PropertyValue.h"
 #include "mi/SmBiosMI.h"
 
 namespace IC {
 
 namespace {
 QNLog::QNLogger logger("Quillon.IC.MI.SmBiosMI.SmBiosMILog");
+
+// System Event Log (type 15) fields.
+unsigned char const HANDLE = 0x02;
+unsigned char const AREA_LENGTH = 0x04;
+unsigned char const HEADER_START = 0x06;
+unsigned char const DATA_START = 0x08;
+unsigned char const ACCESS_METHOD = 0x0A;
+unsigned char const LOG_STATUS = 0x0B;
+unsigned char const CHANGE_TOKEN = 0x0C;
+unsigned char const ACCESS_ADDRESS = 0x10;
+unsigned char const HEADER_FORMAT = 0x14;
+unsigned char const DESCRIPTOR_COUNT = 0x15;
+unsigned char const DESCRIPTOR_LENGTH = 0x16;
+unsigned int const DESCRIPTORS = 0x17;
+
+// The text a byte vector has as a property value.
+std::string bytesText(std::vector<unsigned char> const& bytes) {
+    return PropertyValue(bytes, true).toString();
+}
+
 }  // namespace
 
-// Not built yet: logs its entry and exit only.
-void SmBiosMI::makeLogNodes(TableLists /*tables*/, unsigned int /*parentId*/) {
-    SMBIOS_DETAIL(logger, "makeLogNodes entry");
-    SMBIOS_DETAIL(logger, "makeLogNodes exit");
+// One event-log node per System Event Log structure under the given parent
+// (every firmware node, and every BMC node, gets its own).
+void SmBiosMI::makeLogNodes(TableLists tables, unsigned int parentId) {
+    SMBIOS_DETAIL(logger, "make"
+                              << "Log"
+                              << "Nodes entry");
+    for (size_t k = 0; k < tables[15]->size(); ++k) {
+        try {
+            TableData& entry = (*tables[15])[k];
+            SD::SmBios::Table const* t = entry.table;
+            SMBIOS_DETAIL(logger, "Table " << 15 << " length = " << entry.length);
+            MutableNode* node = newNode(parentId, 35, static_cast<unsigned int>(k));
+            entry.node = node;
+            node->setDescription("SmBios System Event Log");
+            node->setProperty(108, PropertyValue("System Management BIOS System Event Log", true));
+            unsigned int const areaLength = getNumber16(t, AREA_LENGTH);
+            node->setProperty(37, PropertyValue(Number(areaLength), true));
+            if (areaLength == 0) {
+                node->setStatus(16);
+            } else {
+                node->setStatus(30);
+                if (getBool8(t, LOG_STATUS, 1)) {
+                    node->setStatus(getBool8(t, LOG_STATUS, 2) ? 31 : 1);
+                }
+            }
+            node->setProperty(125, PropertyValue(std::vector<Number>{Number(30u), Number(1u),
+                                                                     Number(16u), Number(31u)},
+                                                 true));
+
+            SMBIOS_DETAIL(logger, "Handle=" << getNumber16(t, HANDLE));
+            SMBIOS_DETAIL(logger, "Log Header Start offset=" << getNumber16(t, HEADER_START));
+            SMBIOS_DETAIL(logger, "Log Data Start offset=" << getNumber16(t, DATA_START));
+            SMBIOS_DETAIL(logger, "Access Method=" << getNumber8(t, ACCESS_METHOD));
+            SMBIOS_DETAIL(logger, "Log Status=" << getNumber8(t, LOG_STATUS));
+            SMBIOS_DETAIL(logger, "Log Change Status=" << bytesText(getBuffer(t, CHANGE_TOKEN, 4)));
+            SMBIOS_DETAIL(logger,
+                          "Access Method Address=" << bytesText(getBuffer(t, ACCESS_ADDRESS, 4)));
+            SMBIOS_DETAIL(logger, "Log Header Format=" << getNumber8(t, HEADER_FORMAT));
+            unsigned int const descriptorCount = getNumber8(t, DESCRIPTOR_COUNT);
+            unsigned int const descriptorLength = getNumber8(t, DESCRIPTOR_LENGTH);
+            SMBIOS_DETAIL(logger, "Number of Log Type Descriptors=" << descriptorCount);
+            SMBIOS_DETAIL(logger, "Log Type Descriptor Length=" << descriptorLength);
+            SMBIOS_DETAIL(logger, "Log Type Descriptors=" << bytesText(getBufferUnprot(
+                                      t, DESCRIPTORS, descriptorCount * descriptorLength)));
+        }
+        SMBIOSMI_CATCH_STRUCTURE(logger, 15, k)
+    }
+    SMBIOS_DETAIL(logger, "make"
+                              << "Log"
+                              << "Nodes exit");
 }
 
 }  // namespace IC

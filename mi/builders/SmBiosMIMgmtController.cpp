@@ -6,10 +6,26 @@ namespace {
 QNLog::QNLogger logger("Quillon.IC.MI.SmBiosMI.SmBiosMIMgmtController");
 }  // namespace
 
-// Not built yet: logs its entry and exit only.
-void SmBiosMI::makeBMCNodes(TableLists /*tables*/, unsigned int /*parentId*/) {
-    SMBIOS_DETAIL(logger, "makeBMCNodes entry");
-    SMBIOS_DETAIL(logger, "makeBMCNodes exit");
+// One BMC node per IPMI Device Information structure under the given parent,
+// with the event-log and firmware nodes under it.
+void SmBiosMI::makeBMCNodes(TableLists tables, unsigned int parentId) {
+    SMBIOS_DETAIL(logger, "make"
+                              << "BMC"
+                              << "Nodes entry");
+    for (size_t k = 0; k < tables[38]->size(); ++k) {
+        try {
+            SMBIOS_DETAIL(logger, "Table " << 38 << " length = " << (*tables[38])[k].length);
+            MutableNode* node = newNode(parentId, 13, static_cast<unsigned int>(k));
+            node->setStatus(1);
+            node->setDescription("BMC");
+            makeLogNodes(tables, node->getNodeId());
+            makeFirmwareNodes(tables, node->getNodeId());
+        }
+        SMBIOSMI_CATCH_STRUCTURE(logger, 38, k)
+    }
+    SMBIOS_DETAIL(logger, "make"
+                              << "BMC"
+                              << "Nodes exit");
 }
 
 }  // namespace IC

@@ -1,14 +1,217 @@
+#include <memory>
+
+#include "IC/PropertyValue.h"
 #include "mi/SmBiosMI.h"
 
 namespace IC {
 
 namespace {
 QNLog::QNLogger logger("Quillon.IC.MI.SmBiosMI.SmBiosMIPlnr");
+
+// Baseboard Information (type 2) fields.
+unsigned char const HANDLE = 0x02;
+unsigned char const MANUFACTURER = 0x04;
+unsigned char const PRODUCT = 0x05;
+unsigned char const SERIAL = 0x07;
+unsigned char const ASSET_TAG = 0x08;
+unsigned char const FEATURE_FLAGS = 0x09;
+unsigned char const LOCATION = 0x0A;
+unsigned char const CHASSIS_HANDLE = 0x0B;
+unsigned char const BOARD_TYPE = 0x0D;
+unsigned char const CONTAINED_COUNT = 0x0E;
+unsigned int const CONTAINED_HANDLES = 0x0F;
+
+// Which baseboard becomes the planar: the first of these board types found
+// in the list, in this order of preference.
+unsigned int const BOARD_PRIORITY[] = {0x0A, 0x03, 0x0B, 0x0C, 0x06, 0x02, 0x09,
+                                       0x05, 0x08, 0x07, 0x04, 0x0D, 0x01};
+
 }  // namespace
 
-// Not built yet: logs its entry and exit only.
-void SmBiosMI::makePlanarNodes(TableLists /*tables*/, unsigned int /*parentNodeId*/) {
+// The planar (baseboard) node under the chassis chosen as its home, and the
+// hub of the component builders: they all hang under the planar. With a
+// baseboard structure the planar takes the structures over into groups of
+// its own; without one a bare planar node is made and the builders run, in
+// another order, on the shared groups.
+void SmBiosMI::makePlanarNodes(TableLists tables, unsigned int parentNodeId) {
     SMBIOS_DETAIL(logger, "makePlanarNodes entry");
+    std::string manufacturer = "Bios system information table does not exist";
+    if (tables[1]->empty()) {
+        SMBIOS_DETAIL(logger,
+                      "makePlanarNodes Smbios required system information table does not exist");
+    } else {
+        manufacturer = getString((*tables[1])[0].table, 0x04);
+        SMBIOS_DETAIL(logger, "makePlanarNodes system manufacturer = " << manufacturer);
+    }
+
+    Node* parent = nullptr;
+    for (Node* candidate : nodeList) {
+        if (candidate->getNodeId() == parentNodeId) {
+            parent = candidate;
+            break;
+        }
+    }
+    if (parent == nullptr) {
+        SMBIOS_DETAIL(
+            logger, "makePlanarNodes Exit: failed to find parent node for nodeid " << parentNodeId);
+        return;
+    }
+    if (manufacturer.empty()) {
+        PropertyValue value;
+        if (parent->getProperty(36, value).getStatus() == 0) {
+            manufacturer = value.getString();
+        }
+        SMBIOS_DETAIL(logger, "makePlanarNodes chassis manufacturer = " << manufacturer);
+    }
+
+    if (tables[2]->empty()) {
+        SMBIOS_DETAIL(logger, "No Table 2 for Planar");
+        try {
+            MutableNode* node = newNode(parentNodeId, 41, 0);
+            node->setStatus(1);
+            node->setDescription("Planar");
+            unsigned int const planarId = node->getNodeId();
+            makeCpuNodes(tables, planarId);
+            makeSlotNodes(tables, planarId);
+            makeConnectorNodes(tables, planarId);
+            makeDimmNodes(tables, planarId);
+            makeFirmwareNodes(tables, planarId);
+            makeDiskControllerNodes(tables, planarId);
+            makeKVDNode(tables, planarId);
+            makeSMBIOSTableNodes(tables, planarId);
+        }
+        SMBIOSMI_CATCH_STRUCTURE(logger, 2, 0)
+        SMBIOS_DETAIL(logger, "makePlanarNodes exit");
+        return;
+    }
+
+    size_t chosen = 0;
+    bool matched = false;
+    for (unsigned int boardType : BOARD_PRIORITY) {
+        for (size_t k = 0; k < tables[2]->size() && !matched; ++k) {
+            if (getNumber8((*tables[2])[k].table, BOARD_TYPE) == boardType) {
+                chosen = k;
+                matched = true;
+            }
+        }
+        if (matched) {
+            break;
+        }
+    }
+
+    std::unique_ptr<std::vector<TableData>> owners[256];
+    try {
+        TableData& entry = (*tables[2])[chosen];
+        SD::SmBios::Table const* t = entry.table;
+        SMBIOS_DETAIL(logger, "Table 2 length = " << entry.length);
+        MutableNode* node = newNode(parentNodeId, 41, 0);
+        entry.node = node;
+        node->setStatus(1);
+        node->setDescription("Planar");
+        unsigned int const planarId = node->getNodeId();
+        unsigned int const handle = getNumber16(t, HANDLE);
+
+        propString(t, MANUFACTURER, 36, node);
+        propString(t, PRODUCT, 39, node);
+        std::string const product = getString(t, PRODUCT);
+        if (!product.empty()) {
+            node->setProperty(172, PropertyValue(product, true));
+            parent->setProperty(172, PropertyValue(product, true));
+        }
+        propString(t, SERIAL, 50, node);
+        propString(t, ASSET_TAG, 2, node);
+        propEnumValue(t, FEATURE_FLAGS, 44, node);
+        std::string const location = getString(t, LOCATION);
+        if (!location.empty()) {
+            node->setProperty(31, PropertyValue(location, true));
+            parent->setProperty(31, PropertyValue(location, true));
+        }
+        SMBIOS_DETAIL(logger, "Handle=" << getNumber16(t, CHASSIS_HANDLE));
+        node->setProperty(128, PropertyValue(Number(getNumber8(t, BOARD_TYPE)), true));
+
+        // The planar takes every structure over into groups of its own; the
+        // shared groups are left empty.
+        std::vector<TableData>* groups[256];
+        for (unsigned int type = 0; type < 256; ++type) {
+            owners[type].reset(new std::vector<TableData>());
+            groups[type] = owners[type].get();
+            while (!tables[type]->empty()) {
+                groups[type]->push_back(tables[type]->front());
+                tables[type]->erase(tables[type]->begin());
+            }
+        }
+
+        unsigned int const count = getNumber8(t, CONTAINED_COUNT);
+        SMBIOS_DETAIL(logger, "Count of contained object handles=" << count);
+        if (count != 0) {
+            unsigned int const needed = 15 + 2 * count;
+            if (needed > 255) {
+                SMBIOS_DETAIL(logger, "Length of contained object handles "
+                                          << needed << " exceeds 255 table length");
+            } else {
+                std::vector<unsigned int> handles;
+                std::string listed;
+                for (unsigned int i = 0; i < count; ++i) {
+                    handles.push_back(
+                        getNumber16(t, static_cast<unsigned char>(CONTAINED_HANDLES + 2 * i)));
+                    listed += std::to_string(handles.back()) + " ";
+                }
+                SMBIOS_DETAIL(logger, "Handles="
+                                          << "{ " << listed << "}");
+                for (unsigned int contained : handles) {
+                    bool found = false;
+                    for (unsigned int type = 0; type < 256 && !found; ++type) {
+                        for (TableData const& member : *groups[type]) {
+                            if (getNumber16(member.table, HANDLE) == contained) {
+                                SMBIOS_DETAIL(logger, "Planar contained element handle "
+                                                          << contained << " found in Bios table "
+                                                          << static_cast<unsigned int>(
+                                                                 member.table->getByte(0)));
+                                found = true;
+                                break;
+                            }
+                        }
+                    }
+                    if (!found) {
+                        SMBIOS_DETAIL(logger, "Planar contained element handle "
+                                                  << contained << " not found in Bios tables ");
+                    }
+                }
+            }
+        }
+
+        // The baseboard's handle goes where the lookup takes a type, and 2
+        // where it takes a handle: the lookup serves the log only.
+        std::vector<std::pair<unsigned char, unsigned int>> const associations =
+            findGroup(groups, handle, 2);
+        if (!associations.empty()) {
+            SMBIOS_DETAIL(logger, " Planar Group Associations Exist: ");
+            for (auto const& member : associations) {
+                SMBIOS_DETAIL(logger, "    Table Type=" << static_cast<unsigned int>(member.first)
+                                                        << " Handle=" << member.second);
+            }
+        }
+
+        makeCpuNodes(groups, planarId);
+        makeSlotNodes(groups, planarId);
+        makeConnectorNodes(groups, planarId);
+        makeDimmNodes(groups, planarId);
+        makeDiskControllerNodes(groups, planarId);
+        makeSMBIOSTableNodes(groups, planarId);
+        makeFirmwareNodes(groups, planarId);
+        makeKVDNode(groups, planarId);
+
+        for (unsigned int type = 0; type < 256; ++type) {
+            if (!groups[type]->empty()) {
+                SMBIOS_DETAIL(logger, "Table(s) for index " << type);
+                for (TableData const& member : *groups[type]) {
+                    SMBIOS_DETAIL(logger, "   Pointer = " << static_cast<void const*>(member.table)
+                                                          << " length = " << member.length);
+                }
+            }
+        }
+    }
+    SMBIOSMI_CATCH_STRUCTURE(logger, 2, chosen)
     SMBIOS_DETAIL(logger, "makePlanarNodes exit");
 }
 

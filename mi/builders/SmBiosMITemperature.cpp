@@ -1,15 +1,94 @@
+#include "IC/PropertyValue.h"
 #include "mi/SmBiosMI.h"
 
 namespace IC {
 
 namespace {
 QNLog::QNLogger logger("Quillon.IC.MI.SmBiosMI.SmBiosMITemperature");
+
+// Probe fields, shared by the temperature (type 28) and voltage (type 26)
+// probes.
+unsigned char const DESCRIPTION = 0x04;
+unsigned char const LOCATION_AND_STATUS = 0x05;
+unsigned char const MAXIMUM = 0x06;
+unsigned char const MINIMUM = 0x08;
+unsigned char const OEM_DEFINED = 0x10;
+unsigned char const NOMINAL = 0x14;
+unsigned int const NOMINAL_UNKNOWN = 0x800;
+unsigned int const LIMIT_UNKNOWN = 0x8000;
+
 }  // namespace
 
-// Not built yet: logs its entry and exit only.
-void SmBiosMI::makeTemperatureSensorNodes(TableLists /*tables*/, unsigned int /*parentId*/, unsigned int /*location*/) {
-    SMBIOS_DETAIL(logger, "makeTemperatureSensorNodes entry");
-    SMBIOS_DETAIL(logger, "makeTemperatureSensorNodes exit");
+SmBiosMI::ProbeKind const SmBiosMI::temperatureProbe = {28, 22, 10.0,
+                                                        "Temperature in 0.1 degrees="};
+
+// One sensor node per probe at the given location, under the given parent.
+// The readings are unsigned words scaled by the probe's divisor.
+void SmBiosMI::makeProbeNodes(TableLists tables, unsigned int parentId, unsigned int location,
+                              ProbeKind const& kind, QNLog::QNLogger const& probeLogger) {
+    std::vector<TableData>& probes = *tables[kind.smbiosType];
+    for (size_t k = 0; k < probes.size(); ++k) {
+        try {
+            TableData& entry = probes[k];
+            SD::SmBios::Table const* t = entry.table;
+            SMBIOS_DETAIL(probeLogger, "Table " << kind.smbiosType << " length = " << entry.length);
+            unsigned int const locationAndStatus = getNumber8(t, LOCATION_AND_STATUS);
+            if ((locationAndStatus & 0x1F) != location) {
+                continue;
+            }
+            MutableNode* node = newNode(parentId, kind.nodeType, static_cast<unsigned int>(k));
+            entry.node = node;
+            switch ((locationAndStatus & 0xE0) >> 5) {
+                case 3:  // OK
+                    node->setStatus(1);
+                    break;
+                case 4:  // non-critical
+                    node->setStatus(21);
+                    break;
+                case 5:  // critical
+                    node->setStatus(24);
+                    [[fallthrough]];
+                case 6:  // non-recoverable
+                    node->setStatus(27);
+                    [[fallthrough]];
+                default:
+                    node->setStatus(0);
+            }
+            node->setProperty(125,
+                              PropertyValue(std::vector<Number>{Number(1u), Number(0u), Number(21u),
+                                                                Number(24u), Number(27u)},
+                                            true));
+            node->setDescription(getString(t, DESCRIPTION));
+            node->setProperty(31, PropertyValue(Number(locationAndStatus & 0x1F), true));
+            propBuffer(t, OEM_DEFINED, 4, 43, node);
+            unsigned int const nominal = getNumber16(t, NOMINAL);
+            if (nominal != NOMINAL_UNKNOWN) {
+                SMBIOS_DETAIL(probeLogger, kind.nominalLabel << nominal);
+                node->setProperty(14, PropertyValue(Number(nominal / kind.divisor), true));
+            }
+            unsigned int const maximum = getNumber16(t, MAXIMUM);
+            if (maximum != LIMIT_UNKNOWN) {
+                node->setProperty(23, PropertyValue(Number(maximum / kind.divisor), true));
+            }
+            unsigned int const minimum = getNumber16(t, MINIMUM);
+            if (minimum != LIMIT_UNKNOWN) {
+                node->setProperty(33, PropertyValue(Number(minimum / kind.divisor), true));
+            }
+        }
+        SMBIOSMI_CATCH_STRUCTURE(probeLogger, kind.smbiosType, k)
+    }
+}
+
+// Temperature sensor nodes for the temperature probes at a location.
+void SmBiosMI::makeTemperatureSensorNodes(TableLists tables, unsigned int parentId,
+                                          unsigned int location) {
+    SMBIOS_DETAIL(logger, "make"
+                              << "TemperatureSensor"
+                              << "Nodes entry");
+    makeProbeNodes(tables, parentId, location, temperatureProbe, logger);
+    SMBIOS_DETAIL(logger, "make"
+                              << "TemperatureSensor"
+                              << "Nodes exit");
 }
 
 }  // namespace IC

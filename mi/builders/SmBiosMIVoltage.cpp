@@ -6,10 +6,18 @@ namespace {
 QNLog::QNLogger logger("Quillon.IC.MI.SmBiosMI.SmBiosMIVoltage");
 }  // namespace
 
-// Not built yet: logs its entry and exit only.
-void SmBiosMI::makeVoltageSensorNodes(TableLists /*tables*/, unsigned int /*parentId*/, unsigned int /*location*/) {
-    SMBIOS_DETAIL(logger, "makeVoltageSensorNodes entry");
-    SMBIOS_DETAIL(logger, "makeVoltageSensorNodes exit");
+SmBiosMI::ProbeKind const SmBiosMI::voltageProbe = {26, 21, 1000.0, "Millivolts="};
+
+// Voltage sensor nodes for the voltage probes at a location.
+void SmBiosMI::makeVoltageSensorNodes(TableLists tables, unsigned int parentId,
+                                      unsigned int location) {
+    SMBIOS_DETAIL(logger, "make"
+                              << "VoltageSensor"
+                              << "Nodes entry");
+    makeProbeNodes(tables, parentId, location, voltageProbe, logger);
+    SMBIOS_DETAIL(logger, "make"
+                              << "VoltageSensor"
+                              << "Nodes exit");
 }
 
 }  // namespace IC
