@@ -29,7 +29,8 @@ std::vector<unsigned char> syntheticTable(unsigned int count) {
 }
 
 void BM_ParseTable(benchmark::State& state) {
-    std::vector<unsigned char> const raw = syntheticTable(static_cast<unsigned int>(state.range(0)));
+    std::vector<unsigned char> const raw =
+        syntheticTable(static_cast<unsigned int>(state.range(0)));
     for (auto _ : state) {
         SD::SmBios parsed(raw);
         benchmark::DoNotOptimize(parsed.getTables().data());

@@ -57,8 +57,8 @@ void SmBiosMI::makeSMBIOSTableNodes(TableLists lists, unsigned int parentId) {
                     SMBIOS_ERROR(logger, "Exception=" << e.what() << " Type=" << typeid(e).name()
                                                       << " index =" << position);
                 } catch (ICException const& e) {
-                    SMBIOS_ERROR(logger, "ICException=" << e.what() << "Table 4 index ="
-                                                        << position);
+                    SMBIOS_ERROR(logger,
+                                 "ICException=" << e.what() << "Table 4 index =" << position);
                 } catch (...) {
                     SMBIOS_ERROR(logger, "Error in table 4 index " << position);
                 }

@@ -16,16 +16,16 @@ int const LOG_ERROR = 6000;
 
 }  // namespace SD
 
-#define SMBIOS_LOG(logger, level, expr)                                                         \
-    do {                                                                                        \
-        if (QNLog::QNLogger::isLevelEnabled(level)) {                                           \
-            QNLog::QNMessageBuffer smbiosLogBuffer_;                                            \
-            smbiosLogBuffer_ << expr;                                                           \
-            QNLog::QNLogger::logLevelMessage(__func__, __FILE__, __LINE__, logger, level,       \
-                                             smbiosLogBuffer_);                                 \
-            QNLog::QNLogger::traceLevelMessage(__func__, __FILE__, __LINE__, logger, level,     \
-                                               smbiosLogBuffer_);                               \
-        }                                                                                       \
+#define SMBIOS_LOG(logger, level, expr)                                                     \
+    do {                                                                                    \
+        if (QNLog::QNLogger::isLevelEnabled(level)) {                                       \
+            QNLog::QNMessageBuffer smbiosLogBuffer_;                                        \
+            smbiosLogBuffer_ << expr;                                                       \
+            QNLog::QNLogger::logLevelMessage(__func__, __FILE__, __LINE__, logger, level,   \
+                                             smbiosLogBuffer_);                             \
+            QNLog::QNLogger::traceLevelMessage(__func__, __FILE__, __LINE__, logger, level, \
+                                               smbiosLogBuffer_);                           \
+        }                                                                                   \
     } while (0)
 
 #define SMBIOS_DETAIL(logger, expr) SMBIOS_LOG(logger, SD::LOG_DETAIL, expr)

@@ -44,7 +44,8 @@ PMem::PMem() : DynamicLibrary(enterConstructor()) {
                      "Constructor could not load library '" << name << "' - exception return");
         throw std::runtime_error("PMEM: could not load library '" + name + "'.");
     }
-    PMemIsInitializedFn isInitialized = lookUp<PMemIsInitializedFn>(getHandle(), "PMemIsInitialized");
+    PMemIsInitializedFn isInitialized =
+        lookUp<PMemIsInitializedFn>(getHandle(), "PMemIsInitialized");
     if (isInitialized == nullptr || isInitialized() == 0) {
         unload();
         SMBIOS_ERROR(loggerPMem,

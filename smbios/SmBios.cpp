@@ -102,9 +102,9 @@ SmBios::String SmBios::Table::getString(unsigned char index) const {
         return nullptr;
     }
     if (index > strCount_) {
-        SMBIOS_DETAIL(loggerSmBios, "Table::getString index "
-                                        << static_cast<unsigned int>(index) << " > max of "
-                                        << strCount_ << " return null char* pointer");
+        SMBIOS_DETAIL(loggerSmBios, "Table::getString index " << static_cast<unsigned int>(index)
+                                                              << " > max of " << strCount_
+                                                              << " return null char* pointer");
         return nullptr;
     }
     // The string set starts right after the formatted area; the last byte of

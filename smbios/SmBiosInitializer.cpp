@@ -72,9 +72,9 @@ SmBiosInitializer::SmBiosInitializer() : SmBios(SMBIOS_MI_INIT::_empty) {
         std::vector<std::string> head;
         std::vector<std::string> tables;
         if (importSmBios(path, head, tables) == 0) {
-            SMBIOS_DETAIL(loggerSmBiosInitializer,
-                          "Constructor using " << path
-                                               << " instead of this machine's SmBios Tables");
+            SMBIOS_DETAIL(
+                loggerSmBiosInitializer,
+                "Constructor using " << path << " instead of this machine's SmBios Tables");
             acquireFromFile(path, head, tables);
         } else {
             acquireFromMemory();
@@ -111,8 +111,8 @@ void SmBiosInitializer::acquireFromFile(std::string const&, std::vector<std::str
                        "Constructor readHead() return code " << headResult);
         return;
     }
-    bool const smAnchor = header.size() > SM_MINOR && header[0] == '_' &&
-                          std::memcmp(&header[1], "SM_", 3) == 0;
+    bool const smAnchor =
+        header.size() > SM_MINOR && header[0] == '_' && std::memcmp(&header[1], "SM_", 3) == 0;
     bool const dmiAnchor = !smAnchor && header.size() >= 5 && header[0] == '_' &&
                            std::memcmp(&header[1], "DMI_", 4) == 0;
     unsigned char major = 0;
@@ -360,8 +360,7 @@ int readHead(std::vector<unsigned char>& bytes, std::vector<std::string> const& 
         return 12;
     }
     if (head[2].size() % 2 != 0) {
-        SMBIOS_WARNING(loggerSmBiosInitializer,
-                       "readHead() third line odd number of hex digits ");
+        SMBIOS_WARNING(loggerSmBiosInitializer, "readHead() third line odd number of hex digits ");
         return 16;
     }
     int const result = byteHex(head[2], bytes);
@@ -413,8 +412,8 @@ int byteHex(std::string const& text, std::vector<unsigned char>& bytes) {
         } else if (c >= 'A' && c <= 'F') {
             value = static_cast<unsigned int>(c - 'A' + 10);
         } else {
-            SMBIOS_WARNING(loggerSmBiosInitializer, "byteHex: Invalid hexadecimal digit "
-                                                        << c << " at offset " << i);
+            SMBIOS_WARNING(loggerSmBiosInitializer,
+                           "byteHex: Invalid hexadecimal digit " << c << " at offset " << i);
             return 32;
         }
         if (highNibble) {
