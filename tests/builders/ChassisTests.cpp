@@ -1,0 +1,775 @@
+// The chassis builder: one chassis node per System Enclosure structure
+// (type 3) under the computer system, the chassis-type table, the fallbacks
+// to the System Information texts, and the choice of the chassis that the
+// planar hangs under.
+#include <gtest/gtest.h>
+
+#include <cstdint>
+#include <sstream>
+#include <string>
+#include <vector>
+
+#include "BuilderFixture.h"
+
+using buildertest::hasBytes;
+using buildertest::hasEnum;
+using buildertest::hasNodeType;
+using buildertest::hasString;
+using buildertest::hasUnsigned;
+using buildertest::lacksProperty;
+using buildertest::nodesOfType;
+using buildertest::propertyIds;
+using buildertest::StructureLists;
+using buildertest::TestMI;
+using smbiostest::Structure;
+using smbiostest::TableBuilder;
+
+namespace {
+
+std::string const NO_SYSTEM = "Bios system information table does not exist";
+
+uint8_t const DESKTOP = 0x03;
+uint8_t const TOWER = 0x07;
+uint8_t const MAIN_SERVER = 0x11;
+uint8_t const EXPANSION = 0x12;
+uint8_t const RACK_MOUNT = 0x17;
+uint8_t const BLADE = 0x1C;
+uint8_t const BLADE_ENCLOSURE = 0x1D;
+
+uint8_t const SERVER_BLADE_ELEMENT = 0x03;
+uint8_t const DAUGHTER_BOARD_ELEMENT = 0x09;
+uint8_t const MOTHERBOARD_ELEMENT = 0x0A;
+
+// A System Information structure (type 1).
+Structure systemInformation(uint16_t handle, std::string const& product = "RS-7400 [7947AC1]",
+                            std::string const& serial = "SYS-0001") {
+    return Structure(1, handle)
+        .str("Corvane")
+        .str(product)
+        .str("V1.2")
+        .str(serial)
+        .bytes(std::vector<uint8_t>(16, 0x11))
+        .byte(0x06)
+        .str("SKU-77")
+        .str("Server");
+}
+
+// The fields of a System Enclosure structure (SMBIOS 2.3 layout).
+struct ChassisFields {
+    std::string manufacturer = "Chassis Maker";
+    uint8_t type = DESKTOP;
+    std::string version = "CV-1";
+    std::string serial = "CH-0001";
+    std::string assetTag = "AT-9";
+    uint8_t bootUpState = 3;
+    uint8_t powerSupplyState = 4;
+    uint8_t thermalState = 5;
+    uint8_t securityStatus = 2;
+    uint32_t oemDefined = 0x04030201;
+    uint8_t height = 2;
+    uint8_t powerCords = 1;
+    // The first byte of each contained element record; each record is
+    // recordLength bytes long (the rest: minimum and maximum counts).
+    std::vector<uint8_t> elements;
+    uint8_t recordLength = 3;
+};
+
+ChassisFields ofType(uint8_t type, std::vector<uint8_t> const& elements = {}) {
+    ChassisFields fields;
+    fields.type = type;
+    fields.elements = elements;
+    return fields;
+}
+
+Structure chassis(uint16_t handle, ChassisFields const& fields) {
+    Structure structure(3, handle);
+    structure.str(fields.manufacturer)
+        .byte(fields.type)
+        .str(fields.version)
+        .str(fields.serial)
+        .str(fields.assetTag)
+        .byte(fields.bootUpState)
+        .byte(fields.powerSupplyState)
+        .byte(fields.thermalState)
+        .byte(fields.securityStatus)
+        .dword(fields.oemDefined)
+        .byte(fields.height)
+        .byte(fields.powerCords)
+        .byte(static_cast<uint8_t>(fields.elements.size()))
+        .byte(fields.elements.empty() ? 0 : fields.recordLength);
+    for (uint8_t element : fields.elements) {
+        structure.byte(element);
+        for (unsigned int i = 1; i < fields.recordLength; ++i) {
+            structure.byte(1);
+        }
+    }
+    return structure;
+}
+
+// A baseboard (type 2) with a product and a location.
+Structure baseboard(uint16_t handle) {
+    return Structure(2, handle)
+        .str("Board Maker")
+        .str("MB-100")
+        .str("")
+        .str("BRD-1")
+        .str("")
+        .byte(0x01)
+        .str("Slot A")
+        .word(0x0300)
+        .byte(0x0A)
+        .byte(0);
+}
+
+// The builder run over a table under a computer-system parent (node id 2);
+// the planar builder and everything below it run as well.
+struct ChassisRun {
+    explicit ChassisRun(TableBuilder const& table)
+        : parsed(frametest::parse(table)), lists(parsed) {
+        computer = buildertest::addParent(mi, 40);
+        mi.makeChassisNodes(lists.get(), computer->getNodeId());
+    }
+
+    std::vector<IC::Node*> chassisNodes() const { return nodesOfType(mi, 1); }
+    // The id the planar hangs under, or 0 when there is no planar.
+    unsigned int planarParent() const {
+        std::vector<IC::Node*> const planars = nodesOfType(mi, 41);
+        return planars.size() == 1 ? planars[0]->getLinkedId() : 0;
+    }
+
+    SD::SmBios parsed;
+    StructureLists lists;
+    TestMI mi;
+    IC::MutableNode* computer = nullptr;
+};
+
+// The numbers logged after "Contained Elements=", in order.
+std::vector<unsigned int> loggedElements() {
+    std::string const line = frametest::firstLogged("Contained Elements=");
+    std::vector<unsigned int> numbers;
+    if (line.empty()) {
+        return numbers;
+    }
+    std::istringstream in(line.substr(line.find('=') + 1));
+    unsigned int number = 0;
+    while (in >> number) {
+        numbers.push_back(number);
+    }
+    return numbers;
+}
+
+// What the chassis-type table gives for a chassis type.
+struct Expected {
+    unsigned int packageType;
+    unsigned int enclosure;
+    std::string name;
+    bool mainChassis;
+};
+
+Expected expectedFor(unsigned int type) {
+    switch (type) {
+        case 0x07:
+            return {0x07, 3, "Tower Chassis", true};
+        case 0x11:
+            return {0x11, 3, "Main Server Chassis", true};
+        case 0x17:
+            return {0x11, 3, "Rack Mount Chassis", true};
+        case 0x19:
+            return {0x01, 3, "Multi System Chassis", true};
+        case 0x1C:
+            return {0x11, 16, "Blade Chassis", true};
+        case 0x1D:
+            return {0x1C, 17, "Blade Enclosure Chassis", false};
+        default:
+            break;
+    }
+    if (type <= 0x02 || type > 0x1D) {
+        return {0, 3, "Chassis", false};
+    }
+    return {type, 3, "Chassis", false};
+}
+
+}  // namespace
+
+// ---------------------------------------------------------------------------
+// The node and its properties
+
+TEST(ChassisBuilder, FullStructureGivesOneChassisNodeWithEveryProperty) {
+    smbiostest::LogCapture log;
+    ChassisFields fields = ofType(0x80 | RACK_MOUNT);
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    table.add(chassis(0x0300, fields));
+    table.endOfTable(0xFEFF);
+    ChassisRun run(table);
+
+    std::vector<IC::Node*> const nodes = run.chassisNodes();
+    ASSERT_EQ(1u, nodes.size()) << log.dump();
+    IC::Node const* node = nodes[0];
+    EXPECT_EQ(3u, node->getNodeId());
+    EXPECT_EQ(run.computer->getNodeId(), node->getLinkedId());
+    EXPECT_TRUE(hasNodeType(node, 1));
+    EXPECT_EQ(0u, node->getIndex());
+    EXPECT_EQ(1u, node->getStatus());
+    EXPECT_EQ("Chassis", node->getDescription());
+    EXPECT_EQ(run.mi.miIdList, node->getMIIds());
+    EXPECT_EQ(node, run.lists.storage[3][0].node);
+
+    EXPECT_EQ((std::vector<unsigned int>{2, 4, 10, 11, 21, 36, 39, 42, 43, 45, 46, 49, 50, 60, 108,
+                                         213, 307}),
+              propertyIds(node));
+    EXPECT_TRUE(hasString(node, 36, "Chassis Maker"));
+    EXPECT_TRUE(hasString(node, 45, "7947"));
+    EXPECT_TRUE(buildertest::hasBool(node, 10, true));
+    EXPECT_TRUE(hasString(node, 108, "Rack Mount Chassis"));
+    EXPECT_TRUE(hasString(node, 39, "RS-7400 [7947AC1]"));
+    EXPECT_TRUE(hasEnum(node, 11, 4, 17));
+    EXPECT_TRUE(hasEnum(node, 213, 4, 3));
+    EXPECT_TRUE(hasString(node, 307, "CV-1"));
+    EXPECT_TRUE(hasString(node, 50, "CH-0001"));
+    EXPECT_TRUE(hasString(node, 2, "AT-9"));
+    EXPECT_TRUE(hasEnum(node, 4, 1, 3));
+    EXPECT_TRUE(hasEnum(node, 46, 1, 4));
+    EXPECT_TRUE(hasEnum(node, 60, 1, 5));
+    EXPECT_TRUE(hasEnum(node, 49, 1, 2));
+    EXPECT_TRUE(hasBytes(node, 43, {0x04, 0x03, 0x02, 0x01}));
+    EXPECT_TRUE(hasUnsigned(node, 21, 2));
+    EXPECT_TRUE(hasUnsigned(node, 42, 1));
+
+    // The planar (no baseboard structure: a bare one) hangs under it.
+    EXPECT_EQ(node->getNodeId(), run.planarParent()) << log.dump();
+    EXPECT_EQ(2u, log.count("makeChassisNodes entry")) << log.dump();
+    EXPECT_EQ(2u, log.count("makeChassisNodes exit")) << log.dump();
+    EXPECT_EQ(2u, log.count("makeChassisNodes System model = RS-7400 [7947AC1] system "
+                            "serial = SYS-0001"))
+        << log.dump();
+    EXPECT_EQ(2u, log.count("Table 3 length = 21")) << log.dump();
+    EXPECT_EQ(2u, log.count("Chassis Type = 23")) << log.dump();
+    EXPECT_EQ(2u, log.count("makePlanarNodes entry")) << log.dump();
+}
+
+TEST(ChassisBuilder, LockBitClearSetsProperty10False) {
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    table.add(chassis(0x0300, ofType(TOWER)));
+    ChassisRun run(table);
+    std::vector<IC::Node*> const nodes = run.chassisNodes();
+    ASSERT_EQ(1u, nodes.size());
+    EXPECT_TRUE(buildertest::hasBool(nodes[0], 10, false));
+    EXPECT_TRUE(hasString(nodes[0], 108, "Tower Chassis"));
+}
+
+TEST(ChassisBuilder, NoChassisStructureMakesNoChassisAndNoPlanar) {
+    smbiostest::LogCapture log;
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    table.add(baseboard(0x0200));
+    table.endOfTable(0xFEFF);
+    ChassisRun run(table);
+
+    ASSERT_EQ(1u, run.mi.nodeList.size());
+    EXPECT_EQ(run.computer, run.mi.nodeList[0]);
+    EXPECT_EQ(3u, run.mi.nextNodeId);
+    EXPECT_EQ(2u, log.count("makeChassisNodes exit")) << log.dump();
+    EXPECT_EQ(0u, log.count("makePlanarNodes entry")) << log.dump();
+    EXPECT_EQ(0u, log.count("makeCpuNodes entry")) << log.dump();
+    EXPECT_EQ(1u, run.lists.storage[2].size());
+}
+
+TEST(ChassisBuilder, ShortSmbios20StructureLacksTheLaterFields) {
+    smbiostest::LogCapture log;
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    table.add(Structure(3, 0x0300)
+                  .str("Chassis Maker")
+                  .byte(MAIN_SERVER)
+                  .str("CV-1")
+                  .str("CH-7")
+                  .str("AT-9"));
+    ChassisRun run(table);
+    ASSERT_EQ(9u, run.parsed.getTables()[1].getLength());
+
+    std::vector<IC::Node*> const nodes = run.chassisNodes();
+    ASSERT_EQ(1u, nodes.size());
+    EXPECT_EQ((std::vector<unsigned int>{2, 10, 11, 36, 39, 45, 50, 108, 213, 307}),
+              propertyIds(nodes[0]));
+    EXPECT_TRUE(hasString(nodes[0], 108, "Main Server Chassis"));
+    EXPECT_TRUE(hasString(nodes[0], 50, "CH-7"));
+    for (unsigned int id : {4u, 46u, 60u, 49u, 43u, 21u, 42u}) {
+        EXPECT_TRUE(lacksProperty(nodes[0], id)) << "property " << id;
+    }
+    EXPECT_TRUE(log.contains("Contained Element Record count=0")) << log.dump();
+    EXPECT_TRUE(log.contains("Contained Element Record Length=0")) << log.dump();
+    EXPECT_TRUE(log.contains(" < NONE > ")) << log.dump();
+    EXPECT_EQ(nodes[0]->getNodeId(), run.planarParent());
+}
+
+TEST(ChassisBuilder, BaseboardAddsItsProductAndLocationToTheHomeChassis) {
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    table.add(chassis(0x0300, ofType(DESKTOP)));
+    table.add(chassis(0x0301, ofType(MAIN_SERVER)));
+    table.add(baseboard(0x0200));
+    ChassisRun run(table);
+
+    std::vector<IC::Node*> const nodes = run.chassisNodes();
+    ASSERT_EQ(2u, nodes.size());
+    EXPECT_EQ(nodes[1]->getNodeId(), run.planarParent());
+    EXPECT_TRUE(hasString(nodes[1], 172, "MB-100"));
+    EXPECT_TRUE(hasString(nodes[1], 31, "Slot A"));
+    EXPECT_TRUE(lacksProperty(nodes[0], 172));
+    EXPECT_TRUE(lacksProperty(nodes[0], 31));
+}
+
+// ---------------------------------------------------------------------------
+// The chassis-type table
+
+TEST(ChassisType, EveryChassisTypeMapsAsTheTableSays) {
+    for (unsigned int type = 0; type < 0x80; ++type) {
+        SCOPED_TRACE("chassis type " + std::to_string(type));
+        // A Desktop first, the type under test second: a main chassis takes
+        // the planar from the Desktop.
+        TableBuilder table;
+        table.add(systemInformation(0x0100));
+        table.add(chassis(0x0300, ofType(DESKTOP)));
+        table.add(chassis(0x0301, ofType(static_cast<uint8_t>(type))));
+        ChassisRun run(table);
+        std::vector<IC::Node*> const nodes = run.chassisNodes();
+        if (type == EXPANSION) {
+            ASSERT_EQ(1u, nodes.size());
+            EXPECT_EQ(0u, nodes[0]->getIndex());
+            EXPECT_EQ(nodes[0]->getNodeId(), run.planarParent());
+            continue;
+        }
+        ASSERT_EQ(2u, nodes.size());
+        IC::Node const* node = nodes[1];
+        Expected const expected = expectedFor(type);
+        EXPECT_EQ(1u, node->getIndex());
+        EXPECT_TRUE(hasEnum(node, 11, 4, expected.packageType));
+        EXPECT_TRUE(hasEnum(node, 213, 4, expected.enclosure));
+        EXPECT_TRUE(hasString(node, 108, expected.name));
+        EXPECT_TRUE(buildertest::hasBool(node, 10, false));
+        EXPECT_EQ(expected.mainChassis ? node->getNodeId() : nodes[0]->getNodeId(),
+                  run.planarParent());
+    }
+}
+
+TEST(ChassisType, LockBitIsMaskedOffTheChassisType) {
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    table.add(chassis(0x0300, ofType(0x80 | BLADE_ENCLOSURE)));
+    ChassisRun run(table);
+    std::vector<IC::Node*> const nodes = run.chassisNodes();
+    ASSERT_EQ(1u, nodes.size());
+    EXPECT_TRUE(buildertest::hasBool(nodes[0], 10, true));
+    EXPECT_TRUE(hasEnum(nodes[0], 11, 4, 0x1C));
+    EXPECT_TRUE(hasString(nodes[0], 108, "Blade Enclosure Chassis"));
+}
+
+TEST(ChassisType, RackMountChassisGetsPackageType17AndItsName) {
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    table.add(chassis(0x0300, ofType(DESKTOP)));
+    table.add(chassis(0x0301, ofType(RACK_MOUNT)));
+    ChassisRun run(table);
+    std::vector<IC::Node*> const nodes = run.chassisNodes();
+    ASSERT_EQ(2u, nodes.size());
+    EXPECT_TRUE(hasEnum(nodes[1], 11, 4, 17));
+    EXPECT_TRUE(hasEnum(nodes[1], 213, 4, 3));
+    EXPECT_TRUE(hasString(nodes[1], 108, "Rack Mount Chassis"));
+    // A main chassis: it takes the planar.
+    EXPECT_EQ(nodes[1]->getNodeId(), run.planarParent());
+}
+
+TEST(ChassisType, BladeGetsPackageType17AndEnclosureKind16) {
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    table.add(chassis(0x0300, ofType(DESKTOP)));
+    table.add(chassis(0x0301, ofType(BLADE)));
+    ChassisRun run(table);
+    std::vector<IC::Node*> const nodes = run.chassisNodes();
+    ASSERT_EQ(2u, nodes.size());
+    EXPECT_TRUE(hasEnum(nodes[1], 11, 4, 0x11));
+    EXPECT_TRUE(hasEnum(nodes[1], 213, 4, 16));
+    EXPECT_TRUE(hasString(nodes[1], 108, "Blade Chassis"));
+    EXPECT_EQ(nodes[1]->getNodeId(), run.planarParent());
+}
+
+TEST(ChassisType, BladeEnclosureGetsPackageType0x1CAndEnclosureKind17AndIsNotMain) {
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    table.add(chassis(0x0300, ofType(DESKTOP)));
+    table.add(chassis(0x0301, ofType(BLADE_ENCLOSURE)));
+    ChassisRun run(table);
+    std::vector<IC::Node*> const nodes = run.chassisNodes();
+    ASSERT_EQ(2u, nodes.size());
+    EXPECT_TRUE(hasEnum(nodes[1], 11, 4, 0x1C));
+    EXPECT_TRUE(hasEnum(nodes[1], 213, 4, 17));
+    EXPECT_TRUE(hasString(nodes[1], 108, "Blade Enclosure Chassis"));
+    // Not a main chassis: the planar stays with the first chassis.
+    EXPECT_EQ(nodes[0]->getNodeId(), run.planarParent());
+}
+
+TEST(ChassisType, MultiSystemChassisGetsPackageType1AndIsMain) {
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    table.add(chassis(0x0300, ofType(DESKTOP)));
+    table.add(chassis(0x0301, ofType(0x19)));
+    ChassisRun run(table);
+    std::vector<IC::Node*> const nodes = run.chassisNodes();
+    ASSERT_EQ(2u, nodes.size());
+    EXPECT_TRUE(hasEnum(nodes[1], 11, 4, 1));
+    EXPECT_TRUE(hasString(nodes[1], 108, "Multi System Chassis"));
+    EXPECT_EQ(nodes[1]->getNodeId(), run.planarParent());
+}
+
+TEST(ChassisType, ExpansionChassisGetsNoNodeButKeepsItsIndexPosition) {
+    smbiostest::LogCapture log;
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    table.add(chassis(0x0300, ofType(TOWER)));
+    table.add(chassis(0x0301, ofType(EXPANSION)));
+    table.add(chassis(0x0302, ofType(DESKTOP)));
+    ChassisRun run(table);
+
+    std::vector<IC::Node*> const nodes = run.chassisNodes();
+    ASSERT_EQ(2u, nodes.size()) << log.dump();
+    EXPECT_EQ(0u, nodes[0]->getIndex());
+    EXPECT_EQ(2u, nodes[1]->getIndex());
+    // The expansion chassis takes no node id either.
+    EXPECT_EQ(nodes[0]->getNodeId() + 1, nodes[1]->getNodeId());
+    EXPECT_EQ(nullptr, run.lists.storage[3][1].node);
+    EXPECT_EQ(6u, log.count("Table 3 length = ")) << log.dump();
+    EXPECT_EQ(0u, log.count("Chassis Type = 18")) << log.dump();
+}
+
+// ---------------------------------------------------------------------------
+// Texts taken from the System Information structure
+
+TEST(ChassisFallback, NoSystemInformationStructureFallsBackToTheMissingTableSentence) {
+    smbiostest::LogCapture log;
+    ChassisFields fields = ofType(TOWER);
+    fields.manufacturer = "";
+    fields.serial = "";
+    TableBuilder table;
+    table.add(chassis(0x0300, fields));
+    ChassisRun run(table);
+
+    std::vector<IC::Node*> const nodes = run.chassisNodes();
+    ASSERT_EQ(1u, nodes.size());
+    EXPECT_TRUE(hasString(nodes[0], 36, NO_SYSTEM));
+    EXPECT_TRUE(hasString(nodes[0], 39, NO_SYSTEM));
+    EXPECT_TRUE(hasString(nodes[0], 50, NO_SYSTEM));
+    EXPECT_TRUE(lacksProperty(nodes[0], 45));
+    EXPECT_EQ(2u, log.count("makeChassisNodes Smbios required system information table does "
+                            "not exist"))
+        << log.dump();
+    EXPECT_EQ(0u, log.count("makeChassisNodes System model = ")) << log.dump();
+}
+
+TEST(ChassisFallback, NoSystemInformationStructureKeepsTheChassisOwnTexts) {
+    TableBuilder table;
+    table.add(chassis(0x0300, ofType(TOWER)));
+    ChassisRun run(table);
+    std::vector<IC::Node*> const nodes = run.chassisNodes();
+    ASSERT_EQ(1u, nodes.size());
+    EXPECT_TRUE(hasString(nodes[0], 36, "Chassis Maker"));
+    EXPECT_TRUE(hasString(nodes[0], 39, NO_SYSTEM));
+    EXPECT_TRUE(hasString(nodes[0], 50, "CH-0001"));
+}
+
+TEST(ChassisFallback, ManufacturerFallsBackOnEmptyBlankAndLowerCaseNoneOnly) {
+    struct Case {
+        std::string manufacturer;
+        std::string expected;
+    };
+    std::vector<Case> const cases = {{"", "Corvane"},     {" ", "Corvane"},
+                                     {"none", "Corvane"}, {"NONE", "NONE"},
+                                     {"None", "None"},    {"  ", "  "},
+                                     {"none ", "none "},  {"Chassis Maker", "Chassis Maker"}};
+    for (Case const& c : cases) {
+        SCOPED_TRACE("chassis manufacturer \"" + c.manufacturer + "\"");
+        ChassisFields fields = ofType(TOWER);
+        fields.manufacturer = c.manufacturer;
+        TableBuilder table;
+        table.add(systemInformation(0x0100));
+        table.add(chassis(0x0300, fields));
+        ChassisRun run(table);
+        std::vector<IC::Node*> const nodes = run.chassisNodes();
+        ASSERT_EQ(1u, nodes.size());
+        EXPECT_TRUE(hasString(nodes[0], 36, c.expected));
+    }
+}
+
+TEST(ChassisFallback, SerialFallsBackOnEmptyBlankAndNoneInAnyCase) {
+    struct Case {
+        std::string serial;
+        std::string expected;
+    };
+    std::vector<Case> const cases = {
+        {"", "SYS-0001"},     {" ", "SYS-0001"}, {"none", "SYS-0001"}, {"NONE", "SYS-0001"},
+        {"NoNe", "SYS-0001"}, {"  ", "  "},      {"NONE1", "NONE1"},   {"CH-0001", "CH-0001"}};
+    for (Case const& c : cases) {
+        SCOPED_TRACE("chassis serial \"" + c.serial + "\"");
+        ChassisFields fields = ofType(TOWER);
+        fields.serial = c.serial;
+        TableBuilder table;
+        table.add(systemInformation(0x0100));
+        table.add(chassis(0x0300, fields));
+        ChassisRun run(table);
+        std::vector<IC::Node*> const nodes = run.chassisNodes();
+        ASSERT_EQ(1u, nodes.size());
+        EXPECT_TRUE(hasString(nodes[0], 50, c.expected));
+    }
+}
+
+TEST(ChassisFallback, SystemTextsComeFromTheFirstSystemInformationStructure) {
+    TableBuilder table;
+    table.add(systemInformation(0x0100, "First [1111AB1]", "SYS-1"));
+    table.add(systemInformation(0x0101, "Second [2222AB2]", "SYS-2"));
+    ChassisFields fields = ofType(TOWER);
+    fields.serial = "NONE";
+    table.add(chassis(0x0300, fields));
+    ChassisRun run(table);
+    std::vector<IC::Node*> const nodes = run.chassisNodes();
+    ASSERT_EQ(1u, nodes.size());
+    EXPECT_TRUE(hasString(nodes[0], 39, "First [1111AB1]"));
+    EXPECT_TRUE(hasString(nodes[0], 45, "1111"));
+    EXPECT_TRUE(hasString(nodes[0], 50, "SYS-1"));
+}
+
+TEST(ChassisFallback, ProductWithoutPartNumberSetsNoProperty45) {
+    TableBuilder table;
+    table.add(systemInformation(0x0100, "RS-7400"));
+    table.add(chassis(0x0300, ofType(TOWER)));
+    ChassisRun run(table);
+    std::vector<IC::Node*> const nodes = run.chassisNodes();
+    ASSERT_EQ(1u, nodes.size());
+    EXPECT_TRUE(lacksProperty(nodes[0], 45));
+    EXPECT_TRUE(hasString(nodes[0], 39, "RS-7400"));
+}
+
+// ---------------------------------------------------------------------------
+// The chassis the planar hangs under
+
+TEST(ChassisPlanarHome, SingleChassisThatIsNotMainHoldsThePlanar) {
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    table.add(chassis(0x0300, ofType(DESKTOP)));
+    ChassisRun run(table);
+    std::vector<IC::Node*> const nodes = run.chassisNodes();
+    ASSERT_EQ(1u, nodes.size());
+    EXPECT_EQ(nodes[0]->getNodeId(), run.planarParent());
+}
+
+TEST(ChassisPlanarHome, SecondChassisBeingMainServerHoldsThePlanar) {
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    table.add(chassis(0x0300, ofType(DESKTOP)));
+    table.add(chassis(0x0301, ofType(MAIN_SERVER)));
+    ChassisRun run(table);
+    std::vector<IC::Node*> const nodes = run.chassisNodes();
+    ASSERT_EQ(2u, nodes.size());
+    EXPECT_EQ(nodes[1]->getNodeId(), run.planarParent());
+}
+
+TEST(ChassisPlanarHome, FirstMainChassisWinsOverALaterOne) {
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    table.add(chassis(0x0300, ofType(DESKTOP)));
+    table.add(chassis(0x0301, ofType(TOWER)));
+    table.add(chassis(0x0302, ofType(RACK_MOUNT)));
+    ChassisRun run(table);
+    std::vector<IC::Node*> const nodes = run.chassisNodes();
+    ASSERT_EQ(3u, nodes.size());
+    EXPECT_EQ(nodes[1]->getNodeId(), run.planarParent());
+}
+
+TEST(ChassisPlanarHome, MotherboardElementInTheFirstWinsOverALaterMainChassis) {
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    table.add(chassis(0x0300, ofType(DESKTOP, {MOTHERBOARD_ELEMENT})));
+    table.add(chassis(0x0301, ofType(MAIN_SERVER)));
+    ChassisRun run(table);
+    std::vector<IC::Node*> const nodes = run.chassisNodes();
+    ASSERT_EQ(2u, nodes.size());
+    EXPECT_EQ(nodes[0]->getNodeId(), run.planarParent());
+}
+
+TEST(ChassisPlanarHome, LaterChassisWithABaseboardElementWinsOverAnEarlierOne) {
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    table.add(chassis(0x0300, ofType(DESKTOP, {MOTHERBOARD_ELEMENT})));
+    table.add(chassis(0x0301, ofType(MAIN_SERVER)));
+    table.add(chassis(0x0302, ofType(DESKTOP, {DAUGHTER_BOARD_ELEMENT})));
+    ChassisRun run(table);
+    std::vector<IC::Node*> const nodes = run.chassisNodes();
+    ASSERT_EQ(3u, nodes.size());
+    EXPECT_EQ(nodes[2]->getNodeId(), run.planarParent());
+}
+
+TEST(ChassisPlanarHome, ServerBladeElementWinsOverAnEarlierMainChassis) {
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    table.add(chassis(0x0300, ofType(MAIN_SERVER)));
+    table.add(chassis(0x0301, ofType(BLADE_ENCLOSURE, {0x83, SERVER_BLADE_ELEMENT})));
+    ChassisRun run(table);
+    std::vector<IC::Node*> const nodes = run.chassisNodes();
+    ASSERT_EQ(2u, nodes.size());
+    EXPECT_EQ(nodes[1]->getNodeId(), run.planarParent());
+}
+
+TEST(ChassisPlanarHome, OtherElementsAndStructureTypesDoNotMakeAHome) {
+    // 0x04 is a connectivity switch; 0x83, 0x89 and 0x8A name SMBIOS
+    // structure types 3, 9 and 10, not baseboards.
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    table.add(chassis(0x0300, ofType(DESKTOP)));
+    table.add(chassis(0x0301, ofType(DESKTOP, {0x04, 0x83, 0x89, 0x8A, 0x01, 0x02})));
+    ChassisRun run(table);
+    std::vector<IC::Node*> const nodes = run.chassisNodes();
+    ASSERT_EQ(2u, nodes.size());
+    EXPECT_EQ(nodes[0]->getNodeId(), run.planarParent());
+}
+
+TEST(ChassisPlanarHome, NoMainChassisAndNoElementLeavesTheFirstChassis) {
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    table.add(chassis(0x0300, ofType(0x01)));
+    table.add(chassis(0x0301, ofType(DESKTOP)));
+    table.add(chassis(0x0302, ofType(BLADE_ENCLOSURE)));
+    ChassisRun run(table);
+    std::vector<IC::Node*> const nodes = run.chassisNodes();
+    ASSERT_EQ(3u, nodes.size());
+    EXPECT_EQ(nodes[0]->getNodeId(), run.planarParent());
+}
+
+TEST(ChassisPlanarHome, ExpansionChassisFirstLeavesTheHomeAtZeroAndThePlanarFindsNoParent) {
+    smbiostest::LogCapture log;
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    table.add(chassis(0x0300, ofType(EXPANSION)));
+    table.add(chassis(0x0301, ofType(DESKTOP)));
+    ChassisRun run(table);
+
+    std::vector<IC::Node*> const nodes = run.chassisNodes();
+    ASSERT_EQ(1u, nodes.size());
+    EXPECT_EQ(1u, nodes[0]->getIndex());
+    EXPECT_TRUE(nodesOfType(run.mi, 41).empty());
+    EXPECT_EQ(2u, log.count("makePlanarNodes Exit: failed to find parent node for nodeid 0"))
+        << log.dump();
+    EXPECT_EQ(0u, log.count("makeCpuNodes entry")) << log.dump();
+}
+
+TEST(ChassisPlanarHome, ExpansionChassisFirstThenMainChassisHoldsThePlanar) {
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    table.add(chassis(0x0300, ofType(EXPANSION)));
+    table.add(chassis(0x0301, ofType(TOWER)));
+    ChassisRun run(table);
+    std::vector<IC::Node*> const nodes = run.chassisNodes();
+    ASSERT_EQ(1u, nodes.size());
+    EXPECT_EQ(nodes[0]->getNodeId(), run.planarParent());
+}
+
+TEST(ChassisPlanarHome, ExpansionChassisFirstThenBaseboardElementHoldsThePlanar) {
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    table.add(chassis(0x0300, ofType(EXPANSION)));
+    table.add(chassis(0x0301, ofType(DESKTOP, {MOTHERBOARD_ELEMENT})));
+    ChassisRun run(table);
+    std::vector<IC::Node*> const nodes = run.chassisNodes();
+    ASSERT_EQ(1u, nodes.size());
+    EXPECT_EQ(nodes[0]->getNodeId(), run.planarParent());
+}
+
+TEST(ChassisPlanarHome, EveryChassisAnExpansionChassisCallsThePlanarBuilderWithParentZero) {
+    smbiostest::LogCapture log;
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    table.add(chassis(0x0300, ofType(EXPANSION)));
+    table.add(chassis(0x0301, ofType(0x80 | EXPANSION)));
+    ChassisRun run(table);
+
+    EXPECT_TRUE(run.chassisNodes().empty());
+    EXPECT_EQ(1u, run.mi.nodeList.size());
+    EXPECT_EQ(2u, log.count("makePlanarNodes entry")) << log.dump();
+    EXPECT_EQ(2u, log.count("makePlanarNodes Exit: failed to find parent node for nodeid 0"))
+        << log.dump();
+}
+
+// ---------------------------------------------------------------------------
+// Contained elements
+
+TEST(ChassisContainedElements, StructureTypesAreLoggedAsTheirLowSevenBits) {
+    smbiostest::LogCapture log;
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    table.add(chassis(0x0300, ofType(TOWER, {0x83, 0x0A, 0x91, 0x04, 0xFF})));
+    ChassisRun run(table);
+
+    EXPECT_EQ(2u, log.count("Contained Element Record count=5")) << log.dump();
+    EXPECT_EQ(2u, log.count("Contained Element Record Length=3")) << log.dump();
+    EXPECT_EQ((std::vector<unsigned int>{3, 10, 17, 4, 127}), loggedElements()) << log.dump();
+    EXPECT_EQ(0u, log.count(" < NONE > ")) << log.dump();
+}
+
+TEST(ChassisContainedElements, NoRecordsLogNone) {
+    smbiostest::LogCapture log;
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    table.add(chassis(0x0300, ofType(TOWER)));
+    ChassisRun run(table);
+    EXPECT_EQ(2u, log.count("Contained Element Record count=0")) << log.dump();
+    EXPECT_EQ(2u, log.count(" < NONE > ")) << log.dump();
+    EXPECT_EQ(0u, log.count("Contained Elements=")) << log.dump();
+}
+
+TEST(ChassisContainedElements, RecordCountWithoutRecordLengthLogsNone) {
+    smbiostest::LogCapture log;
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    ChassisFields fields = ofType(DESKTOP, {MOTHERBOARD_ELEMENT, MOTHERBOARD_ELEMENT});
+    fields.recordLength = 0;
+    table.add(chassis(0x0300, fields));
+    table.add(chassis(0x0301, ofType(TOWER)));
+    ChassisRun run(table);
+
+    EXPECT_EQ(2u, log.count("Contained Element Record count=2")) << log.dump();
+    // Both chassis log a record length of 0 and no records.
+    EXPECT_EQ(4u, log.count("Contained Element Record Length=0")) << log.dump();
+    EXPECT_EQ(4u, log.count(" < NONE > ")) << log.dump();
+    // The records were not read: the main chassis holds the planar.
+    std::vector<IC::Node*> const nodes = run.chassisNodes();
+    ASSERT_EQ(2u, nodes.size());
+    EXPECT_EQ(nodes[1]->getNodeId(), run.planarParent());
+}
+
+TEST(ChassisContainedElements, RecordsRunningPastTheStructureAreReadAsTheyStand) {
+    smbiostest::LogCapture log;
+    // Two records of one byte, of which only the first lies in the
+    // formatted area; the second is the first byte of the string set, the
+    // 'C' (67) of "Corvane".
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    table.add(Structure(3, 0x0300)
+                  .str("Corvane")
+                  .byte(DESKTOP)
+                  .str("")
+                  .str("")
+                  .str("")
+                  .byte(3)
+                  .byte(3)
+                  .byte(3)
+                  .byte(3)
+                  .dword(0)
+                  .byte(0)
+                  .byte(1)
+                  .byte(2)
+                  .byte(1)
+                  .byte(0x91));
+    ChassisRun run(table);
+    ASSERT_EQ(0x16u, run.parsed.getTables()[1].getLength());
+    EXPECT_EQ((std::vector<unsigned int>{17, 67}), loggedElements()) << log.dump();
+    EXPECT_EQ(1u, run.chassisNodes().size());
+}

@@ -1,0 +1,247 @@
+// makeConnectorNodes: a port-connector node under the planar for each Port
+// Connector Information structure (type 8) whose internal reference
+// designator contains "Compute ITE", with the designator and the port type.
+#include <gtest/gtest.h>
+
+#include <cstdint>
+#include <string>
+#include <vector>
+
+#include "BuilderFixture.h"
+#include "QNLog/QNLogger.h"
+#include "smbios/SmBios.h"
+
+using buildertest::addParent;
+using buildertest::hasEnum;
+using buildertest::hasNodeType;
+using buildertest::hasString;
+using buildertest::nodesOfType;
+using buildertest::propertyIds;
+using buildertest::StructureLists;
+using buildertest::TestMI;
+using smbiostest::Structure;
+using smbiostest::TableBuilder;
+
+namespace {
+
+char const* const CONNECTOR_LOGGER = "Quillon.IC.MI.SmBiosMI.SmBiosMIConnector";
+unsigned int const CONNECTOR_NODE = 70;
+
+// A Port Connector Information structure (length 9): internal designator
+// (0x04), internal connector type, external designator (0x06), external
+// connector type, port type (0x08).
+Structure connector(uint16_t handle, std::string const& internal, uint8_t portType,
+                    std::string const& external = "") {
+    return Structure(8, handle)
+        .str(internal)
+        .byte(0x00)  // none
+        .str(external)
+        .byte(0x12)  // access bus (USB)
+        .byte(portType);
+}
+
+// The texts the connector builder itself logged (log output only), in order.
+std::vector<std::string> connectorLog() {
+    std::vector<std::string> texts;
+    for (QNLog::QNLogRecord const& record : QNLog::QNLogger::captured()) {
+        if (record.output == "log" && record.logger == CONNECTOR_LOGGER) {
+            texts.push_back(record.text);
+        }
+    }
+    return texts;
+}
+
+// The connector nodes the builder makes from a table, under a planar.
+struct ConnectorRun {
+    explicit ConnectorRun(TableBuilder const& table) : parsed(table.build()), lists(parsed) {
+        planar = addParent(mi);
+    }
+
+    std::vector<IC::Node*> run() {
+        mi.makeConnectorNodes(lists.get(), planar->getNodeId());
+        return nodesOfType(mi, CONNECTOR_NODE);
+    }
+
+    SD::SmBios parsed;
+    StructureLists lists;
+    TestMI mi;
+    IC::MutableNode* planar = nullptr;
+};
+
+}  // namespace
+
+TEST(ConnectorBuilder, ConnectorNodeFieldByField) {
+    smbiostest::LogCapture log;
+    TableBuilder table;
+    table.add(connector(0x0800, "Compute ITE 1", 0x10, "USB 1"));
+    ConnectorRun setup(table);
+    std::vector<IC::Node*> const nodes = setup.run();
+
+    ASSERT_EQ(1u, nodes.size());
+    IC::Node const* node = nodes[0];
+    EXPECT_EQ(3u, node->getNodeId());
+    EXPECT_EQ(setup.planar->getNodeId(), node->getLinkedId());
+    EXPECT_TRUE(hasNodeType(node, 70));
+    EXPECT_EQ(0u, node->getIndex());
+    EXPECT_EQ(setup.mi.miIdList, node->getMIIds());
+    EXPECT_EQ(1u, node->getStatus());
+    EXPECT_EQ("Port Connector", node->getDescription());
+    EXPECT_EQ((std::vector<unsigned int>{108, 128}), propertyIds(node));
+    EXPECT_TRUE(hasString(node, 108, "Compute ITE 1"));
+    EXPECT_TRUE(hasEnum(node, 128, 1, 0x10));
+
+    EXPECT_EQ(2u, setup.mi.nodeList.size());
+    EXPECT_EQ(4u, setup.mi.nextNodeId);
+    EXPECT_EQ((std::vector<std::string>{"makeConnectorNodes entry", "Table 8 length = 9",
+                                        "makeConnectorNodes exit"}),
+              connectorLog())
+        << log.dump();
+}
+
+TEST(ConnectorBuilder, DesignatorBeginningWithComputeITEAndANumberBecomesANode) {
+    TableBuilder table;
+    table.add(connector(0x0800, "Compute ITE 12", 0x09));
+    ConnectorRun setup(table);
+    std::vector<IC::Node*> const nodes = setup.run();
+
+    ASSERT_EQ(1u, nodes.size());
+    EXPECT_TRUE(hasString(nodes[0], 108, "Compute ITE 12"));
+    EXPECT_TRUE(hasEnum(nodes[0], 128, 1, 0x09));
+}
+
+TEST(ConnectorBuilder, DesignatorWithWordsBeforeComputeITEBecomesANodeWithTheWholeText) {
+    TableBuilder table;
+    table.add(connector(0x0800, "Rear Panel Compute ITE 3 (LAN)", 0x1F));
+    ConnectorRun setup(table);
+    std::vector<IC::Node*> const nodes = setup.run();
+
+    ASSERT_EQ(1u, nodes.size());
+    EXPECT_TRUE(hasString(nodes[0], 108, "Rear Panel Compute ITE 3 (LAN)"));
+    EXPECT_TRUE(hasEnum(nodes[0], 128, 1, 0x1F));
+}
+
+TEST(ConnectorBuilder, LowerCaseComputeIteMakesNoNode) {
+    TableBuilder table;
+    table.add(connector(0x0800, "compute ite 1", 0x09));
+    table.add(connector(0x0801, "COMPUTE ITE 2", 0x09));
+    table.add(connector(0x0802, "Compute Ite 3", 0x09));
+    ConnectorRun setup(table);
+
+    EXPECT_TRUE(setup.run().empty());
+    EXPECT_EQ(3u, setup.mi.nextNodeId);
+}
+
+TEST(ConnectorBuilder, DesignatorWithoutComputeITEMakesNoNode) {
+    smbiostest::LogCapture log;
+    TableBuilder table;
+    table.add(connector(0x0800, "J9", 0x09, "Compute ITE"));
+    table.add(connector(0x0801, "Compute", 0x09));
+    table.add(connector(0x0802, "ComputeITE 1", 0x09));
+    ConnectorRun setup(table);
+
+    EXPECT_TRUE(setup.run().empty());
+    EXPECT_EQ(1u, setup.mi.nodeList.size());
+    EXPECT_EQ(3u, setup.mi.nextNodeId);
+    // Every structure is looked at, each with its own line.
+    EXPECT_EQ(3u, frametest::loggedLevels("Table 8 length = 9").size()) << log.dump();
+}
+
+TEST(ConnectorBuilder, MissingDesignatorStringMakesNoNode) {
+    TableBuilder table;
+    table.add(Structure(8, 0x0800).strNumber(0).byte(0).str("Compute ITE 1").byte(0).byte(0x09));
+    ConnectorRun setup(table);
+
+    EXPECT_TRUE(setup.run().empty());
+    EXPECT_EQ(3u, setup.mi.nextNodeId);
+}
+
+TEST(ConnectorBuilder, OnlyTheThirdOfThreeQualifiesGivesOneNodeWithIndexTwo) {
+    TableBuilder table;
+    table.add(connector(0x0800, "J1", 0x09));
+    table.add(connector(0x0801, "J2", 0x09));
+    table.add(connector(0x0802, "Compute ITE 7", 0x0E));
+    ConnectorRun setup(table);
+    std::vector<IC::Node*> const nodes = setup.run();
+
+    ASSERT_EQ(1u, nodes.size());
+    EXPECT_EQ(2u, nodes[0]->getIndex());
+    // Skipped structures use up no node id.
+    EXPECT_EQ(3u, nodes[0]->getNodeId());
+    EXPECT_EQ(setup.planar->getNodeId(), nodes[0]->getLinkedId());
+    EXPECT_TRUE(hasString(nodes[0], 108, "Compute ITE 7"));
+    EXPECT_TRUE(hasEnum(nodes[0], 128, 1, 0x0E));
+    EXPECT_EQ(4u, setup.mi.nextNodeId);
+}
+
+TEST(ConnectorBuilder, TwoQualifyingConnectorsKeepTheirGroupPositions) {
+    TableBuilder table;
+    table.add(connector(0x0800, "Compute ITE 1", 0x09));
+    table.add(connector(0x0801, "J2", 0x09));
+    table.add(connector(0x0802, "Compute ITE 2", 0x0D));
+    ConnectorRun setup(table);
+    std::vector<IC::Node*> const nodes = setup.run();
+
+    ASSERT_EQ(2u, nodes.size());
+    EXPECT_EQ(3u, nodes[0]->getNodeId());
+    EXPECT_EQ(0u, nodes[0]->getIndex());
+    EXPECT_EQ(4u, nodes[1]->getNodeId());
+    EXPECT_EQ(2u, nodes[1]->getIndex());
+    EXPECT_TRUE(hasEnum(nodes[1], 128, 1, 0x0D));
+}
+
+TEST(ConnectorBuilder, PortTypeFFIsPassedThroughAsEnumeratedValue255) {
+    TableBuilder table;
+    table.add(connector(0x0800, "Compute ITE 1", 0xFF));
+    ConnectorRun setup(table);
+    std::vector<IC::Node*> const nodes = setup.run();
+
+    ASSERT_EQ(1u, nodes.size());
+    IC::PropertyValue value;
+    ASSERT_EQ(0u, nodes[0]->getProperty(128, value).getStatus());
+    ASSERT_EQ(IC::PropertyValue::ENUM, value.getKind());
+    EXPECT_EQ(IC::EnumValue(static_cast<unsigned char>(255)), value.getEnum());
+    EXPECT_TRUE(hasEnum(nodes[0], 128, 1, 255));
+}
+
+TEST(ConnectorBuilder, EmptyConnectorGroupMakesNoNodesAndLogsOnlyEntryAndExit) {
+    TableBuilder table;
+    table.add(Structure(9, 0x0900).str("SLOT1").byte(0xA5));
+    ConnectorRun setup(table);
+
+    smbiostest::LogCapture log;
+    EXPECT_TRUE(setup.run().empty());
+    EXPECT_EQ(1u, setup.mi.nodeList.size());
+    EXPECT_EQ(3u, setup.mi.nextNodeId);
+    EXPECT_EQ((std::vector<std::string>{"makeConnectorNodes entry", "makeConnectorNodes exit"}),
+              frametest::loggedTexts())
+        << log.dump();
+}
+
+TEST(ConnectorBuilder, FailureInOneConnectorIsLoggedAndTheNextStillGetsANode) {
+    smbiostest::LogCapture log;
+    TableBuilder table;
+    table.add(connector(0x0801, "Compute ITE 2", 0x09));
+    ConnectorRun setup(table);
+    // A structure whose length byte promises more than its bytes hold: its
+    // string set lies beyond its data, so the designator lookup throws.
+    SD::SmBios::Table const broken(
+        connector(0x0800, "Compute ITE 1", 0x09).length(0x40).noTerminator().build());
+    ASSERT_EQ(0x40, broken.getLength());
+    setup.lists.storage[8].insert(setup.lists.storage[8].begin(),
+                                  IC::TableData(&broken, broken.getLength()));
+
+    std::vector<IC::Node*> const nodes = setup.run();
+
+    std::string const failure = frametest::firstLogged("Exception=");
+    EXPECT_EQ(0u, failure.find("Exception= Type=")) << log.dump();
+    EXPECT_NE(std::string::npos, failure.find("out_of_range")) << failure;
+    EXPECT_NE(std::string::npos, failure.find("Table 8 index =0")) << failure;
+    EXPECT_EQ((std::vector<int>{6000}), frametest::loggedLevels("Exception="));
+    ASSERT_EQ(1u, nodes.size());
+    EXPECT_EQ(3u, nodes[0]->getNodeId());
+    EXPECT_EQ(1u, nodes[0]->getIndex());
+    EXPECT_TRUE(hasString(nodes[0], 108, "Compute ITE 2"));
+    std::vector<std::string> const texts = connectorLog();
+    ASSERT_FALSE(texts.empty());
+    EXPECT_EQ("makeConnectorNodes exit", texts.back());
+}

@@ -1,0 +1,449 @@
+// The diagnostics firmware builder: the preboot diagnostics image's OEM
+// string, found by its eye-catcher, its version grammar with each rejection
+// and its log text, and the one node per OEM Strings structure.
+#include <gtest/gtest.h>
+
+#include <cstdint>
+#include <string>
+#include <vector>
+
+#include "BuilderFixture.h"
+
+using buildertest::childrenOf;
+using buildertest::hasNodeType;
+using buildertest::hasString;
+using buildertest::hasUnsigned;
+using buildertest::nodesOfType;
+using buildertest::propertyIds;
+using buildertest::StructureLists;
+using buildertest::TestMI;
+using smbiostest::LogCapture;
+using smbiostest::Structure;
+using smbiostest::TableBuilder;
+
+namespace {
+
+std::string const EYE = "$DS Corvane Preboot Diagnostics (KVD)";
+std::string const DESCRIPTION = "Corvane Preboot Diagnostics (KVD)";
+
+std::string const MISSING_MAJOR = "KVD string missing major version info: ";
+std::string const NOT_XY = "KVD string version number is not x.y form: ";
+std::string const NO_BLANK = "KVD string version number missing blank termination: ";
+std::string const NO_BUILD = "KVD version string missing build id: ";
+std::string const NO_BUILD_END = "KVD version string missing build id end ']-': ";
+
+// An OEM Strings structure (type 11) whose Count is the number of strings.
+Structure oemStrings(uint16_t handle, std::vector<std::string> const& strings) {
+    Structure structure(11, handle);
+    structure.byte(static_cast<uint8_t>(strings.size()));
+    for (std::string const& text : strings) {
+        structure.addString(text);
+    }
+    return structure;
+}
+
+// The diagnostics nodes (type 53) in node-list order.
+std::vector<IC::Node*> kvdNodes(TestMI const& mi) { return nodesOfType(mi, 53); }
+
+size_t loggedCount(std::string const& text) {
+    size_t count = 0;
+    for (std::string const& logged : frametest::loggedTexts()) {
+        if (logged.find(text) != std::string::npos) {
+            ++count;
+        }
+    }
+    return count;
+}
+
+// Whether the exact text was logged (through the log output).
+bool loggedExactly(std::string const& text) {
+    for (std::string const& logged : frametest::loggedTexts()) {
+        if (logged == text) {
+            return true;
+        }
+    }
+    return false;
+}
+
+// Runs the builder on one structure holding the one string; returns the
+// number of nodes made.
+size_t runOnOneString(TestMI& mi, std::string const& text) {
+    TableBuilder builder;
+    builder.add(oemStrings(0x0B00, {text}));
+    SD::SmBios parsed(builder.build());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    mi.makeKVDNode(lists.get(), planar->getNodeId());
+    return kvdNodes(mi).size();
+}
+
+}  // namespace
+
+TEST(KvdNode, ExampleStringMakesOneNodeWithEveryField) {
+    TestMI mi;
+    std::string const text = EYE + " 3.10 -[AB12C-3.10]-";
+    TableBuilder builder;
+    builder.add(oemStrings(0x0B00, {"Corvane Systems", text}));
+    SD::SmBios parsed(builder.build());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    LogCapture log;
+    mi.makeKVDNode(lists.get(), planar->getNodeId());
+
+    std::vector<IC::Node*> const nodes = kvdNodes(mi);
+    ASSERT_EQ(1u, nodes.size()) << log.dump();
+    IC::Node const* node = nodes[0];
+    EXPECT_TRUE(hasNodeType(node, 53));
+    EXPECT_EQ(3u, node->getNodeId());
+    EXPECT_EQ(2u, node->getLinkedId());
+    EXPECT_EQ(0u, node->getIndex());
+    EXPECT_EQ(1u, node->getStatus());
+    EXPECT_EQ(DESCRIPTION, node->getDescription());
+    EXPECT_EQ(std::vector<unsigned int>{1}, node->getMIIds());
+    EXPECT_EQ((std::vector<unsigned int>{104, 107, 134, 171}), propertyIds(node));
+    EXPECT_TRUE(hasString(node, 134, "3.10 -[AB12C-3.10]-"));
+    EXPECT_TRUE(hasUnsigned(node, 104, 3));
+    EXPECT_TRUE(hasUnsigned(node, 107, 10));
+    EXPECT_TRUE(hasString(node, 171, "AB12C-3.10"));
+    EXPECT_EQ(node, lists.storage[11][0].node);
+    EXPECT_EQ(2u, mi.nodeList.size());
+    EXPECT_TRUE(childrenOf(mi, 3).empty());
+
+    // The scan, in order, at the detail level.
+    std::vector<std::string> const expected = {
+        "makeKVDNodes entry",
+        "String count = 2",
+        "Reading ix = 1",
+        "Read string 1: Corvane Systems",
+        "Reading ix = 2",
+        "Read string 2: " + text,
+        "Found KVD string: " + text,
+        "Found KVD version string: 3.10 -[AB12C-3.10]-",
+        "Table 11 length = 5",
+        "makeKVDNodes exit",
+    };
+    std::vector<std::string> scan;
+    for (std::string const& logged : frametest::loggedTexts()) {
+        if (logged.rfind("Table::", 0) != 0) {
+            scan.push_back(logged);
+        }
+    }
+    EXPECT_EQ(expected, scan) << log.dump();
+    EXPECT_EQ((std::vector<int>{3000}), frametest::loggedLevels("Found KVD version string: "));
+}
+
+TEST(KvdNode, NoOemStringsStructureMakesNoNode) {
+    TestMI mi;
+    TableBuilder builder;
+    builder.add(Structure(1, 0x0100).str("Corvane"));
+    SD::SmBios parsed(builder.build());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    LogCapture log;
+    mi.makeKVDNode(lists.get(), planar->getNodeId());
+
+    EXPECT_EQ(1u, mi.nodeList.size());
+    EXPECT_EQ((std::vector<std::string>{"makeKVDNodes entry", "makeKVDNodes exit"}),
+              frametest::loggedTexts())
+        << log.dump();
+}
+
+TEST(KvdNode, OemStringsWithoutTheEyeCatcherMakeNoNode) {
+    TestMI mi;
+    TableBuilder builder;
+    // The eye-catcher is matched letter for letter, case included.
+    builder.add(oemStrings(0x0B00, {"Corvane Preboot Diagnostics (KVD) 3.10 -[AB12C-3.10]-",
+                                    "$ds corvane preboot diagnostics (kvd) 3.10 -[AB12C-3.10]-"}));
+    SD::SmBios parsed(builder.build());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    LogCapture log;
+    mi.makeKVDNode(lists.get(), planar->getNodeId());
+
+    EXPECT_TRUE(kvdNodes(mi).empty());
+    EXPECT_EQ(1u, loggedCount("Reading ix = 2")) << log.dump();
+    EXPECT_EQ(0u, loggedCount("Found KVD string: ")) << log.dump();
+}
+
+TEST(KvdNode, CountZeroReadsNoString) {
+    TestMI mi;
+    TableBuilder builder;
+    Structure structure(11, 0x0B00);
+    structure.byte(0).addString(EYE + " 3.10 -[AB12C-3.10]-");
+    builder.add(structure);
+    SD::SmBios parsed(builder.build());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    LogCapture log;
+    mi.makeKVDNode(lists.get(), planar->getNodeId());
+
+    EXPECT_TRUE(kvdNodes(mi).empty());
+    EXPECT_EQ(1u, loggedCount("String count = 0")) << log.dump();
+    EXPECT_EQ(0u, loggedCount("Reading ix = ")) << log.dump();
+}
+
+TEST(KvdNode, EyeCatcherFollowedOnlyByBlanksIsMissingMajorVersionInfo) {
+    TestMI mi;
+    std::string const text = EYE + "   ";
+    LogCapture log;
+    EXPECT_EQ(0u, runOnOneString(mi, text));
+    EXPECT_TRUE(loggedExactly(MISSING_MAJOR + text)) << log.dump();
+    EXPECT_EQ((std::vector<int>{3000}), frametest::loggedLevels(MISSING_MAJOR));
+    EXPECT_EQ(0u, loggedCount("Found KVD version string: ")) << log.dump();
+}
+
+TEST(KvdNode, EyeCatcherAtTheVeryEndIsMissingMajorVersionInfo) {
+    TestMI mi;
+    std::string const text = "Corvane " + EYE;
+    LogCapture log;
+    EXPECT_EQ(0u, runOnOneString(mi, text));
+    EXPECT_TRUE(loggedExactly(MISSING_MAJOR + text)) << log.dump();
+}
+
+TEST(KvdNode, MajorWithoutDotIsNotXYForm) {
+    TestMI mi;
+    std::string const text = EYE + " 3 -[X]-";
+    LogCapture log;
+    EXPECT_EQ(0u, runOnOneString(mi, text));
+    EXPECT_TRUE(loggedExactly("Found KVD version string: 3 -[X]-")) << log.dump();
+    EXPECT_TRUE(loggedExactly(NOT_XY + text)) << log.dump();
+    EXPECT_EQ((std::vector<int>{3000}), frametest::loggedLevels(NOT_XY));
+}
+
+TEST(KvdNode, MajorRunningToTheEndIsNotXYForm) {
+    TestMI mi;
+    std::string const text = EYE + " 31";
+    LogCapture log;
+    EXPECT_EQ(0u, runOnOneString(mi, text));
+    EXPECT_TRUE(loggedExactly(NOT_XY + text)) << log.dump();
+}
+
+TEST(KvdNode, MinorNotFollowedByABlankIsMissingBlankTermination) {
+    TestMI mi;
+    std::string const text = EYE + " 3.1-[X]-";
+    LogCapture log;
+    EXPECT_EQ(0u, runOnOneString(mi, text));
+    EXPECT_TRUE(loggedExactly(NO_BLANK + text)) << log.dump();
+    EXPECT_EQ((std::vector<int>{3000}), frametest::loggedLevels(NO_BLANK));
+}
+
+TEST(KvdNode, MinorRunningToTheEndIsMissingBlankTermination) {
+    TestMI mi;
+    std::string const text = EYE + " 3.1";
+    LogCapture log;
+    EXPECT_EQ(0u, runOnOneString(mi, text));
+    EXPECT_TRUE(loggedExactly(NO_BLANK + text)) << log.dump();
+}
+
+TEST(KvdNode, BuildIdNotOpenedByDashBracketIsMissingBuildId) {
+    TestMI mi;
+    std::string const text = EYE + " 3.1 [X]-";
+    LogCapture log;
+    EXPECT_EQ(0u, runOnOneString(mi, text));
+    EXPECT_TRUE(loggedExactly(NO_BUILD + text)) << log.dump();
+    EXPECT_EQ((std::vector<int>{3000}), frametest::loggedLevels(NO_BUILD));
+}
+
+TEST(KvdNode, BlanksToTheEndAfterTheVersionAreMissingBuildId) {
+    TestMI mi;
+    std::string const text = EYE + " 3.1   ";
+    LogCapture log;
+    EXPECT_EQ(0u, runOnOneString(mi, text));
+    EXPECT_TRUE(loggedExactly(NO_BUILD + text)) << log.dump();
+}
+
+TEST(KvdNode, UnclosedBuildIdIsMissingBuildIdEnd) {
+    TestMI mi;
+    std::string const text = EYE + " 3.1 -[XYZ";
+    LogCapture log;
+    EXPECT_EQ(0u, runOnOneString(mi, text));
+    EXPECT_TRUE(loggedExactly(NO_BUILD_END + text)) << log.dump();
+    EXPECT_EQ((std::vector<int>{3000}), frametest::loggedLevels(NO_BUILD_END));
+}
+
+TEST(KvdNode, UnclosedOneCharacterBuildIdFailsTheLengthCheckBeforeTheEndSearch) {
+    TestMI mi;
+    // "-[X" leaves p + 4 equal to the length: the build-id start check
+    // rejects it before "]-" is looked for.
+    std::string const text = EYE + " 3.1 -[X";
+    LogCapture log;
+    EXPECT_EQ(0u, runOnOneString(mi, text));
+    EXPECT_TRUE(loggedExactly(NO_BUILD + text)) << log.dump();
+    EXPECT_EQ(0u, loggedCount(NO_BUILD_END)) << log.dump();
+}
+
+TEST(KvdNode, EmptyBuildIdIsRejected) {
+    TestMI mi;
+    // "-[]-" after the blanks: p + 4 is the length, so the start check
+    // already fails.
+    std::string const text = EYE + " 3.1 -[]-";
+    LogCapture log;
+    EXPECT_EQ(0u, runOnOneString(mi, text));
+    EXPECT_TRUE(loggedExactly(NO_BUILD + text)) << log.dump();
+}
+
+TEST(KvdNode, EndSearchStartsOnePastTheBuildIdStartSoAnEmptyBuildIdIsNotFound) {
+    TestMI mi;
+    // Long enough for the start check; "]-" sits at q, where the search does
+    // not look, and there is no later one.
+    std::string const text = EYE + " 3.1 -[]- ";
+    LogCapture log;
+    EXPECT_EQ(0u, runOnOneString(mi, text));
+    EXPECT_TRUE(loggedExactly(NO_BUILD_END + text)) << log.dump();
+}
+
+TEST(KvdNode, EndSearchStartingOnePastTheBuildIdStartFindsALaterEnd) {
+    TestMI mi;
+    // The "]-" at q is skipped; the one after it ends a build id of "]-".
+    std::string const text = EYE + " 3.1 -[]-]-";
+    EXPECT_EQ(1u, runOnOneString(mi, text));
+    IC::Node const* node = kvdNodes(mi)[0];
+    EXPECT_TRUE(hasString(node, 171, "]-"));
+    EXPECT_TRUE(hasString(node, 134, "3.1 -[]-]-"));
+}
+
+TEST(KvdNode, VersionTextStartsAtTheFirstNonBlankAndRunsToTheEnd) {
+    TestMI mi;
+    // The eye-catcher may sit inside the string; several blanks before the
+    // version and before the build id; text after the build id's end stays
+    // in the version text.
+    std::string const text = "OEM: " + EYE + "    12.345   -[Z-9]- tail";
+    EXPECT_EQ(1u, runOnOneString(mi, text));
+    IC::Node const* node = kvdNodes(mi)[0];
+    EXPECT_TRUE(hasString(node, 134, "12.345   -[Z-9]- tail"));
+    EXPECT_TRUE(hasUnsigned(node, 104, 12));
+    EXPECT_TRUE(hasUnsigned(node, 107, 345));
+    EXPECT_TRUE(hasString(node, 171, "Z-9"));
+}
+
+TEST(KvdNode, MissingDigitsGiveZero) {
+    TestMI mi;
+    TableBuilder builder;
+    builder.add(oemStrings(0x0B00, {EYE + " .5 -[B1]-"}));
+    builder.add(oemStrings(0x0B01, {EYE + " 7. -[B2]-"}));
+    SD::SmBios parsed(builder.build());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    mi.makeKVDNode(lists.get(), planar->getNodeId());
+
+    std::vector<IC::Node*> const nodes = kvdNodes(mi);
+    ASSERT_EQ(2u, nodes.size());
+    EXPECT_TRUE(hasUnsigned(nodes[0], 104, 0));
+    EXPECT_TRUE(hasUnsigned(nodes[0], 107, 5));
+    EXPECT_TRUE(hasString(nodes[0], 171, "B1"));
+    EXPECT_TRUE(hasUnsigned(nodes[1], 104, 7));
+    EXPECT_TRUE(hasUnsigned(nodes[1], 107, 0));
+    EXPECT_TRUE(hasString(nodes[1], 171, "B2"));
+}
+
+TEST(KvdNode, RejectedStringDoesNotEndTheScan) {
+    TestMI mi;
+    TableBuilder builder;
+    builder.add(oemStrings(0x0B00, {EYE + " 3 -[X]-", EYE + " 4.2 -[GOOD]-"}));
+    SD::SmBios parsed(builder.build());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    LogCapture log;
+    mi.makeKVDNode(lists.get(), planar->getNodeId());
+
+    std::vector<IC::Node*> const nodes = kvdNodes(mi);
+    ASSERT_EQ(1u, nodes.size()) << log.dump();
+    EXPECT_TRUE(hasString(nodes[0], 134, "4.2 -[GOOD]-"));
+    EXPECT_TRUE(hasUnsigned(nodes[0], 104, 4));
+    EXPECT_TRUE(hasUnsigned(nodes[0], 107, 2));
+    EXPECT_TRUE(hasString(nodes[0], 171, "GOOD"));
+    EXPECT_EQ(1u, loggedCount(NOT_XY)) << log.dump();
+}
+
+TEST(KvdNode, TwoValidStringsInOneStructureOnlyTheFirstMakesANode) {
+    TestMI mi;
+    TableBuilder builder;
+    builder.add(oemStrings(0x0B00, {EYE + " 1.1 -[FIRST]-", EYE + " 2.2 -[SECOND]-", "Other"}));
+    SD::SmBios parsed(builder.build());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    LogCapture log;
+    mi.makeKVDNode(lists.get(), planar->getNodeId());
+
+    std::vector<IC::Node*> const nodes = kvdNodes(mi);
+    ASSERT_EQ(1u, nodes.size());
+    EXPECT_TRUE(hasString(nodes[0], 171, "FIRST"));
+    EXPECT_TRUE(hasUnsigned(nodes[0], 104, 1));
+    // The scan stops at the accepted string.
+    EXPECT_EQ(1u, loggedCount("Reading ix = 1")) << log.dump();
+    EXPECT_EQ(0u, loggedCount("Reading ix = 2")) << log.dump();
+    EXPECT_EQ(1u, loggedCount("Table 11 length = ")) << log.dump();
+}
+
+TEST(KvdNode, SameStringsInTwoStructuresMakeTwoNodesWithIndex0And1) {
+    TestMI mi;
+    TableBuilder builder;
+    builder.add(oemStrings(0x0B00, {EYE + " 1.1 -[FIRST]-", EYE + " 2.2 -[SECOND]-"}));
+    builder.add(oemStrings(0x0B01, {EYE + " 1.1 -[FIRST]-", EYE + " 2.2 -[SECOND]-"}));
+    SD::SmBios parsed(builder.build());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    mi.makeKVDNode(lists.get(), planar->getNodeId());
+
+    std::vector<IC::Node*> const nodes = kvdNodes(mi);
+    ASSERT_EQ(2u, nodes.size());
+    for (unsigned int i = 0; i < 2; ++i) {
+        EXPECT_EQ(3u + i, nodes[i]->getNodeId());
+        EXPECT_EQ(2u, nodes[i]->getLinkedId());
+        EXPECT_EQ(i, nodes[i]->getIndex());
+        EXPECT_EQ(1u, nodes[i]->getStatus());
+        EXPECT_EQ(DESCRIPTION, nodes[i]->getDescription());
+        EXPECT_TRUE(hasString(nodes[i], 171, "FIRST"));
+        EXPECT_EQ(nodes[i], lists.storage[11][i].node);
+    }
+}
+
+TEST(KvdNode, IndexIsThePositionOfTheStructureAmongTheOemStrings) {
+    TestMI mi;
+    TableBuilder builder;
+    builder.add(oemStrings(0x0B00, {"Corvane Systems"}));
+    builder.add(oemStrings(0x0B01, {EYE + " 3 -[bad]-"}));
+    builder.add(oemStrings(0x0B02, {EYE + " 5.0 -[K5]-"}));
+    SD::SmBios parsed(builder.build());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    LogCapture log;
+    mi.makeKVDNode(lists.get(), planar->getNodeId());
+
+    std::vector<IC::Node*> const nodes = kvdNodes(mi);
+    ASSERT_EQ(1u, nodes.size());
+    EXPECT_EQ(3u, nodes[0]->getNodeId());
+    EXPECT_EQ(2u, nodes[0]->getIndex());
+    EXPECT_TRUE(hasString(nodes[0], 171, "K5"));
+    EXPECT_EQ(nullptr, lists.storage[11][0].node);
+    EXPECT_EQ(nullptr, lists.storage[11][1].node);
+    EXPECT_EQ(nodes[0], lists.storage[11][2].node);
+}
+
+TEST(KvdNode, FailureLogsTable11TheStructureIndexAndTheStringIndex) {
+    TestMI mi;
+    TableBuilder builder;
+    builder.add(oemStrings(0x0B00, {EYE + " 1.0 -[OK]-"}));
+    // The last structure claims a formatted area longer than its bytes, so
+    // its first string cannot be found: the string lookup throws.
+    builder.add(oemStrings(0x0B01, {EYE + " 2.0 -[LOST]-"}).length(0x40));
+    SD::SmBios parsed(builder.build());
+    ASSERT_EQ(2u, parsed.getTables().size());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    LogCapture log;
+    mi.makeKVDNode(lists.get(), planar->getNodeId());
+
+    std::string const logged = frametest::firstLogged("Exception=");
+    EXPECT_EQ(0u, logged.find("Exception=")) << log.dump();
+    EXPECT_NE(std::string::npos, logged.find(" Type=")) << logged;
+    EXPECT_NE(std::string::npos, logged.find(" Table 11 index =1")) << logged;
+    EXPECT_NE(std::string::npos, logged.find("string index = 1")) << logged;
+    EXPECT_EQ((std::vector<int>{6000}), frametest::loggedLevels("Exception=")) << log.dump();
+
+    std::vector<IC::Node*> const nodes = kvdNodes(mi);
+    ASSERT_EQ(1u, nodes.size());
+    EXPECT_EQ(0u, nodes[0]->getIndex());
+    EXPECT_TRUE(hasString(nodes[0], 171, "OK"));
+    EXPECT_EQ(1u, loggedCount("makeKVDNodes exit")) << log.dump();
+}

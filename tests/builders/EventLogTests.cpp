@@ -1,0 +1,436 @@
+// makeLogNodes: one system-event-log node per System Event Log structure
+// (type 15) under the given parent, its status from the log area length and
+// the log status bits, and the header fields written to the log.
+#include <gtest/gtest.h>
+
+#include <cstdint>
+#include <string>
+#include <vector>
+
+#include "BuilderFixture.h"
+#include "IC/PropertyValue.h"
+#include "QNLog/QNLogger.h"
+
+using buildertest::addParent;
+using buildertest::hasNodeType;
+using buildertest::hasString;
+using buildertest::hasUnsigned;
+using buildertest::hasUnsignedList;
+using buildertest::lacksProperty;
+using buildertest::nodesOfType;
+using buildertest::propertyIds;
+using buildertest::StructureLists;
+using buildertest::TestMI;
+using smbiostest::Structure;
+using smbiostest::TableBuilder;
+
+namespace {
+
+char const* const LOG_LOGGER = "Quillon.IC.MI.SmBiosMI.SmBiosMILog";
+unsigned int const EVENT_LOG_NODE = 35;
+unsigned int const FIRMWARE_NODE = 3;
+std::string const LOG_NAME = "System Management BIOS System Event Log";
+
+typedef std::vector<unsigned char> Bytes;
+
+// The header of a System Event Log structure.
+struct EventLog {
+    uint16_t handle = 0x0F00;
+    uint16_t areaLength = 0x1000;
+    uint16_t headerStart = 0x0000;
+    uint16_t dataStart = 0x0010;
+    uint8_t accessMethod = 0x03;  // memory-mapped physical 32-bit address
+    uint8_t status = 0x01;        // valid, not full
+    uint32_t changeToken = 0x12345678;
+    uint32_t accessAddress = 0xFFE00000;
+    uint8_t headerFormat = 0x01;
+    uint8_t descriptorCount = 2;
+    uint8_t descriptorLength = 2;
+    Bytes descriptors = {0x01, 0x00, 0x02, 0x00};
+};
+
+// The structure (SMBIOS 2.1 layout): fields from 0x04 to 0x16, then the
+// descriptor bytes from 0x17.
+Structure eventLog(EventLog const& log) {
+    return Structure(15, log.handle)
+        .word(log.areaLength)
+        .word(log.headerStart)
+        .word(log.dataStart)
+        .byte(log.accessMethod)
+        .byte(log.status)
+        .dword(log.changeToken)
+        .dword(log.accessAddress)
+        .byte(log.headerFormat)
+        .byte(log.descriptorCount)
+        .byte(log.descriptorLength)
+        .bytes(log.descriptors);
+}
+
+Structure eventLog(uint16_t areaLength, uint8_t status) {
+    EventLog log;
+    log.areaLength = areaLength;
+    log.status = status;
+    return eventLog(log);
+}
+
+// The text a byte vector has as a property value.
+std::string bytesText(Bytes const& bytes) { return IC::PropertyValue(bytes, true).toString(); }
+
+// The texts the event-log builder itself logged (log output only), in order.
+std::vector<std::string> eventLogLog() {
+    std::vector<std::string> texts;
+    for (QNLog::QNLogRecord const& record : QNLog::QNLogger::captured()) {
+        if (record.output == "log" && record.logger == LOG_LOGGER) {
+            texts.push_back(record.text);
+        }
+    }
+    return texts;
+}
+
+// The builder's logged line that starts with label, or "".
+std::string loggedLine(std::string const& label) {
+    for (std::string const& text : eventLogLog()) {
+        if (text.compare(0, label.size(), label) == 0) {
+            return text;
+        }
+    }
+    return "";
+}
+
+// The builder over a table, under a firmware node (node id 2; the next id
+// is 3).
+struct LogRun {
+    explicit LogRun(TableBuilder const& table) : parsed(table.build()), lists(parsed) {
+        firmware = addParent(mi, FIRMWARE_NODE);
+    }
+
+    std::vector<IC::Node*> run() {
+        mi.makeLogNodes(lists.get(), firmware->getNodeId());
+        return nodesOfType(mi, EVENT_LOG_NODE);
+    }
+
+    SD::SmBios parsed;
+    StructureLists lists;
+    TestMI mi;
+    IC::MutableNode* firmware = nullptr;
+};
+
+// The status of the one event-log node made from a structure of the given
+// log area length and log status.
+unsigned int statusOf(uint16_t areaLength, uint8_t status) {
+    TableBuilder table;
+    table.add(eventLog(areaLength, status));
+    LogRun setup(table);
+    std::vector<IC::Node*> const nodes = setup.run();
+    EXPECT_EQ(1u, nodes.size());
+    return nodes.empty() ? 0xFFFFFFFFu : nodes[0]->getStatus();
+}
+
+}  // namespace
+
+TEST(EventLogBuilder, EventLogNodeFieldByField) {
+    TableBuilder table;
+    table.add(eventLog(0x1000, 0x01));
+    LogRun setup(table);
+    std::vector<IC::Node*> const nodes = setup.run();
+
+    ASSERT_EQ(1u, nodes.size());
+    IC::Node const* node = nodes[0];
+    EXPECT_EQ(3u, node->getNodeId());
+    EXPECT_EQ(setup.firmware->getNodeId(), node->getLinkedId());
+    EXPECT_TRUE(hasNodeType(node, 35));
+    EXPECT_EQ(0u, node->getIndex());
+    EXPECT_EQ(setup.mi.miIdList, node->getMIIds());
+    EXPECT_EQ(1u, node->getStatus());
+    EXPECT_EQ("SmBios System Event Log", node->getDescription());
+    EXPECT_EQ((std::vector<unsigned int>{37, 108, 125}), propertyIds(node));
+    EXPECT_TRUE(hasString(node, 108, LOG_NAME));
+    EXPECT_TRUE(hasUnsigned(node, 37, 0x1000));
+    EXPECT_TRUE(hasUnsignedList(node, 125, {30, 1, 16, 31}));
+    IC::MutableNode const* mutableNode = frametest::asMutable(node);
+    ASSERT_NE(nullptr, mutableNode);
+    EXPECT_EQ("", mutableNode->getPath());
+    EXPECT_EQ("", mutableNode->getParent());
+    // The node is recorded in its structure's entry.
+    EXPECT_EQ(node, setup.lists.storage[15][0].node);
+    EXPECT_EQ(2u, setup.mi.nodeList.size());
+    EXPECT_EQ(4u, setup.mi.nextNodeId);
+}
+
+TEST(EventLogBuilder, LogAreaLengthIsTheWordAtOffset4) {
+    TableBuilder table;
+    table.add(eventLog(0xABCD, 0x01));
+    LogRun setup(table);
+    std::vector<IC::Node*> const nodes = setup.run();
+
+    ASSERT_EQ(1u, nodes.size());
+    EXPECT_TRUE(hasUnsigned(nodes[0], 37, 0xABCD));
+}
+
+TEST(EventLogBuilder, HeaderFieldsAreLoggedInOrderWithTheirLabels) {
+    smbiostest::LogCapture capture;
+    EventLog log;
+    log.handle = 0x0031;
+    log.headerStart = 0x0000;
+    log.dataStart = 0x0010;
+    log.accessMethod = 0x03;
+    log.status = 0x01;
+    log.changeToken = 0x12345678;
+    log.accessAddress = 0xFFE00000;
+    log.headerFormat = 0x01;
+    log.descriptorCount = 2;
+    log.descriptorLength = 2;
+    log.descriptors = {0x01, 0x00, 0x02, 0x00};
+    TableBuilder table;
+    table.add(eventLog(log));
+    LogRun setup(table);
+    setup.run();
+
+    // Change token and access address in their memory order.
+    EXPECT_EQ((std::vector<std::string>{
+                  "makeLogNodes entry",
+                  "Table 15 length = 27",
+                  "Handle=49",
+                  "Log Header Start offset=0",
+                  "Log Data Start offset=16",
+                  "Access Method=3",
+                  "Log Status=1",
+                  "Log Change Status=" + bytesText({0x78, 0x56, 0x34, 0x12}),
+                  "Access Method Address=" + bytesText({0x00, 0x00, 0xE0, 0xFF}),
+                  "Log Header Format=1",
+                  "Number of Log Type Descriptors=2",
+                  "Log Type Descriptor Length=2",
+                  "Log Type Descriptors=" + bytesText({0x01, 0x00, 0x02, 0x00}),
+                  "makeLogNodes exit",
+              }),
+              eventLogLog())
+        << capture.dump();
+    EXPECT_EQ("78 56 34 12", bytesText({0x78, 0x56, 0x34, 0x12}));
+}
+
+TEST(EventLogBuilder, HeaderNumbersAreLoggedInDecimal) {
+    smbiostest::LogCapture capture;
+    EventLog log;
+    log.handle = 0xFEDC;
+    log.headerStart = 0x0100;
+    log.dataStart = 0x0ABC;
+    log.accessMethod = 0x04;
+    log.status = 0x03;
+    log.headerFormat = 0xFF;
+    TableBuilder table;
+    table.add(eventLog(log));
+    LogRun setup(table);
+    setup.run();
+
+    EXPECT_EQ("Handle=65244", loggedLine("Handle=")) << capture.dump();
+    EXPECT_EQ("Log Header Start offset=256", loggedLine("Log Header Start offset="));
+    EXPECT_EQ("Log Data Start offset=2748", loggedLine("Log Data Start offset="));
+    EXPECT_EQ("Access Method=4", loggedLine("Access Method="));
+    EXPECT_EQ("Log Status=3", loggedLine("Log Status="));
+    EXPECT_EQ("Log Header Format=255", loggedLine("Log Header Format="));
+}
+
+TEST(EventLogBuilder, NoEventLogStructureMakesNoNodeAndLogsOnlyEntryAndExit) {
+    TableBuilder table;
+    table.add(Structure(0, 0x0000).str("Corvane").str("1.0").word(0xE800).str("01/01/2020"));
+    LogRun setup(table);
+
+    smbiostest::LogCapture capture;
+    EXPECT_TRUE(setup.run().empty());
+    EXPECT_EQ(1u, setup.mi.nodeList.size());
+    EXPECT_EQ(3u, setup.mi.nextNodeId);
+    EXPECT_EQ((std::vector<std::string>{"makeLogNodes entry", "makeLogNodes exit"}),
+              frametest::loggedTexts())
+        << capture.dump();
+}
+
+TEST(EventLogBuilder, LogAreaLengthZeroWithLogStatus3GivesStatus16) {
+    EXPECT_EQ(16u, statusOf(0, 0x03));
+}
+
+TEST(EventLogBuilder, LogAreaLength0x1000WithLogStatus1GivesStatus1) {
+    EXPECT_EQ(1u, statusOf(0x1000, 0x01));
+}
+
+TEST(EventLogBuilder, LogAreaLength0x1000WithLogStatus3GivesStatus31) {
+    EXPECT_EQ(31u, statusOf(0x1000, 0x03));
+}
+
+TEST(EventLogBuilder, LogAreaLength0x1000WithLogStatus0GivesStatus30) {
+    EXPECT_EQ(30u, statusOf(0x1000, 0x00));
+}
+
+TEST(EventLogBuilder, LogFullWithoutValidGivesStatus30) { EXPECT_EQ(30u, statusOf(0x1000, 0x02)); }
+
+TEST(EventLogBuilder, OtherLogStatusBitsAreIgnored) {
+    EXPECT_EQ(1u, statusOf(0x0001, 0xFD));
+    EXPECT_EQ(31u, statusOf(0xFFFF, 0xFF));
+    EXPECT_EQ(30u, statusOf(0x1000, 0xFC));
+}
+
+TEST(EventLogBuilder, TwoFirmwareParentsGiveTwoEventLogNodesEachWithIndexZero) {
+    TableBuilder table;
+    table.add(eventLog(0x0800, 0x03));
+    LogRun setup(table);
+    IC::MutableNode* secondFirmware = addParent(setup.mi, FIRMWARE_NODE);
+    setup.mi.makeLogNodes(setup.lists.get(), setup.firmware->getNodeId());
+    IC::Node const* first = setup.mi.nodeList.back();
+    setup.mi.makeLogNodes(setup.lists.get(), secondFirmware->getNodeId());
+
+    std::vector<IC::Node*> const nodes = nodesOfType(setup.mi, EVENT_LOG_NODE);
+    ASSERT_EQ(2u, nodes.size());
+    EXPECT_EQ(first, nodes[0]);
+    EXPECT_EQ(4u, nodes[0]->getNodeId());
+    EXPECT_EQ(setup.firmware->getNodeId(), nodes[0]->getLinkedId());
+    EXPECT_EQ(5u, nodes[1]->getNodeId());
+    EXPECT_EQ(secondFirmware->getNodeId(), nodes[1]->getLinkedId());
+    for (IC::Node const* node : nodes) {
+        EXPECT_EQ(0u, node->getIndex());
+        EXPECT_EQ(31u, node->getStatus());
+        EXPECT_TRUE(hasUnsigned(node, 37, 0x0800));
+        EXPECT_TRUE(hasString(node, 108, LOG_NAME));
+    }
+    // The later call's node replaces the earlier one in the entry.
+    EXPECT_EQ(nodes[1], setup.lists.storage[15][0].node);
+}
+
+TEST(EventLogBuilder, TwoEventLogStructuresGetIndexesZeroAndOne) {
+    TableBuilder table;
+    table.add(eventLog(0x1000, 0x01));
+    table.add(Structure(0, 0x0000).str("Corvane"));
+    table.add(eventLog(0x0000, 0x01));
+    LogRun setup(table);
+    std::vector<IC::Node*> const nodes = setup.run();
+
+    ASSERT_EQ(2u, nodes.size());
+    EXPECT_EQ(3u, nodes[0]->getNodeId());
+    EXPECT_EQ(0u, nodes[0]->getIndex());
+    EXPECT_EQ(1u, nodes[0]->getStatus());
+    EXPECT_EQ(4u, nodes[1]->getNodeId());
+    EXPECT_EQ(1u, nodes[1]->getIndex());
+    EXPECT_EQ(16u, nodes[1]->getStatus());
+    EXPECT_EQ(nodes[0], setup.lists.storage[15][0].node);
+    EXPECT_EQ(nodes[1], setup.lists.storage[15][1].node);
+}
+
+TEST(EventLogBuilder, DescriptorCountZeroLogsAnEmptyDescriptorList) {
+    smbiostest::LogCapture capture;
+    EventLog log;
+    log.descriptorCount = 0;
+    log.descriptorLength = 2;
+    log.descriptors = {0x01, 0x00};
+    TableBuilder table;
+    table.add(eventLog(log));
+    LogRun setup(table);
+    setup.run();
+
+    EXPECT_EQ("Number of Log Type Descriptors=0", loggedLine("Number of Log Type Descriptors="));
+    EXPECT_EQ("Log Type Descriptors=" + bytesText({}), loggedLine("Log Type Descriptors="))
+        << capture.dump();
+    EXPECT_EQ("Log Type Descriptors=", loggedLine("Log Type Descriptors="));
+}
+
+TEST(EventLogBuilder, DescriptorListRunningPastTheStructureReadsWhatIsThereThenZeros) {
+    smbiostest::LogCapture capture;
+    EventLog log;
+    // Four descriptors of two bytes announced, one present; the string set
+    // ("AB") and the end of the structure follow it.
+    log.descriptorCount = 4;
+    log.descriptorLength = 2;
+    log.descriptors = {0x05, 0x01};
+    TableBuilder table;
+    table.add(eventLog(log).addString("AB"));
+    LogRun setup(table);
+    std::vector<IC::Node*> const nodes = setup.run();
+
+    ASSERT_EQ(1u, nodes.size());
+    EXPECT_EQ(1u, nodes[0]->getStatus());
+    EXPECT_EQ("Log Type Descriptors=" + bytesText({0x05, 0x01, 'A', 'B', 0, 0, 0, 0}),
+              loggedLine("Log Type Descriptors="))
+        << capture.dump();
+    EXPECT_EQ("makeLogNodes exit", eventLogLog().back());
+}
+
+TEST(EventLogBuilder, LargestDescriptorListIsReadWithoutACrash) {
+    smbiostest::LogCapture capture;
+    EventLog log;
+    log.descriptorCount = 0xFF;
+    log.descriptorLength = 0xFF;
+    log.descriptors = {0x07, 0x08};
+    TableBuilder table;
+    table.add(eventLog(log));
+    LogRun setup(table);
+    std::vector<IC::Node*> const nodes = setup.run();
+
+    ASSERT_EQ(1u, nodes.size());
+    Bytes expected(0xFFu * 0xFFu, 0);
+    expected[0] = 0x07;
+    expected[1] = 0x08;
+    EXPECT_EQ("Log Type Descriptors=" + bytesText(expected), loggedLine("Log Type Descriptors="));
+    EXPECT_EQ("makeLogNodes exit", eventLogLog().back());
+}
+
+TEST(EventLogBuilder, StructureOfLength4GivesStatus16) {
+    smbiostest::LogCapture capture;
+    TableBuilder table;
+    table.add(Structure(15, 0x0F00));
+    LogRun setup(table);
+    std::vector<IC::Node*> const nodes = setup.run();
+
+    ASSERT_EQ(1u, nodes.size());
+    IC::Node const* node = nodes[0];
+    EXPECT_EQ(16u, node->getStatus());
+    EXPECT_EQ("SmBios System Event Log", node->getDescription());
+    EXPECT_EQ((std::vector<unsigned int>{37, 108, 125}), propertyIds(node));
+    EXPECT_TRUE(hasUnsigned(node, 37, 0));
+    EXPECT_TRUE(hasUnsignedList(node, 125, {30, 1, 16, 31}));
+    EXPECT_TRUE(capture.contains("getNumber16 offset=4 length=4")) << capture.dump();
+    // The header fields beyond the structure are logged as 0 or empty.
+    EXPECT_EQ("Handle=3840", loggedLine("Handle="));
+    EXPECT_EQ("Log Header Start offset=0", loggedLine("Log Header Start offset="));
+    EXPECT_EQ("Log Status=0", loggedLine("Log Status="));
+    EXPECT_EQ("Log Change Status=" + bytesText({}), loggedLine("Log Change Status="));
+    EXPECT_EQ("Log Type Descriptors=", loggedLine("Log Type Descriptors="));
+    EXPECT_EQ(0u, capture.count("Exception=")) << capture.dump();
+}
+
+TEST(EventLogBuilder, ShortStructureWithoutLogStatusGivesStatusFromTheLengthAlone) {
+    smbiostest::LogCapture capture;
+    TableBuilder table;
+    // Length 0x0A: the log area length is there, the log status is not.
+    table.add(Structure(15, 0x0F00).word(0x0400).word(0).byte(0x10).byte(0x00));
+    LogRun setup(table);
+    std::vector<IC::Node*> const nodes = setup.run();
+
+    ASSERT_EQ(1u, nodes.size());
+    EXPECT_EQ(30u, nodes[0]->getStatus());
+    EXPECT_TRUE(hasUnsigned(nodes[0], 37, 0x0400));
+    EXPECT_TRUE(capture.contains("getBool8 offset=11 length=10")) << capture.dump();
+}
+
+TEST(EventLogBuilder, FailureInOneStructureIsLoggedAndTheNextStructureGoesOn) {
+    smbiostest::LogCapture capture;
+    TableBuilder table;
+    // Length 5: the log area length's first byte is the last byte of the
+    // formatted area, so the reader's check passes and the word read fails.
+    table.add(Structure(15, 0x0F00).byte(0x10));
+    table.add(eventLog(0x1000, 0x03));
+    LogRun setup(table);
+    std::vector<IC::Node*> const nodes = setup.run();
+
+    std::string const failure = frametest::firstLogged("Exception=");
+    EXPECT_EQ(0u, failure.find("Exception= Type=")) << capture.dump();
+    EXPECT_NE(std::string::npos, failure.find("out_of_range")) << failure;
+    EXPECT_NE(std::string::npos, failure.find("Table 15 index =0")) << failure;
+    EXPECT_EQ((std::vector<int>{6000}), frametest::loggedLevels("Exception="));
+
+    ASSERT_EQ(2u, nodes.size());
+    EXPECT_EQ(0u, nodes[0]->getIndex());
+    EXPECT_TRUE(lacksProperty(nodes[0], 37));
+    EXPECT_EQ(4u, nodes[1]->getNodeId());
+    EXPECT_EQ(1u, nodes[1]->getIndex());
+    EXPECT_EQ(31u, nodes[1]->getStatus());
+    EXPECT_TRUE(hasUnsigned(nodes[1], 37, 0x1000));
+    EXPECT_TRUE(hasUnsignedList(nodes[1], 125, {30, 1, 16, 31}));
+    EXPECT_EQ("makeLogNodes exit", eventLogLog().back());
+}

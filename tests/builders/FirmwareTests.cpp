@@ -1,0 +1,933 @@
+// The firmware builder: one node per recognised OEM string (diagnostics and
+// service-processor images) and one per BIOS Information structure, with the
+// version and build id parsed from their texts, the ordinal they share, the
+// UEFI naming, and an event-log node under each; and its two text utilities,
+// trimstr and find_first_number.
+#include <gtest/gtest.h>
+
+#include <cstdint>
+#include <string>
+#include <vector>
+
+#include "BuilderFixture.h"
+
+using buildertest::childrenOf;
+using buildertest::hasNodeType;
+using buildertest::hasString;
+using buildertest::hasUnsigned;
+using buildertest::hasVersion;
+using buildertest::lacksProperty;
+using buildertest::nodesOfType;
+using buildertest::propertyIds;
+using buildertest::StructureLists;
+using buildertest::TestMI;
+using smbiostest::LogCapture;
+using smbiostest::Structure;
+using smbiostest::TableBuilder;
+
+namespace {
+
+typedef std::vector<unsigned int> Ids;
+
+// The plug-in with the SMBIOS version that initialize would have taken from
+// the entry point.
+struct VersionedMI : TestMI {
+    VersionedMI(unsigned int major, unsigned int minor) {
+        smbiosMajorVersion = major;
+        smbiosMinorVersion = minor;
+    }
+};
+
+// An OEM Strings structure (type 11) whose Count is the number of strings.
+Structure oemStrings(uint16_t handle, std::vector<std::string> const& strings) {
+    Structure structure(11, handle);
+    structure.byte(static_cast<uint8_t>(strings.size()));
+    for (std::string const& text : strings) {
+        structure.addString(text);
+    }
+    return structure;
+}
+
+// A BIOS Information structure (type 0) of the given formatted length (0x14,
+// 0x16, 0x17 or 0x18): the fields up to that length.
+Structure biosInformation(uint16_t handle, std::string const& vendor, std::string const& version,
+                          std::string const& date, uint8_t length = 0x18, uint8_t ecMajor = 0x01,
+                          uint8_t ecMinor = 0x02) {
+    Structure structure(0, handle);
+    structure.str(vendor)
+        .str(version)
+        .word(0xE800)                  // 6: starting address segment
+        .str(date)                     // 8
+        .byte(0x0F)                    // 9: ROM size
+        .qword(0x0000000000000080ULL)  // 0x0A: characteristics
+        .byte(0x03)                    // 0x12: extension byte 1
+        .byte(0x0D);                   // 0x13: extension byte 2
+    if (length >= 0x16) {
+        structure.byte(0x02).byte(0x05);  // 0x14, 0x15: system BIOS release
+    }
+    if (length >= 0x17) {
+        structure.byte(ecMajor);  // 0x16
+    }
+    if (length >= 0x18) {
+        structure.byte(ecMinor);  // 0x17
+    }
+    return structure;
+}
+
+// A System Event Log structure (type 15) of a valid, not full log.
+Structure eventLog(uint16_t handle) {
+    return Structure(15, handle)
+        .word(0x1000)  // 4: log area length
+        .word(0x0000)  // 6: header start
+        .word(0x0010)  // 8: data start
+        .byte(0x03)    // 0x0A: access method
+        .byte(0x01)    // 0x0B: log status: valid
+        .dword(0x00000001)
+        .dword(0xFFE00000)
+        .byte(0x01)   // 0x14: header format
+        .byte(0x00)   // 0x15: no descriptors
+        .byte(0x02);  // 0x16: descriptor length
+}
+
+// Node id, linked id, type, index, status and description in one check.
+::testing::AssertionResult isNode(IC::Node const* node, unsigned int id, unsigned int linkedId,
+                                  unsigned int type, unsigned int index, unsigned int status,
+                                  std::string const& description) {
+    if (node == nullptr) {
+        return ::testing::AssertionFailure() << "no node";
+    }
+    ::testing::AssertionResult typed = hasNodeType(node, type);
+    if (!typed) {
+        return typed;
+    }
+    if (node->getNodeId() != id || node->getLinkedId() != linkedId || node->getIndex() != index ||
+        node->getStatus() != status || node->getDescription() != description) {
+        return ::testing::AssertionFailure()
+               << "node {id " << node->getNodeId() << ", linked " << node->getLinkedId()
+               << ", index " << node->getIndex() << ", status " << node->getStatus() << ", \""
+               << node->getDescription() << "\"}, expected {id " << id << ", linked " << linkedId
+               << ", index " << index << ", status " << status << ", \"" << description << "\"}";
+    }
+    return ::testing::AssertionSuccess();
+}
+
+// The one event-log node hung under the node: type 35, index 0, the valid
+// log of eventLog().
+::testing::AssertionResult hasEventLogChild(TestMI const& mi, IC::Node const* parent,
+                                            unsigned int expectedId) {
+    std::vector<IC::Node*> const children = childrenOf(mi, parent->getNodeId());
+    if (children.size() != 1) {
+        return ::testing::AssertionFailure() << "node " << parent->getNodeId() << " has "
+                                             << children.size() << " children, expected 1";
+    }
+    ::testing::AssertionResult shape =
+        isNode(children[0], expectedId, parent->getNodeId(), 35, 0, 1, "SmBios System Event Log");
+    if (!shape) {
+        return shape;
+    }
+    return hasUnsigned(children[0], 37, 0x1000);
+}
+
+// The firmware nodes (type 3) in node-list order.
+std::vector<IC::Node*> firmwareNodes(TestMI const& mi) { return nodesOfType(mi, 3); }
+
+size_t loggedCount(std::string const& text) {
+    size_t count = 0;
+    for (std::string const& logged : frametest::loggedTexts()) {
+        if (logged.find(text) != std::string::npos) {
+            ++count;
+        }
+    }
+    return count;
+}
+
+std::string const VERSION_ERROR =
+    "Error reading standard format of version and build number for Planar Firmware";
+
+}  // namespace
+
+// ---------------------------------------------------------------- trimstr
+
+TEST(FirmwareTrimstr, WithoutLeadingBlanksDropsTheTrailingBlanks) {
+    EXPECT_EQ("ab", IC::trimstr("ab  "));
+    EXPECT_EQ("AB-1.2", IC::trimstr("AB-1.2 "));
+}
+
+TEST(FirmwareTrimstr, LeadingBlanksKeepTheLastOneAndTheLengthCountsFromIt) {
+    // start = 1 (the last leading blank), last = 3: substr(1, 4).
+    EXPECT_EQ(" ab ", IC::trimstr("  ab "));
+    // start = 1, last = 7: substr(1, 8) runs to the end.
+    EXPECT_EQ(" AB-1.2", IC::trimstr("  AB-1.2"));
+}
+
+TEST(FirmwareTrimstr, OneLeadingBlankIsKept) {
+    EXPECT_EQ(" ab", IC::trimstr(" ab"));
+    EXPECT_EQ(" AB-1.2", IC::trimstr(" AB-1.2"));
+}
+
+TEST(FirmwareTrimstr, AllBlanksGiveOneBlank) {
+    EXPECT_EQ(" ", IC::trimstr("   "));
+    EXPECT_EQ(" ", IC::trimstr(" "));
+}
+
+TEST(FirmwareTrimstr, EmptyGivesEmpty) { EXPECT_EQ("", IC::trimstr("")); }
+
+TEST(FirmwareTrimstr, TextWithoutBlanksOrWithInnerBlanksOnlyIsUnchanged) {
+    EXPECT_EQ("abc", IC::trimstr("abc"));
+    EXPECT_EQ("a b", IC::trimstr("a b"));
+    EXPECT_EQ("x", IC::trimstr("x"));
+}
+
+TEST(FirmwareTrimstr, TheWalkEndsAtTheFirstNul) {
+    // Only the characters before the NUL are walked: last = 1.
+    EXPECT_EQ("ab", IC::trimstr(std::string("ab\0cd", 5)));
+}
+
+// ------------------------------------------------------ find_first_number
+
+TEST(FirmwareFindFirstNumber, EmptyTextIsFalseAndLeavesTheOutputAlone) {
+    TestMI mi;
+    unsigned out = 77;
+    EXPECT_FALSE(mi.find_first_number("", &out));
+    EXPECT_EQ(77u, out);
+}
+
+TEST(FirmwareFindFirstNumber, TextWithoutDigitsIsFalseAndLeavesTheOutputAlone) {
+    TestMI mi;
+    unsigned out = 77;
+    EXPECT_FALSE(mi.find_first_number("abc", &out));
+    EXPECT_EQ(77u, out);
+    EXPECT_FALSE(mi.find_first_number("v.-", &out));
+    EXPECT_EQ(77u, out);
+}
+
+TEST(FirmwareFindFirstNumber, ReadsTheDecimalNumberFromTheFirstDigit) {
+    TestMI mi;
+    unsigned out = 0;
+    EXPECT_TRUE(mi.find_first_number("v12.5", &out));
+    EXPECT_EQ(12u, out);
+    EXPECT_TRUE(mi.find_first_number("42", &out));
+    EXPECT_EQ(42u, out);
+    // A sign before the first digit is not part of the number.
+    EXPECT_TRUE(mi.find_first_number("rev -7b", &out));
+    EXPECT_EQ(7u, out);
+    // Base 10 even with a leading zero.
+    EXPECT_TRUE(mi.find_first_number("x010", &out));
+    EXPECT_EQ(10u, out);
+}
+
+// ------------------------------------------------------ OEM-string nodes
+
+TEST(FirmwareOemNodes, DiagnosticsStringWithDashInBracketsSetsEveryField) {
+    TestMI mi;
+    TableBuilder builder;
+    builder.add(oemStrings(0x0B00, {"Corvane Diagnostics -[ABCD12X-2.10]-"}));
+    builder.add(eventLog(0x0F00));
+    SD::SmBios parsed(builder.build());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    LogCapture log;
+    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+
+    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
+    ASSERT_EQ(1u, firmware.size()) << log.dump();
+    IC::Node const* node = firmware[0];
+    EXPECT_TRUE(isNode(node, 3, 2, 3, 1, 1, "Diagnostics"));
+    EXPECT_EQ(std::vector<unsigned int>{1}, node->getMIIds());
+    EXPECT_EQ((Ids{36, 70, 104, 107, 108, 134, 307}), propertyIds(node));
+    EXPECT_TRUE(hasString(node, 108, "Diagnostics"));
+    EXPECT_TRUE(hasString(node, 36, "Corvane"));
+    EXPECT_TRUE(hasString(node, 307, "-[ABCD12X-2.10]-"));
+    EXPECT_TRUE(hasString(node, 70, "ABCD12X"));
+    EXPECT_TRUE(hasString(node, 134, "2.10"));
+    EXPECT_TRUE(hasUnsigned(node, 104, 2));
+    EXPECT_TRUE(hasUnsigned(node, 107, 10));
+    // The node is recorded in its structure's entry.
+    EXPECT_EQ(node, lists.storage[11][0].node);
+
+    EXPECT_TRUE(hasEventLogChild(mi, node, 4));
+    EXPECT_EQ(3u, mi.nodeList.size());
+    EXPECT_EQ(1u, loggedCount("makeFirmwareNodes entry")) << log.dump();
+    EXPECT_EQ(1u, loggedCount("makeFirmwareNodes exit")) << log.dump();
+}
+
+TEST(FirmwareOemNodes, OstrelStringIsNamedOTL) {
+    TestMI mi;
+    TableBuilder builder;
+    builder.add(oemStrings(0x0B00, {"Corvane Ostrel -[SP77-1.3]-"}));
+    SD::SmBios parsed(builder.build());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+
+    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
+    ASSERT_EQ(1u, firmware.size());
+    EXPECT_TRUE(isNode(firmware[0], 3, 2, 3, 1, 1, "OTL"));
+    EXPECT_TRUE(hasString(firmware[0], 108, "OTL"));
+    EXPECT_TRUE(hasString(firmware[0], 36, "Corvane"));
+    EXPECT_TRUE(hasString(firmware[0], 70, "SP77"));
+    EXPECT_TRUE(hasString(firmware[0], 134, "1.3"));
+    EXPECT_TRUE(hasUnsigned(firmware[0], 104, 1));
+    EXPECT_TRUE(hasUnsigned(firmware[0], 107, 3));
+}
+
+TEST(FirmwareOemNodes, StringsWithoutAKnownNameMakeNoNode) {
+    TestMI mi;
+    TableBuilder builder;
+    // Case-sensitive: "diagnostics" and "uefi" are not recognised.
+    builder.add(oemStrings(0x0B00, {"Corvane Systems", "diagnostics -[A-1.0]-", "uefi"}));
+    builder.add(biosInformation(0x0000, "Corvane", "1.05", "03/14/2021"));
+    SD::SmBios parsed(builder.build());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+
+    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
+    ASSERT_EQ(1u, firmware.size());
+    EXPECT_TRUE(isNode(firmware[0], 3, 2, 3, 1, 1, "BIOS"));
+    EXPECT_EQ(nullptr, lists.storage[11][0].node);
+}
+
+TEST(FirmwareOemNodes, DiagnosticsAndUefiInOneStringMakeADiagnosticsNodeAndBiosStaysBios) {
+    TestMI mi;
+    TableBuilder builder;
+    builder.add(oemStrings(0x0B00, {"Corvane UEFI Diagnostics -[D1-4.0]-"}));
+    builder.add(biosInformation(0x0000, "Corvane", "C1 [B9-1.2]", "03/14/2021"));
+    SD::SmBios parsed(builder.build());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+
+    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
+    ASSERT_EQ(2u, firmware.size());
+    EXPECT_TRUE(isNode(firmware[0], 3, 2, 3, 1, 1, "Diagnostics"));
+    EXPECT_TRUE(hasString(firmware[0], 108, "Diagnostics"));
+    EXPECT_TRUE(isNode(firmware[1], 4, 2, 3, 2, 1, "BIOS"));
+    EXPECT_TRUE(hasString(firmware[1], 108, "BIOS"));
+}
+
+TEST(FirmwareOemNodes, UefiStringAloneMakesNoNodeAndNamesTheBiosNodesUefi) {
+    TestMI mi;
+    TableBuilder builder;
+    builder.add(oemStrings(0x0B00, {"Corvane Systems"}));
+    // The flag set by a later structure still names every BIOS node.
+    builder.add(oemStrings(0x0B01, {"Boot mode UEFI"}));
+    builder.add(biosInformation(0x0000, "Corvane", "C1 [B9-1.2]", "03/14/2021"));
+    builder.add(biosInformation(0x0001, "Corvane", "C2 [B9-1.3]", "04/14/2021"));
+    SD::SmBios parsed(builder.build());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+
+    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
+    ASSERT_EQ(2u, firmware.size());
+    EXPECT_TRUE(isNode(firmware[0], 3, 2, 3, 1, 1, "UEFI"));
+    EXPECT_TRUE(hasString(firmware[0], 108, "UEFI"));
+    EXPECT_TRUE(isNode(firmware[1], 4, 2, 3, 2, 1, "UEFI"));
+    EXPECT_TRUE(hasString(firmware[1], 108, "UEFI"));
+    EXPECT_EQ(nullptr, lists.storage[11][1].node);
+}
+
+TEST(FirmwareOemNodes, UefiTakesPrecedenceOverOstrelInOneString) {
+    TestMI mi;
+    TableBuilder builder;
+    builder.add(oemStrings(0x0B00, {"Ostrel UEFI -[SP-1.0]-"}));
+    builder.add(biosInformation(0x0000, "Corvane", "C1 [B9-1.2]", "03/14/2021"));
+    SD::SmBios parsed(builder.build());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+
+    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
+    ASSERT_EQ(1u, firmware.size());
+    EXPECT_TRUE(isNode(firmware[0], 3, 2, 3, 1, 1, "UEFI"));
+}
+
+TEST(FirmwareOemNodes, EmptyStringInPosition2Of5EndsTheStructure) {
+    TestMI mi;
+    TableBuilder builder;
+    // Count 5 but one string: string 2 is empty (names no string), so 3 to 5
+    // are never read.
+    Structure first(11, 0x0B00);
+    first.byte(5).addString("Corvane Ostrel -[SP1-1.0]-");
+    builder.add(first);
+    builder.add(oemStrings(0x0B01, {"Corvane Diagnostics -[D2-2.0]-"}));
+    SD::SmBios parsed(builder.build());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    LogCapture log;
+    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+
+    EXPECT_EQ(1u, loggedCount("OEM string is NULL")) << log.dump();
+    EXPECT_TRUE(log.contains("Table::getString index 2 ")) << log.dump();
+    EXPECT_FALSE(log.contains("Table::getString index 3 ")) << log.dump();
+    EXPECT_FALSE(log.contains("Table::getString index 5 ")) << log.dump();
+    // The next structure is examined all the same.
+    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
+    ASSERT_EQ(2u, firmware.size());
+    EXPECT_TRUE(isNode(firmware[0], 3, 2, 3, 1, 1, "OTL"));
+    EXPECT_TRUE(isNode(firmware[1], 4, 2, 3, 2, 1, "Diagnostics"));
+}
+
+TEST(FirmwareOemNodes, EmptyFirstStringSkipsTheStringsAfterIt) {
+    TestMI mi;
+    TableBuilder builder;
+    // A set that starts with an empty string followed by a real one.
+    Structure structure(11, 0x0B00);
+    structure.byte(2).addString("").addString("Corvane Diagnostics -[D2-2.0]-");
+    builder.add(structure);
+    SD::SmBios parsed(builder.build());
+    ASSERT_EQ(1u, parsed.getTables().size());
+    ASSERT_STREQ("", parsed.getTables()[0].getString(1));
+    ASSERT_STREQ("Corvane Diagnostics -[D2-2.0]-", parsed.getTables()[0].getString(2));
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    LogCapture log;
+    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+
+    EXPECT_EQ(1u, loggedCount("OEM string is NULL")) << log.dump();
+    EXPECT_TRUE(firmwareNodes(mi).empty());
+}
+
+TEST(FirmwareOemNodes, CountZeroReadsNoString) {
+    TestMI mi;
+    TableBuilder builder;
+    Structure structure(11, 0x0B00);
+    structure.byte(0).addString("Corvane Diagnostics -[D2-2.0]-");
+    builder.add(structure);
+    SD::SmBios parsed(builder.build());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    LogCapture log;
+    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+
+    EXPECT_TRUE(firmwareNodes(mi).empty());
+    EXPECT_FALSE(log.contains("OEM string is NULL")) << log.dump();
+    EXPECT_FALSE(log.contains("Table::getString")) << log.dump();
+}
+
+TEST(FirmwareOemNodes, BracketsWithoutDashAndCloseParenBeforeDashRebuild307) {
+    TestMI mi;
+    TableBuilder builder;
+    // ") " at r, the first "-" at e: the version is s.substr(r + 2, e - r - 3).
+    builder.add(oemStrings(0x0B00, {"Corvane Ostrel (OTL) 1.25 -[XYZ99]-"}));
+    builder.add(eventLog(0x0F00));
+    SD::SmBios parsed(builder.build());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+
+    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
+    ASSERT_EQ(1u, firmware.size());
+    IC::Node const* node = firmware[0];
+    EXPECT_TRUE(isNode(node, 3, 2, 3, 1, 1, "OTL"));
+    EXPECT_EQ((Ids{36, 70, 104, 107, 108, 134, 307}), propertyIds(node));
+    EXPECT_TRUE(hasString(node, 307, "-[XYZ99-1.25]-"));
+    EXPECT_TRUE(hasString(node, 70, "XYZ99"));
+    EXPECT_TRUE(hasString(node, 134, "1.25"));
+    EXPECT_TRUE(hasUnsigned(node, 104, 1));
+    EXPECT_TRUE(hasUnsigned(node, 107, 25));
+    EXPECT_TRUE(hasEventLogChild(mi, node, 4));
+}
+
+TEST(FirmwareOemNodes, CloseParenWithoutBlankAfterItTakesTheVersionFromTwoPastIt) {
+    TestMI mi;
+    TableBuilder builder;
+    // r + 2 skips one character after ")", whatever it is; the length stops
+    // two characters before the first "-".
+    builder.add(oemStrings(0x0B00, {"Corvane Diagnostics (D)v3.4  -[Q1]-"}));
+    SD::SmBios parsed(builder.build());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+
+    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
+    ASSERT_EQ(1u, firmware.size());
+    EXPECT_TRUE(hasString(firmware[0], 134, "3.4 "));
+    EXPECT_TRUE(hasString(firmware[0], 307, "-[Q1-3.4 ]-"));
+    EXPECT_TRUE(hasUnsigned(firmware[0], 104, 3));
+    EXPECT_TRUE(hasUnsigned(firmware[0], 107, 4));
+}
+
+TEST(FirmwareOemNodes, BracketsWithoutDashAndWithoutCloseParenSetAnEmptyVersion) {
+    TestMI mi;
+    TableBuilder builder;
+    builder.add(oemStrings(0x0B00, {"Corvane Ostrel -[XYZ99]-"}));
+    SD::SmBios parsed(builder.build());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+
+    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
+    ASSERT_EQ(1u, firmware.size());
+    IC::Node const* node = firmware[0];
+    EXPECT_EQ((Ids{36, 70, 108, 134, 307}), propertyIds(node));
+    EXPECT_TRUE(hasString(node, 307, "-[XYZ99]-"));
+    EXPECT_TRUE(hasString(node, 70, "XYZ99"));
+    EXPECT_TRUE(hasString(node, 134, ""));
+}
+
+TEST(FirmwareOemNodes, BracketsWithoutAnyDashAndWithCloseParenSetAnEmptyVersion) {
+    TestMI mi;
+    TableBuilder builder;
+    // ")" but no "-" anywhere: neither 307 nor a rebuilt one.
+    builder.add(oemStrings(0x0B00, {"Corvane Diagnostics (D) 2.0 [ XYZ ]"}));
+    SD::SmBios parsed(builder.build());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+
+    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
+    ASSERT_EQ(1u, firmware.size());
+    IC::Node const* node = firmware[0];
+    EXPECT_EQ((Ids{36, 70, 108, 134}), propertyIds(node));
+    // The inner text is trimmed: " XYZ " keeps its one leading blank (start
+    // 0) and loses the trailing one.
+    EXPECT_TRUE(hasString(node, 70, " XYZ"));
+    EXPECT_TRUE(hasString(node, 134, ""));
+}
+
+TEST(FirmwareOemNodes, WithoutBracketsOnlyNameVendorAndIdentificationAreSet) {
+    TestMI mi;
+    TableBuilder builder;
+    builder.add(oemStrings(0x0B00, {"Corvane Diagnostics - build 7", "Corvane Ostrel"}));
+    SD::SmBios parsed(builder.build());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+
+    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
+    ASSERT_EQ(2u, firmware.size());
+    EXPECT_EQ((Ids{36, 108, 307}), propertyIds(firmware[0]));
+    EXPECT_TRUE(hasString(firmware[0], 307, "- build 7"));
+    EXPECT_EQ((Ids{36, 108}), propertyIds(firmware[1]));
+    EXPECT_TRUE(hasString(firmware[1], 108, "OTL"));
+}
+
+TEST(FirmwareOemNodes, DashPositionFromTheUntrimmedTextIsAppliedToTheTrimmedText) {
+    TestMI mi;
+    TableBuilder builder;
+    // "[  AB-1.2]": d = 4 in "  AB-1.2"; trimmed " AB-1.2"; 70 = substr(0, 4),
+    // 134 = substr(5).
+    builder.add(oemStrings(0x0B00, {"Corvane Diagnostics [  AB-1.2]"}));
+    // "[ AB-1.2]": d = 3 in " AB-1.2", which trimming leaves as it is.
+    builder.add(oemStrings(0x0B01, {"Corvane Ostrel [ AB-1.2]"}));
+    SD::SmBios parsed(builder.build());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+
+    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
+    ASSERT_EQ(2u, firmware.size());
+    EXPECT_TRUE(hasString(firmware[0], 307, "-1.2]"));
+    EXPECT_TRUE(hasString(firmware[0], 70, " AB-"));
+    EXPECT_TRUE(hasString(firmware[0], 134, ".2"));
+    EXPECT_TRUE(hasUnsigned(firmware[0], 104, 0));
+    EXPECT_TRUE(hasUnsigned(firmware[0], 107, 2));
+
+    EXPECT_TRUE(hasString(firmware[1], 307, "-1.2]"));
+    EXPECT_TRUE(hasString(firmware[1], 70, " AB"));
+    EXPECT_TRUE(hasString(firmware[1], 134, "1.2"));
+    EXPECT_TRUE(hasUnsigned(firmware[1], 104, 1));
+    EXPECT_TRUE(hasUnsigned(firmware[1], 107, 2));
+}
+
+TEST(FirmwareOemNodes, VersionWithoutDotGivesMinorZero) {
+    TestMI mi;
+    TableBuilder builder;
+    builder.add(oemStrings(0x0B00, {"Corvane Diagnostics -[ABC-7]-"}));
+    SD::SmBios parsed(builder.build());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+
+    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
+    ASSERT_EQ(1u, firmware.size());
+    EXPECT_TRUE(hasString(firmware[0], 134, "7"));
+    EXPECT_TRUE(hasUnsigned(firmware[0], 104, 7));
+    EXPECT_TRUE(hasUnsigned(firmware[0], 107, 0));
+}
+
+TEST(FirmwareOemNodes, VersionBeginningWithALetterGivesMajorZero) {
+    TestMI mi;
+    TableBuilder builder;
+    builder.add(oemStrings(0x0B00, {"Corvane Diagnostics -[ABC-v2.3]-"}));
+    SD::SmBios parsed(builder.build());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+
+    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
+    ASSERT_EQ(1u, firmware.size());
+    EXPECT_TRUE(hasString(firmware[0], 134, "v2.3"));
+    EXPECT_TRUE(hasUnsigned(firmware[0], 104, 0));
+    EXPECT_TRUE(hasUnsigned(firmware[0], 107, 3));
+}
+
+TEST(FirmwareOemNodes, CloseParenAsLastCharacterRaisesOutOfRangeAndAbandonsTheStructure) {
+    TestMI mi;
+    TableBuilder builder;
+    builder.add(oemStrings(0x0B00, {"Corvane Diagnostics -[D1-1.0]-", "Corvane Ostrel -[SP9])",
+                                    "Corvane Diagnostics -[D3-3.0]-"}));
+    builder.add(oemStrings(0x0B01, {"Corvane Ostrel -[SP2-2.0]-"}));
+    builder.add(biosInformation(0x0000, "Corvane", "C1 [B9-1.2]", "03/14/2021"));
+    builder.add(eventLog(0x0F00));
+    SD::SmBios parsed(builder.build());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    LogCapture log;
+    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+
+    // The failing string is the second node (ordinal 2): printed as table 0,
+    // index ordinal - 1 with the ordinal already moved on.
+    std::string const logged = frametest::firstLogged("Exception=");
+    EXPECT_NE(std::string::npos, logged.find("Exception=basic_string::substr")) << log.dump();
+    EXPECT_NE(std::string::npos, logged.find(" Type=")) << logged;
+    EXPECT_NE(std::string::npos, logged.find("Table 0 index =2")) << logged;
+    EXPECT_EQ((std::vector<int>{6000}), frametest::loggedLevels("Exception=")) << log.dump();
+
+    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
+    ASSERT_EQ(4u, firmware.size()) << log.dump();
+    EXPECT_TRUE(isNode(firmware[0], 3, 2, 3, 1, 1, "Diagnostics"));
+    EXPECT_TRUE(hasEventLogChild(mi, firmware[0], 4));
+    // The failed node keeps what was set before the failure and gets no
+    // event-log node.
+    EXPECT_TRUE(isNode(firmware[1], 5, 2, 3, 2, 1, "OTL"));
+    EXPECT_EQ((Ids{36, 108, 307}), propertyIds(firmware[1]));
+    EXPECT_TRUE(hasString(firmware[1], 307, "-[SP9])"));
+    EXPECT_TRUE(childrenOf(mi, 5).empty());
+    // The third string of that structure is never examined; the next
+    // structure and the BIOS phase go on.
+    EXPECT_TRUE(isNode(firmware[2], 6, 2, 3, 3, 1, "OTL"));
+    EXPECT_TRUE(hasString(firmware[2], 70, "SP2"));
+    EXPECT_TRUE(isNode(firmware[3], 8, 2, 3, 4, 1, "BIOS"));
+}
+
+TEST(FirmwareOemNodes, OrdinalIsSharedByOemAndBiosNodesInCreationOrder) {
+    TestMI mi;
+    TableBuilder builder;
+    builder.add(biosInformation(0x0000, "Corvane", "C1 [B1-1.0]", "03/14/2021"));
+    builder.add(
+        oemStrings(0x0B00, {"Corvane Diagnostics -[D1-1.0]-", "Corvane Ostrel -[S1-1.0]-"}));
+    builder.add(biosInformation(0x0001, "Corvane", "C2 [B2-2.0]", "04/14/2021"));
+    builder.add(eventLog(0x0F00));
+    SD::SmBios parsed(builder.build());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+
+    // OEM nodes first, then BIOS nodes; each followed by its event-log node.
+    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
+    ASSERT_EQ(4u, firmware.size());
+    EXPECT_TRUE(isNode(firmware[0], 3, 2, 3, 1, 1, "Diagnostics"));
+    EXPECT_TRUE(isNode(firmware[1], 5, 2, 3, 2, 1, "OTL"));
+    EXPECT_TRUE(isNode(firmware[2], 7, 2, 3, 3, 1, "BIOS"));
+    EXPECT_TRUE(hasString(firmware[2], 70, "B1"));
+    EXPECT_TRUE(isNode(firmware[3], 9, 2, 3, 4, 1, "BIOS"));
+    EXPECT_TRUE(hasString(firmware[3], 70, "B2"));
+    for (size_t i = 0; i < firmware.size(); ++i) {
+        EXPECT_TRUE(hasEventLogChild(mi, firmware[i], firmware[i]->getNodeId() + 1)) << i;
+    }
+    // Both OEM nodes came from one structure: its entry keeps the last.
+    EXPECT_EQ(firmware[1], lists.storage[11][0].node);
+    EXPECT_EQ(firmware[2], lists.storage[0][0].node);
+    EXPECT_EQ(firmware[3], lists.storage[0][1].node);
+}
+
+TEST(FirmwareOemNodes, WithoutEventLogStructureFirmwareNodesHaveNoChildren) {
+    TestMI mi;
+    TableBuilder builder;
+    builder.add(oemStrings(0x0B00, {"Corvane Diagnostics -[D1-1.0]-"}));
+    builder.add(biosInformation(0x0000, "Corvane", "C1 [B1-1.0]", "03/14/2021"));
+    SD::SmBios parsed(builder.build());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    LogCapture log;
+    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+
+    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
+    ASSERT_EQ(2u, firmware.size());
+    EXPECT_TRUE(isNode(firmware[0], 3, 2, 3, 1, 1, "Diagnostics"));
+    EXPECT_TRUE(isNode(firmware[1], 4, 2, 3, 2, 1, "BIOS"));
+    EXPECT_EQ(3u, mi.nodeList.size());
+    // The event-log builder still ran once per firmware node.
+    EXPECT_EQ(2u, loggedCount("makeLogNodes entry")) << log.dump();
+}
+
+// ------------------------------------------------------------ BIOS nodes
+
+TEST(FirmwareBiosNodes, BracketedVersionSetsEveryProperty) {
+    VersionedMI mi(2, 7);
+    TableBuilder builder;
+    builder.add(
+        biosInformation(0x0000, "Corvane Ltd.", "C1S [R5B3-1.06]", "03/14/2021", 0x18, 0x03, 0x11));
+    builder.add(eventLog(0x0F00));
+    SD::SmBios parsed(builder.build());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    LogCapture log;
+    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+
+    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
+    ASSERT_EQ(1u, firmware.size()) << log.dump();
+    IC::Node const* node = firmware[0];
+    EXPECT_TRUE(isNode(node, 3, 2, 3, 1, 1, "BIOS"));
+    EXPECT_EQ(std::vector<unsigned int>{1}, node->getMIIds());
+    EXPECT_EQ((Ids{36, 70, 104, 107, 108, 134, 164, 175, 187, 188, 307}), propertyIds(node));
+    EXPECT_TRUE(hasString(node, 36, "Corvane Ltd."));
+    EXPECT_TRUE(hasString(node, 164, "03/14/2021"));
+    EXPECT_TRUE(hasString(node, 108, "BIOS"));
+    EXPECT_TRUE(hasString(node, 307, "C1S [R5B3-1.06]"));
+    EXPECT_TRUE(hasString(node, 134, "1.06"));
+    EXPECT_TRUE(hasString(node, 70, "R5B3"));
+    // The SMBIOS version, not a number parsed from the BIOS version.
+    EXPECT_TRUE(hasVersion(node, 175, 2, 7));
+    EXPECT_TRUE(hasUnsigned(node, 104, 2));
+    EXPECT_TRUE(hasUnsigned(node, 107, 7));
+    EXPECT_TRUE(hasUnsigned(node, 187, 3));
+    EXPECT_TRUE(hasUnsigned(node, 188, 0x11));
+    EXPECT_EQ(node, lists.storage[0][0].node);
+    EXPECT_TRUE(hasEventLogChild(mi, node, 4));
+
+    EXPECT_TRUE(log.contains("Table 0 length = 24")) << log.dump();
+    EXPECT_FALSE(log.contains(VERSION_ERROR)) << log.dump();
+}
+
+TEST(FirmwareBiosNodes, SmbiosVersionComesFromTheAcquiredTable) {
+    if (frametest::tableAlreadyAcquired()) {
+        GTEST_SKIP() << "the SMBIOS table of this process was acquired by an earlier test; run "
+                        "each test case in a process of its own (ctest)";
+    }
+    TableBuilder builder;
+    builder.add(biosInformation(0x0000, "Corvane", "C1 [B1-1.0]", "03/14/2021"));
+    builder.endOfTable(0xFEFF);
+    smbiostest::TempDir dir;
+    smbiostest::ScopedEnv env("KESTREL_DATA_DIR", dir.path() + "/");
+    frametest::writeOverride(dir.path(), builder.build(), 3, 2);
+
+    TestMI mi;
+    mi.initialize(1, IC::Number(0u), IC::Number(0u));
+    ASSERT_EQ(3u, mi.getSmBiosMajorVersion());
+    ASSERT_EQ(2u, mi.getSmBiosMinorVersion());
+
+    SD::SmBios parsed(builder.build());
+    StructureLists lists(parsed);
+    IC::MutableNode* parent = buildertest::addParent(mi);
+    mi.makeFirmwareNodes(lists.get(), parent->getNodeId());
+
+    std::vector<IC::Node*> const children = childrenOf(mi, parent->getNodeId());
+    ASSERT_EQ(1u, children.size());
+    EXPECT_TRUE(hasNodeType(children[0], 3));
+    EXPECT_EQ("BIOS", children[0]->getDescription());
+    EXPECT_TRUE(hasVersion(children[0], 175, 3, 2));
+    EXPECT_TRUE(hasUnsigned(children[0], 104, 3));
+    EXPECT_TRUE(hasUnsigned(children[0], 107, 2));
+}
+
+TEST(FirmwareBiosNodes, VersionWithoutBracketsLogsTheErrorAndSetsTheWholeVersion) {
+    VersionedMI mi(2, 4);
+    TableBuilder builder;
+    builder.add(biosInformation(0x0000, "Corvane", "1.05", "03/14/2021"));
+    SD::SmBios parsed(builder.build());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    LogCapture log;
+    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+
+    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
+    ASSERT_EQ(1u, firmware.size());
+    IC::Node const* node = firmware[0];
+    EXPECT_TRUE(hasString(node, 134, "1.05"));
+    EXPECT_TRUE(hasString(node, 307, "1.05"));
+    EXPECT_TRUE(lacksProperty(node, 70));
+    EXPECT_EQ((Ids{36, 104, 107, 108, 134, 164, 175, 187, 188, 307}), propertyIds(node));
+    EXPECT_EQ((std::vector<int>{6000}), frametest::loggedLevels(VERSION_ERROR)) << log.dump();
+}
+
+TEST(FirmwareBiosNodes, BracketsWithoutDashAreAnUnreadableVersion) {
+    VersionedMI mi(2, 4);
+    TableBuilder builder;
+    builder.add(biosInformation(0x0000, "Corvane", "C1 [R5B3 1.06]", "03/14/2021"));
+    SD::SmBios parsed(builder.build());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    LogCapture log;
+    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+
+    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
+    ASSERT_EQ(1u, firmware.size());
+    EXPECT_TRUE(hasString(firmware[0], 134, "C1 [R5B3 1.06]"));
+    EXPECT_TRUE(lacksProperty(firmware[0], 70));
+    EXPECT_EQ((std::vector<int>{6000}), frametest::loggedLevels(VERSION_ERROR)) << log.dump();
+}
+
+TEST(FirmwareBiosNodes, DashOutsideTheBracketsIsNotABuildId) {
+    VersionedMI mi(2, 4);
+    TableBuilder builder;
+    // Character searches, no trimming: the inner text " R5 " has no dash.
+    builder.add(biosInformation(0x0000, "Corvane", "C1-A [ R5 ]", "03/14/2021"));
+    builder.add(biosInformation(0x0001, "Corvane", "X [ R5 - 2.1 ]", "03/14/2021"));
+    SD::SmBios parsed(builder.build());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    LogCapture log;
+    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+
+    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
+    ASSERT_EQ(2u, firmware.size());
+    EXPECT_TRUE(hasString(firmware[0], 134, "C1-A [ R5 ]"));
+    EXPECT_TRUE(lacksProperty(firmware[0], 70));
+    EXPECT_TRUE(hasString(firmware[1], 70, " R5 "));
+    EXPECT_TRUE(hasString(firmware[1], 134, " 2.1 "));
+    EXPECT_EQ(1u, loggedCount(VERSION_ERROR)) << log.dump();
+}
+
+TEST(FirmwareBiosNodes, EmptyVersionStringNumberIsUnreadable) {
+    VersionedMI mi(2, 4);
+    TableBuilder builder;
+    builder.add(biosInformation(0x0000, "", "", ""));
+    SD::SmBios parsed(builder.build());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    LogCapture log;
+    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+
+    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
+    ASSERT_EQ(1u, firmware.size());
+    // Strings that name no string are set as empty texts.
+    EXPECT_TRUE(hasString(firmware[0], 36, ""));
+    EXPECT_TRUE(hasString(firmware[0], 164, ""));
+    EXPECT_TRUE(hasString(firmware[0], 307, ""));
+    EXPECT_TRUE(hasString(firmware[0], 134, ""));
+    EXPECT_EQ(1u, loggedCount(VERSION_ERROR)) << log.dump();
+}
+
+TEST(FirmwareBiosNodes, Length0x14HasNoSmbiosVersionAndNoEcRelease) {
+    VersionedMI mi(2, 4);
+    TableBuilder builder;
+    builder.add(biosInformation(0x0000, "Corvane", "C1 [B1-1.0]", "03/14/2021", 0x14));
+    SD::SmBios parsed(builder.build());
+    ASSERT_EQ(0x14, parsed.getTables()[0].getLength());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+
+    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
+    ASSERT_EQ(1u, firmware.size());
+    EXPECT_EQ((Ids{36, 70, 108, 134, 164, 307}), propertyIds(firmware[0]));
+    EXPECT_TRUE(lacksProperty(firmware[0], 175));
+    EXPECT_TRUE(lacksProperty(firmware[0], 104));
+    EXPECT_TRUE(lacksProperty(firmware[0], 107));
+    EXPECT_TRUE(lacksProperty(firmware[0], 187));
+    EXPECT_TRUE(lacksProperty(firmware[0], 188));
+}
+
+TEST(FirmwareBiosNodes, Length0x16HasTheSmbiosVersionButNoEcRelease) {
+    VersionedMI mi(2, 4);
+    TableBuilder builder;
+    builder.add(biosInformation(0x0000, "Corvane", "C1 [B1-1.0]", "03/14/2021", 0x16));
+    SD::SmBios parsed(builder.build());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+
+    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
+    ASSERT_EQ(1u, firmware.size());
+    EXPECT_EQ((Ids{36, 70, 104, 107, 108, 134, 164, 175, 307}), propertyIds(firmware[0]));
+    EXPECT_TRUE(hasVersion(firmware[0], 175, 2, 4));
+    EXPECT_TRUE(hasUnsigned(firmware[0], 104, 2));
+    EXPECT_TRUE(hasUnsigned(firmware[0], 107, 4));
+}
+
+TEST(FirmwareBiosNodes, Length0x17ReadsTheMissingEcMinorAsZero) {
+    VersionedMI mi(2, 4);
+    TableBuilder builder;
+    builder.add(biosInformation(0x0000, "Corvane", "C1 [B1-1.0]", "03/14/2021", 0x17, 0x05));
+    SD::SmBios parsed(builder.build());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    LogCapture log;
+    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+
+    // Longer than 22 bytes, so both release bytes are read; the reader's own
+    // check turns the byte at 0x17 into 0.
+    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
+    ASSERT_EQ(1u, firmware.size());
+    EXPECT_TRUE(hasUnsigned(firmware[0], 187, 5));
+    EXPECT_TRUE(hasUnsigned(firmware[0], 188, 0));
+    EXPECT_TRUE(log.contains("getNumber8 offset=23 length=23")) << log.dump();
+}
+
+TEST(FirmwareBiosNodes, Length0x18WithEcBytesFFSetsTheVersionButNoEcRelease) {
+    VersionedMI mi(2, 8);
+    TableBuilder builder;
+    builder.add(biosInformation(0x0000, "Corvane", "C1 [B1-1.0]", "03/14/2021", 0x18, 0xFF, 0xFF));
+    // One byte 0xFF is enough to leave both out.
+    builder.add(biosInformation(0x0001, "Corvane", "C1 [B1-1.0]", "03/14/2021", 0x18, 0x01, 0xFF));
+    builder.add(biosInformation(0x0002, "Corvane", "C1 [B1-1.0]", "03/14/2021", 0x18, 0xFF, 0x01));
+    // 254 is the largest release number.
+    builder.add(biosInformation(0x0003, "Corvane", "C1 [B1-1.0]", "03/14/2021", 0x18, 0xFE, 0x00));
+    SD::SmBios parsed(builder.build());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+
+    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
+    ASSERT_EQ(4u, firmware.size());
+    for (size_t i = 0; i < 3; ++i) {
+        EXPECT_TRUE(hasVersion(firmware[i], 175, 2, 8)) << i;
+        EXPECT_TRUE(hasUnsigned(firmware[i], 104, 2)) << i;
+        EXPECT_TRUE(hasUnsigned(firmware[i], 107, 8)) << i;
+        EXPECT_TRUE(lacksProperty(firmware[i], 187)) << i;
+        EXPECT_TRUE(lacksProperty(firmware[i], 188)) << i;
+    }
+    EXPECT_TRUE(hasUnsigned(firmware[3], 187, 254));
+    EXPECT_TRUE(hasUnsigned(firmware[3], 188, 0));
+}
+
+TEST(FirmwareBiosNodes, FailureInABiosStructureLogsTable0AndTheLoopIndex) {
+    VersionedMI mi(2, 4);
+    TableBuilder builder;
+    builder.add(biosInformation(0x0000, "Corvane", "C1 [B1-1.0]", "03/14/2021"));
+    // The last structure claims a formatted area longer than its bytes, so
+    // its strings cannot be found: the vendor lookup throws.
+    builder.add(biosInformation(0x0001, "Corvane", "C2 [B2-2.0]", "04/14/2021").length(0x40));
+    SD::SmBios parsed(builder.build());
+    ASSERT_EQ(2u, parsed.getTables().size());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    LogCapture log;
+    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+
+    std::string const logged = frametest::firstLogged("Exception=");
+    EXPECT_NE(std::string::npos, logged.find(" Type=")) << log.dump();
+    EXPECT_NE(std::string::npos, logged.find("Table 0 index =1")) << logged;
+    EXPECT_EQ((std::vector<int>{6000}), frametest::loggedLevels("Exception=")) << log.dump();
+
+    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
+    ASSERT_EQ(2u, firmware.size());
+    EXPECT_TRUE(isNode(firmware[0], 3, 2, 3, 1, 1, "BIOS"));
+    EXPECT_TRUE(hasString(firmware[0], 70, "B1"));
+    // The node made before the failure stays, with what it had by then.
+    EXPECT_TRUE(isNode(firmware[1], 4, 2, 3, 2, 1, "BIOS"));
+    EXPECT_TRUE(propertyIds(firmware[1]).empty());
+    EXPECT_TRUE(log.contains("makeFirmwareNodes exit")) << log.dump();
+}
+
+TEST(FirmwareBuilder, NoOemAndNoBiosStructuresMakeNoNodeAndLogOnlyEntryAndExit) {
+    TestMI mi;
+    TableBuilder builder;
+    builder.add(eventLog(0x0F00));
+    SD::SmBios parsed(builder.build());
+    StructureLists lists(parsed);
+    IC::MutableNode* planar = buildertest::addParent(mi);
+    LogCapture log;
+    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+
+    EXPECT_EQ(1u, mi.nodeList.size());
+    EXPECT_EQ((std::vector<std::string>{"makeFirmwareNodes entry", "makeFirmwareNodes exit"}),
+              frametest::loggedTexts())
+        << log.dump();
+    std::vector<int> const levels = frametest::loggedLevels("makeFirmwareNodes");
+    EXPECT_EQ((std::vector<int>{3000, 3000}), levels);
+}

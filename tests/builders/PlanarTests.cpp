@@ -1,0 +1,642 @@
+// The planar builder: the one planar node made from the preferred baseboard
+// structure (type 2) under its chassis, the product and location it copies
+// to the chassis, the takeover of the structure groups, the contained-handle
+// and group-association logging, and the two orders in which it runs the
+// component builders.
+#include <gtest/gtest.h>
+
+#include <cstdint>
+#include <sstream>
+#include <string>
+#include <vector>
+
+#include "BuilderFixture.h"
+
+using buildertest::childrenOf;
+using buildertest::hasEnum;
+using buildertest::hasNodeType;
+using buildertest::hasString;
+using buildertest::hasUnsigned;
+using buildertest::lacksProperty;
+using buildertest::nodesOfType;
+using buildertest::propertyIds;
+using buildertest::StructureLists;
+using buildertest::TestMI;
+using smbiostest::Structure;
+using smbiostest::TableBuilder;
+
+namespace {
+
+uint8_t const MOTHERBOARD = 0x0A;
+uint8_t const SERVER_BLADE = 0x03;
+
+// Board types from the most to the least preferred.
+std::vector<uint8_t> const PRIORITY = {0x0A, 0x03, 0x0B, 0x0C, 0x06, 0x02, 0x09,
+                                       0x05, 0x08, 0x07, 0x04, 0x0D, 0x01};
+
+// The fields of a Baseboard Information structure.
+struct BoardFields {
+    std::string manufacturer = "Board Maker";
+    std::string product = "MB-100";
+    std::string version = "BV-1";
+    std::string serial = "BRD-1";
+    std::string assetTag = "BA-1";
+    uint8_t featureFlags = 0x09;
+    std::string location = "Slot A";
+    uint16_t chassisHandle = 0x0300;
+    uint8_t boardType = MOTHERBOARD;
+    std::vector<uint16_t> handles;
+    // Written as the handle count instead of the number of handles, when
+    // not negative.
+    int count = -1;
+};
+
+BoardFields boardOfType(uint8_t type, std::string const& product) {
+    BoardFields fields;
+    fields.boardType = type;
+    fields.product = product;
+    return fields;
+}
+
+Structure baseboard(uint16_t handle, BoardFields const& fields = BoardFields()) {
+    Structure structure(2, handle);
+    structure.str(fields.manufacturer)
+        .str(fields.product)
+        .str(fields.version)
+        .str(fields.serial)
+        .str(fields.assetTag)
+        .byte(fields.featureFlags)
+        .str(fields.location)
+        .word(fields.chassisHandle)
+        .byte(fields.boardType)
+        .byte(static_cast<uint8_t>(fields.count >= 0 ? fields.count : fields.handles.size()));
+    for (uint16_t contained : fields.handles) {
+        structure.word(contained);
+    }
+    return structure;
+}
+
+Structure systemInformation(uint16_t handle, std::string const& manufacturer = "Corvane") {
+    return Structure(1, handle)
+        .str(manufacturer)
+        .str("RS-7400")
+        .str("V1.2")
+        .str("SYS-0001")
+        .bytes(std::vector<uint8_t>(16, 0x11))
+        .byte(0x06)
+        .str("SKU-77")
+        .str("Server");
+}
+
+// A group association (type 14) with its items, each (type, handle).
+Structure group(uint16_t handle, std::string const& name,
+                std::vector<std::pair<uint8_t, uint16_t>> const& items) {
+    Structure structure(14, handle);
+    structure.str(name);
+    for (auto const& item : items) {
+        structure.byte(item.first).word(item.second);
+    }
+    return structure;
+}
+
+// An additional-information structure (type 40): no builder makes a node of
+// it, and it gets no raw table node.
+Structure additional(uint16_t handle) { return Structure(40, handle).byte(0); }
+
+// The builder run over a table under a chassis-like parent (node id 2), or
+// under the given parent id.
+struct PlanarRun {
+    explicit PlanarRun(TableBuilder const& table, unsigned int parentId = 0)
+        : parsed(frametest::parse(table)), lists(parsed) {
+        parent = buildertest::addParent(mi, 1);
+        mi.makePlanarNodes(lists.get(), parentId != 0 ? parentId : parent->getNodeId());
+    }
+
+    std::vector<IC::Node*> planars() const { return nodesOfType(mi, 41); }
+    bool sharedListsEmpty() const {
+        for (unsigned int type = 0; type < 256; ++type) {
+            if (!lists.storage[type].empty()) {
+                return false;
+            }
+        }
+        return true;
+    }
+
+    SD::SmBios parsed;
+    StructureLists lists;
+    TestMI mi;
+    IC::MutableNode* parent = nullptr;
+};
+
+// The entry lines of the component builders that the planar calls, in the
+// order they were logged.
+std::vector<std::string> childBuilderOrder() {
+    std::vector<std::string> const markers = {"makeCpuNodes entry",
+                                              "makeSlotNodes entry",
+                                              "makeConnectorNodes entry",
+                                              "makeDimmNodes entry",
+                                              "makeDiskControllerNodes entry",
+                                              "makeSMBIOSTableNodes entry",
+                                              "makeFirmwareNodes entry",
+                                              "makeKVDNodes entry"};
+    std::vector<std::string> order;
+    for (std::string const& text : frametest::loggedTexts()) {
+        for (std::string const& marker : markers) {
+            if (text == marker) {
+                order.push_back(marker);
+            }
+        }
+    }
+    return order;
+}
+
+// The numbers of the "Handles=" line, or {} when there is none.
+std::vector<unsigned int> loggedHandles(bool& closed) {
+    std::string const line = frametest::firstLogged("Handles=");
+    std::vector<unsigned int> numbers;
+    closed = false;
+    if (line.empty()) {
+        return numbers;
+    }
+    std::string const prefix = "Handles={ ";
+    if (line.compare(0, prefix.size(), prefix) != 0 || line.back() != '}') {
+        return numbers;
+    }
+    closed = true;
+    std::istringstream in(line.substr(prefix.size(), line.size() - prefix.size() - 1));
+    unsigned int number = 0;
+    while (in >> number) {
+        numbers.push_back(number);
+    }
+    return numbers;
+}
+
+}  // namespace
+
+// ---------------------------------------------------------------------------
+// The planar node
+
+TEST(PlanarBuilder, FullStructureGivesOnePlanarNodeWithEveryProperty) {
+    smbiostest::LogCapture log;
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    table.add(baseboard(0x0200));
+    table.endOfTable(0xFEFF);
+    PlanarRun run(table);
+
+    std::vector<IC::Node*> const planars = run.planars();
+    ASSERT_EQ(1u, planars.size()) << log.dump();
+    IC::Node const* node = planars[0];
+    EXPECT_EQ(3u, node->getNodeId());
+    EXPECT_EQ(run.parent->getNodeId(), node->getLinkedId());
+    EXPECT_TRUE(hasNodeType(node, 41));
+    EXPECT_EQ(0u, node->getIndex());
+    EXPECT_EQ(1u, node->getStatus());
+    EXPECT_EQ("Planar", node->getDescription());
+    EXPECT_EQ(run.mi.miIdList, node->getMIIds());
+
+    // The version string is not read.
+    EXPECT_EQ((std::vector<unsigned int>{2, 31, 36, 39, 44, 50, 128, 172}), propertyIds(node));
+    EXPECT_TRUE(hasString(node, 36, "Board Maker"));
+    EXPECT_TRUE(hasString(node, 39, "MB-100"));
+    EXPECT_TRUE(hasString(node, 172, "MB-100"));
+    EXPECT_TRUE(hasString(node, 50, "BRD-1"));
+    EXPECT_TRUE(hasString(node, 2, "BA-1"));
+    EXPECT_TRUE(hasEnum(node, 44, 1, 0x09));
+    EXPECT_TRUE(hasString(node, 31, "Slot A"));
+    EXPECT_TRUE(hasUnsigned(node, 128, 0x0A));
+
+    // The product and the location also go to the parent.
+    EXPECT_EQ((std::vector<unsigned int>{31, 172}), propertyIds(run.parent));
+    EXPECT_TRUE(hasString(run.parent, 172, "MB-100"));
+    EXPECT_TRUE(hasString(run.parent, 31, "Slot A"));
+
+    EXPECT_EQ(2u, log.count("makePlanarNodes entry")) << log.dump();
+    EXPECT_EQ(2u, log.count("makePlanarNodes exit")) << log.dump();
+    EXPECT_EQ(2u, log.count("makePlanarNodes system manufacturer = Corvane")) << log.dump();
+    EXPECT_EQ(2u, log.count("Table 2 length = 15")) << log.dump();
+    EXPECT_EQ(2u, log.count("Handle=768")) << log.dump();
+    EXPECT_EQ(2u, log.count("Count of contained object handles=0")) << log.dump();
+    EXPECT_EQ(0u, log.count("Handles=")) << log.dump();
+    EXPECT_EQ(0u, log.count("No Table 2 for Planar")) << log.dump();
+}
+
+TEST(PlanarBuilder, ShortBaseboardSetsBoardTypeZeroAndLacksTheLaterFields) {
+    smbiostest::LogCapture log;
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    table.add(Structure(2, 0x0200).str("Board Maker").str("MB-100").str("BV-1").str("BRD-1"));
+    PlanarRun run(table);
+    ASSERT_EQ(8u, run.parsed.getTables()[1].getLength());
+
+    std::vector<IC::Node*> const planars = run.planars();
+    ASSERT_EQ(1u, planars.size()) << log.dump();
+    EXPECT_EQ((std::vector<unsigned int>{36, 39, 50, 128, 172}), propertyIds(planars[0]));
+    EXPECT_TRUE(hasUnsigned(planars[0], 128, 0));
+    EXPECT_TRUE(hasString(planars[0], 50, "BRD-1"));
+    EXPECT_EQ((std::vector<unsigned int>{172}), propertyIds(run.parent));
+    EXPECT_EQ(2u, log.count("Count of contained object handles=0")) << log.dump();
+}
+
+TEST(PlanarBuilder, EmptyProductSetsEmpty39AndNo172OnEitherNode) {
+    BoardFields fields;
+    fields.product = "";
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    table.add(baseboard(0x0200, fields));
+    PlanarRun run(table);
+
+    std::vector<IC::Node*> const planars = run.planars();
+    ASSERT_EQ(1u, planars.size());
+    EXPECT_TRUE(hasString(planars[0], 39, ""));
+    EXPECT_TRUE(lacksProperty(planars[0], 172));
+    EXPECT_TRUE(lacksProperty(run.parent, 172));
+    EXPECT_TRUE(hasString(planars[0], 31, "Slot A"));
+    EXPECT_TRUE(hasString(run.parent, 31, "Slot A"));
+}
+
+TEST(PlanarBuilder, EmptyLocationSetsNo31OnEitherNode) {
+    BoardFields fields;
+    fields.location = "";
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    table.add(baseboard(0x0200, fields));
+    PlanarRun run(table);
+
+    std::vector<IC::Node*> const planars = run.planars();
+    ASSERT_EQ(1u, planars.size());
+    EXPECT_TRUE(lacksProperty(planars[0], 31));
+    EXPECT_TRUE(lacksProperty(run.parent, 31));
+    EXPECT_TRUE(hasString(planars[0], 172, "MB-100"));
+    EXPECT_EQ((std::vector<unsigned int>{172}), propertyIds(run.parent));
+}
+
+// ---------------------------------------------------------------------------
+// Which baseboard becomes the planar
+
+TEST(PlanarBoardType, MotherboardListedAfterAServerBladeBecomesThePlanar) {
+    TableBuilder table;
+    table.add(baseboard(0x0200, boardOfType(SERVER_BLADE, "Blade")));
+    table.add(baseboard(0x0201, boardOfType(MOTHERBOARD, "Motherboard")));
+    PlanarRun run(table);
+
+    std::vector<IC::Node*> const planars = run.planars();
+    ASSERT_EQ(1u, planars.size());
+    EXPECT_TRUE(hasString(planars[0], 39, "Motherboard"));
+    EXPECT_TRUE(hasUnsigned(planars[0], 128, MOTHERBOARD));
+}
+
+TEST(PlanarBoardType, EachBoardTypeWinsOverTheNextInThePriorityList) {
+    for (size_t i = 0; i + 1 < PRIORITY.size(); ++i) {
+        SCOPED_TRACE("board type " + std::to_string(PRIORITY[i]) + " before " +
+                     std::to_string(PRIORITY[i + 1]));
+        TableBuilder table;
+        table.add(baseboard(0x0200, boardOfType(PRIORITY[i + 1], "Less preferred")));
+        table.add(baseboard(0x0201, boardOfType(PRIORITY[i], "Preferred")));
+        PlanarRun run(table);
+        std::vector<IC::Node*> const planars = run.planars();
+        ASSERT_EQ(1u, planars.size());
+        EXPECT_TRUE(hasString(planars[0], 39, "Preferred"));
+        EXPECT_TRUE(hasUnsigned(planars[0], 128, PRIORITY[i]));
+    }
+}
+
+TEST(PlanarBoardType, MotherboardWinsOverEveryOtherBoardType) {
+    TableBuilder table;
+    uint16_t handle = 0x0200;
+    for (size_t i = PRIORITY.size(); i-- > 0;) {
+        table.add(baseboard(handle++, boardOfType(PRIORITY[i], "Board " + std::to_string(i))));
+    }
+    PlanarRun run(table);
+    std::vector<IC::Node*> const planars = run.planars();
+    ASSERT_EQ(1u, planars.size());
+    EXPECT_TRUE(hasString(planars[0], 39, "Board 0"));
+    EXPECT_TRUE(hasUnsigned(planars[0], 128, MOTHERBOARD));
+}
+
+TEST(PlanarBoardType, FirstOfTwoEqualBoardsBecomesThePlanar) {
+    TableBuilder table;
+    table.add(baseboard(0x0200, boardOfType(MOTHERBOARD, "First")));
+    table.add(baseboard(0x0201, boardOfType(MOTHERBOARD, "Second")));
+    PlanarRun run(table);
+    std::vector<IC::Node*> const planars = run.planars();
+    ASSERT_EQ(1u, planars.size());
+    EXPECT_TRUE(hasString(planars[0], 39, "First"));
+}
+
+TEST(PlanarBoardType, BoardTypeOutsideTheListIsStillTakenWhenAlone) {
+    TableBuilder table;
+    table.add(baseboard(0x0200, boardOfType(0x20, "Odd board")));
+    PlanarRun run(table);
+    std::vector<IC::Node*> const planars = run.planars();
+    ASSERT_EQ(1u, planars.size());
+    EXPECT_TRUE(hasString(planars[0], 39, "Odd board"));
+    EXPECT_TRUE(hasUnsigned(planars[0], 128, 0x20));
+}
+
+TEST(PlanarBoardType, FirstStructureIsTakenWhenNoBoardTypeIsInTheList) {
+    TableBuilder table;
+    table.add(baseboard(0x0200, boardOfType(0x20, "First")));
+    table.add(baseboard(0x0201, boardOfType(0x00, "Second")));
+    table.add(baseboard(0x0202, boardOfType(0x0E, "Third")));
+    PlanarRun run(table);
+    std::vector<IC::Node*> const planars = run.planars();
+    ASSERT_EQ(1u, planars.size());
+    EXPECT_TRUE(hasString(planars[0], 39, "First"));
+}
+
+TEST(PlanarBoardType, UnknownBoardTypeWinsOverATypeOutsideTheList) {
+    TableBuilder table;
+    table.add(baseboard(0x0200, boardOfType(0x20, "Odd")));
+    table.add(baseboard(0x0201, boardOfType(0x01, "Unknown")));
+    PlanarRun run(table);
+    std::vector<IC::Node*> const planars = run.planars();
+    ASSERT_EQ(1u, planars.size());
+    EXPECT_TRUE(hasString(planars[0], 39, "Unknown"));
+}
+
+// ---------------------------------------------------------------------------
+// The takeover of the structure groups and the component builders
+
+TEST(PlanarTakeover, AfterTheBuilderEverySharedListIsEmpty) {
+    smbiostest::LogCapture log;
+    TableBuilder table;
+    table.add(Structure(0, 0x0000).str("Corvane").str("1.0").word(0xE800).str("01/01/2020"));
+    table.add(systemInformation(0x0100));
+    table.add(baseboard(0x0200));
+    table.add(Structure(3, 0x0300).str("Chassis Maker").byte(0x17));
+    table.add(group(0x0E00, "Cluster", {{3, 0x0300}}));
+    table.add(additional(0x2800));
+    table.add(additional(0x2801));
+    table.endOfTable(0xFEFF);
+    PlanarRun run(table);
+
+    EXPECT_TRUE(run.sharedListsEmpty());
+    EXPECT_EQ(1u, run.planars().size());
+    // What no component builder consumed is logged and then dropped.
+    EXPECT_EQ(2u, log.count("Table(s) for index 40")) << log.dump();
+    EXPECT_EQ(2u, log.count("Table(s) for index 127")) << log.dump();
+    // Each left-over entry with its length: the two additional-information
+    // structures (5 bytes) and the end of table (4 bytes).
+    size_t fiveBytes = 0;
+    size_t fourBytes = 0;
+    for (std::string const& text : frametest::loggedTexts()) {
+        if (text.compare(0, 13, "   Pointer = ") != 0) {
+            continue;
+        }
+        size_t const at = text.find(" length = ");
+        std::string const tail = at == std::string::npos ? "" : text.substr(at);
+        fiveBytes += tail == " length = 5" ? 1 : 0;
+        fourBytes += tail == " length = 4" ? 1 : 0;
+    }
+    EXPECT_EQ(2u, fiveBytes) << log.dump();
+    EXPECT_EQ(1u, fourBytes) << log.dump();
+}
+
+TEST(PlanarTakeover, RawTableNodesHangUnderThePlanar) {
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    table.add(baseboard(0x0200));
+    table.add(Structure(3, 0x0300).str("Chassis Maker").byte(0x17));
+    table.add(additional(0x2800));
+    table.endOfTable(0xFEFF);
+    PlanarRun run(table);
+
+    std::vector<IC::Node*> const planars = run.planars();
+    ASSERT_EQ(1u, planars.size());
+    std::vector<IC::Node*> const raw = nodesOfType(run.mi, 55);
+    // Types 1, 2 and 3; types 40 and 127 get no raw node.
+    ASSERT_EQ(3u, raw.size());
+    for (IC::Node const* node : raw) {
+        EXPECT_EQ(planars[0]->getNodeId(), node->getLinkedId());
+    }
+    EXPECT_TRUE(hasUnsigned(raw[0], 177, 1));
+    EXPECT_TRUE(hasUnsigned(raw[1], 177, 2));
+    EXPECT_TRUE(hasUnsigned(raw[2], 177, 3));
+    EXPECT_EQ(raw, childrenOf(run.mi, planars[0]->getNodeId()));
+}
+
+TEST(PlanarTakeover, ChildBuildersRunInTheFirstOrderWithABaseboard) {
+    smbiostest::LogCapture log;
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    table.add(baseboard(0x0200));
+    PlanarRun run(table);
+    EXPECT_EQ((std::vector<std::string>{
+                  "makeCpuNodes entry", "makeSlotNodes entry", "makeConnectorNodes entry",
+                  "makeDimmNodes entry", "makeDiskControllerNodes entry",
+                  "makeSMBIOSTableNodes entry", "makeFirmwareNodes entry", "makeKVDNodes entry"}),
+              childBuilderOrder())
+        << log.dump();
+}
+
+TEST(PlanarTakeover, ChildBuildersRunInTheSecondOrderWithoutABaseboard) {
+    smbiostest::LogCapture log;
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    PlanarRun run(table);
+    EXPECT_EQ((std::vector<std::string>{"makeCpuNodes entry", "makeSlotNodes entry",
+                                        "makeConnectorNodes entry", "makeDimmNodes entry",
+                                        "makeFirmwareNodes entry", "makeDiskControllerNodes entry",
+                                        "makeKVDNodes entry", "makeSMBIOSTableNodes entry"}),
+              childBuilderOrder())
+        << log.dump();
+}
+
+TEST(PlanarTakeover, NoBaseboardMakesABarePlanarAndLeavesTheSharedListsAsTheyAre) {
+    smbiostest::LogCapture log;
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    table.add(Structure(3, 0x0300).str("Chassis Maker").byte(0x17));
+    table.add(additional(0x2800));
+    table.endOfTable(0xFEFF);
+    PlanarRun run(table);
+
+    std::vector<IC::Node*> const planars = run.planars();
+    ASSERT_EQ(1u, planars.size()) << log.dump();
+    IC::Node const* node = planars[0];
+    EXPECT_EQ(3u, node->getNodeId());
+    EXPECT_EQ(run.parent->getNodeId(), node->getLinkedId());
+    EXPECT_TRUE(hasNodeType(node, 41));
+    EXPECT_EQ(0u, node->getIndex());
+    EXPECT_EQ(1u, node->getStatus());
+    EXPECT_EQ("Planar", node->getDescription());
+    EXPECT_EQ(run.mi.miIdList, node->getMIIds());
+    EXPECT_TRUE(propertyIds(node).empty());
+    EXPECT_TRUE(propertyIds(run.parent).empty());
+
+    EXPECT_EQ(2u, log.count("No Table 2 for Planar")) << log.dump();
+    EXPECT_EQ(2u, log.count("makePlanarNodes exit")) << log.dump();
+    EXPECT_EQ(0u, log.count("Table 2 length = ")) << log.dump();
+    EXPECT_EQ(0u, log.count("Count of contained object handles=")) << log.dump();
+    EXPECT_EQ(1u, run.lists.storage[1].size());
+    EXPECT_EQ(1u, run.lists.storage[3].size());
+    EXPECT_EQ(1u, run.lists.storage[40].size());
+    EXPECT_EQ(1u, run.lists.storage[127].size());
+
+    // The raw table nodes hang under the bare planar.
+    std::vector<IC::Node*> const raw = nodesOfType(run.mi, 55);
+    ASSERT_EQ(2u, raw.size());
+    for (IC::Node const* rawNode : raw) {
+        EXPECT_EQ(node->getNodeId(), rawNode->getLinkedId());
+    }
+}
+
+// ---------------------------------------------------------------------------
+// Failures and the log
+
+TEST(PlanarBuilder, ParentNotFoundBuildsNothing) {
+    smbiostest::LogCapture log;
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    table.add(baseboard(0x0200));
+    PlanarRun run(table, 99);
+
+    EXPECT_EQ(1u, run.mi.nodeList.size());
+    EXPECT_EQ(3u, run.mi.nextNodeId);
+    EXPECT_TRUE(propertyIds(run.parent).empty());
+    EXPECT_EQ(2u, log.count("makePlanarNodes Exit: failed to find parent node for nodeid 99"))
+        << log.dump();
+    EXPECT_TRUE(childBuilderOrder().empty()) << log.dump();
+    EXPECT_EQ(0u, log.count("makePlanarNodes exit")) << log.dump();
+    // Nothing was taken over.
+    EXPECT_EQ(1u, run.lists.storage[1].size());
+    EXPECT_EQ(1u, run.lists.storage[2].size());
+}
+
+TEST(PlanarBuilder, MissingSystemInformationIsLoggedAndNotFatal) {
+    smbiostest::LogCapture log;
+    TableBuilder table;
+    table.add(baseboard(0x0200));
+    PlanarRun run(table);
+
+    EXPECT_EQ(2u, log.count("makePlanarNodes Smbios required system information table does "
+                            "not exist"))
+        << log.dump();
+    EXPECT_EQ(0u, log.count("makePlanarNodes system manufacturer = ")) << log.dump();
+    std::vector<IC::Node*> const planars = run.planars();
+    ASSERT_EQ(1u, planars.size());
+    EXPECT_TRUE(hasString(planars[0], 36, "Board Maker"));
+    EXPECT_EQ(2u, log.count("makePlanarNodes exit")) << log.dump();
+}
+
+TEST(PlanarBuilder, EmptySystemManufacturerIsTakenFromTheParentForTheLog) {
+    smbiostest::LogCapture log;
+    TableBuilder table;
+    table.add(systemInformation(0x0100, ""));
+    table.add(baseboard(0x0200));
+    SD::SmBios parsed(table.build());
+    StructureLists lists(parsed);
+    TestMI mi;
+    IC::MutableNode* parent = buildertest::addParent(mi, 1);
+    parent->setProperty(36, IC::PropertyValue("Chassis Maker", true));
+    mi.makePlanarNodes(lists.get(), parent->getNodeId());
+
+    EXPECT_EQ(2u, log.count("makePlanarNodes chassis manufacturer = Chassis Maker")) << log.dump();
+    // The text serves the log only: the planar keeps its own manufacturer.
+    std::vector<IC::Node*> const planars = nodesOfType(mi, 41);
+    ASSERT_EQ(1u, planars.size());
+    EXPECT_TRUE(hasString(planars[0], 36, "Board Maker"));
+    EXPECT_TRUE(hasString(parent, 36, "Chassis Maker"));
+}
+
+// ---------------------------------------------------------------------------
+// Contained object handles
+
+TEST(PlanarContainedHandles, HandlesAreLookedUpInEveryGroup) {
+    smbiostest::LogCapture log;
+    BoardFields fields;
+    fields.handles = {0x2800, 0x0999, 0x0200};
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    table.add(baseboard(0x0200, fields));
+    table.add(additional(0x2800));
+    PlanarRun run(table);
+
+    EXPECT_EQ(2u, log.count("Count of contained object handles=3")) << log.dump();
+    bool closed = false;
+    EXPECT_EQ((std::vector<unsigned int>{10240, 2457, 512}), loggedHandles(closed)) << log.dump();
+    EXPECT_TRUE(closed) << log.dump();
+    EXPECT_EQ(2u, log.count("Planar contained element handle 10240 found in Bios table 40"))
+        << log.dump();
+    EXPECT_EQ(2u, log.count("Planar contained element handle 2457 not found in Bios tables "))
+        << log.dump();
+    EXPECT_EQ(2u, log.count("Planar contained element handle 512 found in Bios table 2"))
+        << log.dump();
+    // The handles do not limit what the component builders see.
+    EXPECT_EQ(2u, nodesOfType(run.mi, 55).size());
+}
+
+TEST(PlanarContainedHandles, CountOf120NeedsExactly255BytesAndIsListed) {
+    smbiostest::LogCapture log;
+    BoardFields fields;
+    for (uint16_t i = 0; i < 120; ++i) {
+        fields.handles.push_back(static_cast<uint16_t>(0x1000 + i));
+    }
+    TableBuilder table;
+    table.add(baseboard(0x0200, fields));
+    PlanarRun run(table);
+    ASSERT_EQ(255u, run.parsed.getTables()[0].getLength());
+
+    EXPECT_EQ(2u, log.count("Count of contained object handles=120")) << log.dump();
+    EXPECT_EQ(0u, log.count("exceeds 255 table length")) << log.dump();
+    bool closed = false;
+    std::vector<unsigned int> const handles = loggedHandles(closed);
+    ASSERT_EQ(120u, handles.size()) << log.dump();
+    EXPECT_TRUE(closed);
+    EXPECT_EQ(0x1000u, handles.front());
+    EXPECT_EQ(0x1000u + 119, handles.back());
+    EXPECT_EQ(240u, log.count(" not found in Bios tables ")) << log.dump();
+    EXPECT_EQ(2u, log.count("Planar contained element handle 4215 not found in Bios tables "))
+        << log.dump();
+}
+
+TEST(PlanarContainedHandles, CountOf121ExceedsTheTableLengthAndIsNotListed) {
+    smbiostest::LogCapture log;
+    BoardFields fields;
+    fields.handles = {0x0200, 0x0100};
+    fields.count = 121;
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    table.add(baseboard(0x0200, fields));
+    PlanarRun run(table);
+
+    EXPECT_EQ(2u, log.count("Count of contained object handles=121")) << log.dump();
+    EXPECT_EQ(2u, log.count("Length of contained object handles 257 exceeds 255 table length"))
+        << log.dump();
+    EXPECT_EQ(0u, log.count("Handles=")) << log.dump();
+    EXPECT_EQ(0u, log.count("Planar contained element handle")) << log.dump();
+    EXPECT_EQ(1u, run.planars().size());
+}
+
+// ---------------------------------------------------------------------------
+// Group associations: the lookup is asked with the baseboard's handle as
+// the type and 2 as the handle.
+
+TEST(PlanarGroup, GroupHoldingTheBaseboardHandleAsATypeIsReported) {
+    smbiostest::LogCapture log;
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    table.add(baseboard(0x0020));
+    table.add(group(0x0E00, "Board group", {{0x20, 0x0002}, {4, 0x0400}, {7, 0x0700}}));
+    PlanarRun run(table);
+
+    EXPECT_EQ(2u, log.count(" Planar Group Associations Exist: ")) << log.dump();
+    EXPECT_EQ(2u, log.count("    Table Type=4 Handle=1024")) << log.dump();
+    EXPECT_EQ(2u, log.count("    Table Type=7 Handle=1792")) << log.dump();
+    EXPECT_EQ(1u, run.planars().size());
+}
+
+TEST(PlanarGroup, GroupHoldingTheBaseboardByTypeAndHandleIsNotReported) {
+    smbiostest::LogCapture log;
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    table.add(baseboard(0x0020));
+    table.add(group(0x0E00, "Board group", {{2, 0x0020}, {4, 0x0400}}));
+    PlanarRun run(table);
+
+    EXPECT_EQ(0u, log.count(" Planar Group Associations Exist: ")) << log.dump();
+    EXPECT_EQ(0u, log.count("    Table Type=")) << log.dump();
+    // The lookup itself ran over the group.
+    EXPECT_EQ(2u, log.count("Table 14 length = ")) << log.dump();
+}

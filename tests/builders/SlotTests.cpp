@@ -1,0 +1,317 @@
+// makeSlotNodes and the slot-type map: one system-slot node per System Slots
+// structure (type 9) under the planar, its designation, its slot type in the
+// agent's numbering and its slot id; getCIMSlotType and the 42 pairs of
+// IC::SMBIOS_MI_SLOT::slotMap.
+#include <gtest/gtest.h>
+
+#include <cstdint>
+#include <map>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include "BuilderFixture.h"
+#include "QNLog/QNLogger.h"
+
+using buildertest::addParent;
+using buildertest::hasEnum;
+using buildertest::hasNodeType;
+using buildertest::hasString;
+using buildertest::hasUnsigned;
+using buildertest::lacksProperty;
+using buildertest::nodesOfType;
+using buildertest::propertyIds;
+using buildertest::StructureLists;
+using buildertest::TestMI;
+using smbiostest::Structure;
+using smbiostest::TableBuilder;
+
+namespace {
+
+char const* const SLOT_LOGGER = "Quillon.IC.MI.SmBiosMI.SmBiosMISlot";
+unsigned int const SLOT_NODE = 62;
+
+// The SMBIOS slot types the agent knows and its slot type for each; every
+// other SMBIOS slot type is reported as 1 (other).
+std::vector<std::pair<unsigned int, unsigned int>> const EXPECTED_SLOT_MAP = {
+    {0x01, 1},  {0x02, 0},  {0x03, 1},  {0x04, 1},  {0x05, 1},  {0x06, 16}, {0x07, 1},
+    {0x08, 1},  {0x09, 1},  {0x0A, 7},  {0x0B, 7},  {0x0C, 7},  {0x0D, 1},  {0x0E, 16},
+    {0x0F, 1},  {0x10, 1},  {0x11, 1},  {0x12, 17}, {0x13, 1},  {0xA0, 1},  {0xA1, 1},
+    {0xA2, 1},  {0xA3, 1},  {0xA4, 1},  {0xA5, 18}, {0xA6, 19}, {0xA7, 20}, {0xA8, 21},
+    {0xA9, 22}, {0xAA, 23}, {0xAB, 18}, {0xAC, 19}, {0xAD, 20}, {0xAE, 21}, {0xAF, 22},
+    {0xB0, 23}, {0xB1, 18}, {0xB2, 19}, {0xB3, 20}, {0xB4, 21}, {0xB5, 22}, {0xB6, 23},
+};
+
+// A System Slots structure of SMBIOS 2.1 (length 0x0D): designation (0x04),
+// slot type (0x05), data bus width, current usage, slot length, slot id
+// (word at 0x09), characteristics 1 and 2.
+Structure slot(uint16_t handle, std::string const& designation, uint8_t slotType, uint16_t slotId) {
+    return Structure(9, handle)
+        .str(designation)
+        .byte(slotType)
+        .byte(0x0D)  // x16
+        .byte(0x03)  // available
+        .byte(0x04)  // long
+        .word(slotId)
+        .byte(0x0C)
+        .byte(0x00);
+}
+
+// The texts the slot builder itself logged (log output only), in order.
+std::vector<std::string> slotLog() {
+    std::vector<std::string> texts;
+    for (QNLog::QNLogRecord const& record : QNLog::QNLogger::captured()) {
+        if (record.output == "log" && record.logger == SLOT_LOGGER) {
+            texts.push_back(record.text);
+        }
+    }
+    return texts;
+}
+
+// The slot nodes the builder makes from a table, under a planar.
+struct SlotRun {
+    explicit SlotRun(TableBuilder const& table) : parsed(table.build()), lists(parsed) {
+        planar = addParent(mi);
+        mi.makeSlotNodes(lists.get(), planar->getNodeId());
+        nodes = nodesOfType(mi, SLOT_NODE);
+    }
+
+    SD::SmBios parsed;
+    StructureLists lists;
+    TestMI mi;
+    IC::MutableNode* planar = nullptr;
+    std::vector<IC::Node*> nodes;
+};
+
+// The agent's slot type the builder reports for one slot of the SMBIOS type.
+::testing::AssertionResult slotTypeBecomes(uint8_t smbiosType, unsigned int expected) {
+    TableBuilder table;
+    table.add(slot(0x0900, "SLOT1", smbiosType, 1));
+    SlotRun run(table);
+    if (run.nodes.size() != 1) {
+        return ::testing::AssertionFailure() << run.nodes.size() << " slot nodes, expected 1";
+    }
+    return hasEnum(run.nodes[0], 128, 4, expected);
+}
+
+}  // namespace
+
+TEST(SlotBuilder, SlotNodeFieldByField) {
+    smbiostest::LogCapture log;
+    TableBuilder table;
+    table.add(slot(0x0900, "PCIE1", 0xA8, 0x0102));
+    SlotRun run(table);
+
+    ASSERT_EQ(1u, run.nodes.size());
+    IC::Node const* node = run.nodes[0];
+    EXPECT_EQ(3u, node->getNodeId());
+    EXPECT_EQ(run.planar->getNodeId(), node->getLinkedId());
+    EXPECT_TRUE(hasNodeType(node, 62));
+    EXPECT_EQ(0u, node->getIndex());
+    EXPECT_EQ(run.mi.miIdList, node->getMIIds());
+    EXPECT_EQ(1u, node->getStatus());
+    EXPECT_EQ("System Slot", node->getDescription());
+    EXPECT_EQ((std::vector<unsigned int>{108, 128, 270}), propertyIds(node));
+    EXPECT_TRUE(hasString(node, 108, "PCIE1"));
+    EXPECT_TRUE(hasEnum(node, 128, 4, 21));
+    EXPECT_TRUE(hasUnsigned(node, 270, 0x0102));
+
+    EXPECT_EQ(2u, run.mi.nodeList.size());
+    EXPECT_EQ(4u, run.mi.nextNodeId);
+    EXPECT_EQ((std::vector<std::string>{"makeSlotNodes entry", "Table 9 length = 13",
+                                        "makeSlotNodes exit"}),
+              slotLog())
+        << log.dump();
+}
+
+TEST(SlotBuilder, SlotTypesA8AndB4Give21_06Gives16_12Gives17) {
+    TableBuilder table;
+    table.add(slot(0x0900, "PCIE x4 gen1", 0xA8, 1));
+    table.add(slot(0x0901, "PCIE x4 gen3", 0xB4, 2));
+    table.add(slot(0x0902, "PCI", 0x06, 3));
+    table.add(slot(0x0903, "PCI-X", 0x12, 4));
+    SlotRun run(table);
+
+    ASSERT_EQ(4u, run.nodes.size());
+    EXPECT_TRUE(hasEnum(run.nodes[0], 128, 4, 21));
+    EXPECT_TRUE(hasEnum(run.nodes[1], 128, 4, 21));
+    EXPECT_TRUE(hasEnum(run.nodes[2], 128, 4, 16));
+    EXPECT_TRUE(hasEnum(run.nodes[3], 128, 4, 17));
+}
+
+TEST(SlotBuilder, SlotType02UnknownGivesZero) {
+    EXPECT_TRUE(slotTypeBecomes(0x02, 0));
+    EXPECT_EQ(0u, IC::SmBiosMI::getCIMSlotType(0x02));
+}
+
+TEST(SlotBuilder, SlotTypesMissingFromTheMapGiveOne) {
+    for (uint8_t const smbiosType : {0x00, 0x14, 0x9F, 0xB7, 0xFF}) {
+        SCOPED_TRACE(static_cast<unsigned int>(smbiosType));
+        EXPECT_TRUE(slotTypeBecomes(smbiosType, 1));
+        EXPECT_EQ(1u, IC::SmBiosMI::getCIMSlotType(smbiosType));
+    }
+}
+
+TEST(SlotBuilder, EmptySlotGroupMakesNoNodesAndLogsOnlyEntryAndExit) {
+    TableBuilder table;
+    table.add(Structure(8, 0x0800).str("Compute ITE 1").byte(0).str("").byte(0).byte(0x09));
+    SD::SmBios parsed(table.build());
+    StructureLists lists(parsed);
+    TestMI mi;
+    IC::MutableNode* planar = addParent(mi);
+
+    smbiostest::LogCapture log;
+    mi.makeSlotNodes(lists.get(), planar->getNodeId());
+
+    EXPECT_EQ(1u, mi.nodeList.size());
+    EXPECT_EQ(3u, mi.nextNodeId);
+    EXPECT_TRUE(nodesOfType(mi, SLOT_NODE).empty());
+    EXPECT_EQ((std::vector<std::string>{"makeSlotNodes entry", "makeSlotNodes exit"}),
+              frametest::loggedTexts())
+        << log.dump();
+}
+
+TEST(SlotBuilder, TwoSlotsGetIndexesZeroAndOneInGroupOrder) {
+    TableBuilder table;
+    table.add(slot(0x0900, "SLOT A", 0xA6, 0x0001));
+    table.add(Structure(8, 0x0800).str("J1").byte(0).str("").byte(0).byte(0x09));
+    table.add(slot(0x0901, "SLOT B", 0xAA, 0x0002));
+    SlotRun run(table);
+
+    ASSERT_EQ(2u, run.nodes.size());
+    EXPECT_EQ(3u, run.nodes[0]->getNodeId());
+    EXPECT_EQ(0u, run.nodes[0]->getIndex());
+    EXPECT_TRUE(hasString(run.nodes[0], 108, "SLOT A"));
+    EXPECT_TRUE(hasEnum(run.nodes[0], 128, 4, 19));
+    EXPECT_TRUE(hasUnsigned(run.nodes[0], 270, 1));
+    EXPECT_EQ(4u, run.nodes[1]->getNodeId());
+    EXPECT_EQ(1u, run.nodes[1]->getIndex());
+    EXPECT_TRUE(hasString(run.nodes[1], 108, "SLOT B"));
+    EXPECT_TRUE(hasEnum(run.nodes[1], 128, 4, 23));
+    EXPECT_TRUE(hasUnsigned(run.nodes[1], 270, 2));
+    for (IC::Node const* node : run.nodes) {
+        EXPECT_EQ(run.planar->getNodeId(), node->getLinkedId());
+    }
+}
+
+TEST(SlotBuilder, SlotTypeIsAFourByteEnumeratedValue) {
+    TableBuilder table;
+    table.add(slot(0x0900, "PCI1", 0x0E, 7));
+    SlotRun run(table);
+
+    ASSERT_EQ(1u, run.nodes.size());
+    IC::PropertyValue value;
+    ASSERT_EQ(0u, run.nodes[0]->getProperty(128, value).getStatus());
+    ASSERT_EQ(IC::PropertyValue::ENUM, value.getKind());
+    EXPECT_EQ(4u, value.getEnum().getWidth());
+    EXPECT_EQ(IC::EnumValue(16u), value.getEnum());
+}
+
+TEST(SlotBuilder, SlotIdIsTheWordAtOffset9) {
+    TableBuilder table;
+    table.add(slot(0x0900, "SLOT1", 0xA5, 270));
+    table.add(slot(0x0901, "SLOT2", 0xA5, 0xBEEF));
+    SlotRun run(table);
+
+    ASSERT_EQ(2u, run.nodes.size());
+    EXPECT_TRUE(hasUnsigned(run.nodes[0], 270, 270));
+    EXPECT_TRUE(hasUnsigned(run.nodes[1], 270, 0xBEEF));
+}
+
+TEST(SlotBuilder, SlotNodeForEveryListedSlotTypeCarriesItsMappedType) {
+    TableBuilder table;
+    uint16_t handle = 0x0900;
+    for (auto const& pair : EXPECTED_SLOT_MAP) {
+        table.add(slot(handle++, "S" + std::to_string(pair.first), static_cast<uint8_t>(pair.first),
+                       static_cast<uint16_t>(pair.first)));
+    }
+    SlotRun run(table);
+
+    ASSERT_EQ(EXPECTED_SLOT_MAP.size(), run.nodes.size());
+    for (size_t i = 0; i < run.nodes.size(); ++i) {
+        SCOPED_TRACE("SMBIOS slot type " + std::to_string(EXPECTED_SLOT_MAP[i].first));
+        EXPECT_EQ(i, run.nodes[i]->getIndex());
+        EXPECT_TRUE(hasEnum(run.nodes[i], 128, 4, EXPECTED_SLOT_MAP[i].second));
+        EXPECT_TRUE(hasUnsigned(run.nodes[i], 270, EXPECTED_SLOT_MAP[i].first));
+    }
+}
+
+TEST(SlotBuilder, ShortSlotWithoutSlotTypeGivesOtherAndSlotIdZero) {
+    smbiostest::LogCapture log;
+    TableBuilder table;
+    // Designation only: the formatted area ends before the slot type.
+    table.add(Structure(9, 0x0900).str("STUB"));
+    SlotRun run(table);
+
+    ASSERT_EQ(1u, run.nodes.size());
+    IC::Node const* node = run.nodes[0];
+    EXPECT_EQ(1u, node->getStatus());
+    EXPECT_EQ("System Slot", node->getDescription());
+    EXPECT_EQ((std::vector<unsigned int>{108, 128, 270}), propertyIds(node));
+    EXPECT_TRUE(hasString(node, 108, "STUB"));
+    EXPECT_TRUE(hasEnum(node, 128, 4, 1));
+    EXPECT_TRUE(hasUnsigned(node, 270, 0));
+    EXPECT_TRUE(log.contains("getNumber8 offset=5 length=5")) << log.dump();
+    EXPECT_TRUE(log.contains("getNumber16 offset=9 length=5")) << log.dump();
+}
+
+TEST(SlotBuilder, FailureInOneSlotIsLoggedAndTheNextSlotStillGetsANode) {
+    smbiostest::LogCapture log;
+    TableBuilder table;
+    // Length 10: the slot id's first byte is the last byte of the formatted
+    // area, so the reader's check passes and the word read fails.
+    table.add(
+        Structure(9, 0x0900).str("CUT").byte(0xA5).byte(0x0D).byte(0x03).byte(0x04).byte(0x01));
+    table.add(slot(0x0901, "WHOLE", 0xA9, 5));
+    SlotRun run(table);
+
+    EXPECT_TRUE(log.contains("Exception=")) << log.dump();
+    std::string const failure = frametest::firstLogged("Exception=");
+    EXPECT_EQ(0u, failure.find("Exception= Type=")) << failure;
+    EXPECT_NE(std::string::npos, failure.find("out_of_range")) << failure;
+    EXPECT_NE(std::string::npos, failure.find("Table 9 index =0")) << failure;
+    EXPECT_EQ((std::vector<int>{6000}), frametest::loggedLevels("Exception="));
+
+    ASSERT_EQ(2u, run.nodes.size());
+    EXPECT_EQ(0u, run.nodes[0]->getIndex());
+    EXPECT_TRUE(hasString(run.nodes[0], 108, "CUT"));
+    EXPECT_TRUE(lacksProperty(run.nodes[0], 270));
+    EXPECT_EQ(4u, run.nodes[1]->getNodeId());
+    EXPECT_EQ(1u, run.nodes[1]->getIndex());
+    EXPECT_TRUE(hasString(run.nodes[1], 108, "WHOLE"));
+    EXPECT_TRUE(hasEnum(run.nodes[1], 128, 4, 22));
+    EXPECT_TRUE(hasUnsigned(run.nodes[1], 270, 5));
+    std::vector<std::string> const texts = slotLog();
+    ASSERT_FALSE(texts.empty());
+    EXPECT_EQ("makeSlotNodes exit", texts.back());
+}
+
+TEST(SlotMap, HoldsExactlyTheFortyTwoListedPairs) {
+    std::map<unsigned int, unsigned int> const expected(EXPECTED_SLOT_MAP.begin(),
+                                                        EXPECTED_SLOT_MAP.end());
+    ASSERT_EQ(42u, expected.size());
+    EXPECT_EQ(42u, IC::SMBIOS_MI_SLOT::slotMap.size());
+    EXPECT_EQ(expected, IC::SMBIOS_MI_SLOT::slotMap);
+}
+
+TEST(SlotMap, GetCIMSlotTypeGivesTheMappedValueOfEveryListedType) {
+    for (auto const& pair : EXPECTED_SLOT_MAP) {
+        EXPECT_EQ(pair.second, IC::SmBiosMI::getCIMSlotType(pair.first))
+            << "SMBIOS slot type " << pair.first;
+    }
+}
+
+TEST(SlotMap, GetCIMSlotTypeGivesOneForEveryUnlistedType) {
+    std::map<unsigned int, unsigned int> const expected(EXPECTED_SLOT_MAP.begin(),
+                                                        EXPECTED_SLOT_MAP.end());
+    unsigned int unlisted = 0;
+    for (unsigned int smbiosType = 0; smbiosType < 0x200; ++smbiosType) {
+        if (expected.count(smbiosType) == 0) {
+            ++unlisted;
+            EXPECT_EQ(1u, IC::SmBiosMI::getCIMSlotType(smbiosType))
+                << "SMBIOS slot type " << smbiosType;
+        }
+    }
+    EXPECT_EQ(0x200u - 42u, unlisted);
+    EXPECT_EQ(1u, IC::SmBiosMI::getCIMSlotType(0xFFFFFFFFu));
+}
