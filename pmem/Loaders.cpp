@@ -1,0 +1,252 @@
+#include "Loaders.h"
+
+#include <fcntl.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cerrno>
+#include <climits>
+#include <cstdint>
+#include <cstring>
+#include <utility>
+
+#include "DumpFormat.h"
+
+namespace pmem {
+
+namespace {
+
+// Image files and the kernel's tables are small; anything larger is refused
+// rather than read into memory.
+constexpr size_t kImageFileLimit = 64 * 1024 * 1024;
+constexpr size_t kEntryPointFileLimit = 4096;
+constexpr size_t kTableFileLimit = 16 * 1024 * 1024;
+// The bytes from 0xF0000 on that belong to the presented entry point: the
+// plug-in reads 64 bytes at the anchor, so a table is never served there.
+constexpr size_t kEntryPointZone = 0x40;
+
+bool parseBase(std::string const& text, unsigned long& value) {
+    size_t pos = 0;
+    if (text.size() >= 2 && text[0] == '0' && (text[1] == 'x' || text[1] == 'X')) {
+        pos = 2;
+    }
+    if (pos == text.size()) {
+        return false;
+    }
+    unsigned long result = 0;
+    for (; pos < text.size(); ++pos) {
+        char const c = text[pos];
+        unsigned long digit = 0;
+        if (c >= '0' && c <= '9') {
+            digit = static_cast<unsigned long>(c - '0');
+        } else if (c >= 'a' && c <= 'f') {
+            digit = static_cast<unsigned long>(c - 'a' + 10);
+        } else if (c >= 'A' && c <= 'F') {
+            digit = static_cast<unsigned long>(c - 'A' + 10);
+        } else {
+            return false;
+        }
+        if (result > (ULONG_MAX >> 4)) {
+            return false;
+        }
+        result = (result << 4) | digit;
+    }
+    value = result;
+    return true;
+}
+
+bool startsWith(std::vector<unsigned char> const& bytes, char const* anchor) {
+    size_t const n = std::strlen(anchor);
+    return bytes.size() >= n && std::memcmp(bytes.data(), anchor, n) == 0;
+}
+
+uint32_t dword(std::vector<unsigned char> const& bytes, size_t at) {
+    uint32_t value = 0;
+    for (size_t i = 0; i < 4; ++i) {
+        value |= static_cast<uint32_t>(bytes[at + i]) << (8 * i);
+    }
+    return value;
+}
+
+uint64_t qword(std::vector<unsigned char> const& bytes, size_t at) {
+    return static_cast<uint64_t>(dword(bytes, at)) |
+           (static_cast<uint64_t>(dword(bytes, at + 4)) << 32);
+}
+
+void putDword(std::vector<unsigned char>& bytes, size_t at, uint32_t value) {
+    for (size_t i = 0; i < 4; ++i) {
+        bytes[at + i] = static_cast<unsigned char>((value >> (8 * i)) & 0xFF);
+    }
+}
+
+// Sets bytes[at] so that the 8-bit sum of bytes[begin, end) is zero; `at`
+// lies in that range and the range is cut at the end of the bytes (what the
+// entry point lacks is presented as zero, which adds nothing).
+void setChecksum(std::vector<unsigned char>& bytes, size_t at, size_t begin, size_t end) {
+    end = std::min(end, bytes.size());
+    bytes[at] = 0;
+    unsigned char sum = 0;
+    for (size_t i = begin; i < end; ++i) {
+        sum = static_cast<unsigned char>(sum + bytes[i]);
+    }
+    bytes[at] = static_cast<unsigned char>(0x100 - sum);
+}
+
+// Whether a table of `size` bytes (size >= 1) can be served at `address`:
+// its last byte at or below `limit` and none of it on the entry point.
+bool canServeAt(uint64_t address, size_t size, uint64_t limit, size_t entryPointSize) {
+    uint64_t const span = static_cast<uint64_t>(size) - 1;
+    if (address > limit || span > limit - address) {
+        return false;
+    }
+    uint64_t const last = address + span;
+    uint64_t const zoneLast = kBiosAreaFirst + std::max(kEntryPointZone, entryPointSize) - 1;
+    return last < kBiosAreaFirst || address > zoneLast;
+}
+
+// Places the area 0xF0000-0xFFFFF, zero but for the entry point at its
+// start, and the table at `address` (which canServeAt accepted). When the
+// table shares addresses with the area the two are placed as one run, the
+// table's bytes over the area's zeros.
+bool placeEntryPointAndTable(RegionMemory& memory, std::vector<unsigned char> const& entryPoint,
+                             unsigned long address, std::vector<unsigned char> table) {
+    std::vector<unsigned char> area(kBiosAreaSize, 0);
+    std::copy(entryPoint.begin(), entryPoint.end(), area.begin());
+    unsigned long const areaLast = kBiosAreaFirst + (kBiosAreaSize - 1);
+    unsigned long const tableLast = address + static_cast<unsigned long>(table.size() - 1);
+    if (tableLast < kBiosAreaFirst || address > areaLast) {
+        return memory.place(kBiosAreaFirst, std::move(area)) &&
+               memory.place(address, std::move(table));
+    }
+    unsigned long const first = std::min(address, kBiosAreaFirst);
+    unsigned long const last = std::max(tableLast, areaLast);
+    std::vector<unsigned char> bytes(last - first + 1, 0);
+    std::copy(area.begin(), area.end(), bytes.begin() + (kBiosAreaFirst - first));
+    std::copy(table.begin(), table.end(), bytes.begin() + (address - first));
+    return memory.place(first, std::move(bytes));
+}
+
+}  // namespace
+
+bool readWholeFile(std::string const& path, size_t limit, std::vector<unsigned char>& bytes) {
+    int const fd = ::open(path.c_str(), O_RDONLY | O_CLOEXEC);
+    if (fd < 0) {
+        return false;
+    }
+    bytes.clear();
+    std::vector<unsigned char> chunk(64 * 1024);
+    bool ok = true;
+    for (;;) {
+        ssize_t const r = ::read(fd, chunk.data(), chunk.size());
+        if (r < 0) {
+            if (errno == EINTR) {
+                continue;
+            }
+            ok = false;
+            break;
+        }
+        if (r == 0) {
+            break;
+        }
+        size_t const n = static_cast<size_t>(r);
+        if (n > limit - bytes.size()) {
+            ok = false;
+            break;
+        }
+        bytes.insert(bytes.end(), chunk.begin(), chunk.begin() + static_cast<std::ptrdiff_t>(n));
+    }
+    ::close(fd);
+    return ok;
+}
+
+bool loadImage(std::string const& list, RegionMemory& memory) {
+    size_t begin = 0;
+    for (;;) {
+        size_t const comma = list.find(',', begin);
+        std::string const item =
+            list.substr(begin, comma == std::string::npos ? std::string::npos : comma - begin);
+        // The last '@': a file name may hold one, a base never does.
+        size_t const at = item.rfind('@');
+        if (at == std::string::npos || at == 0) {
+            return false;
+        }
+        unsigned long base = 0;
+        if (!parseBase(item.substr(at + 1), base)) {
+            return false;
+        }
+        std::vector<unsigned char> bytes;
+        if (!readWholeFile(item.substr(0, at), kImageFileLimit, bytes)) {
+            return false;
+        }
+        if (!memory.place(base, std::move(bytes))) {
+            return false;
+        }
+        if (comma == std::string::npos) {
+            return true;
+        }
+        begin = comma + 1;
+    }
+}
+
+bool loadSysfsTables(std::string const& folder, RegionMemory& memory) {
+    std::vector<unsigned char> entryPoint;
+    std::vector<unsigned char> table;
+    if (!readWholeFile(folder + "/smbios_entry_point", kEntryPointFileLimit, entryPoint) ||
+        !readWholeFile(folder + "/DMI", kTableFileLimit, table) || table.empty()) {
+        return false;
+    }
+    uint64_t const below4GiB = 0xFFFFFFFFu;
+    uint64_t const lastAddress = ULONG_MAX;
+    unsigned long address = kMovedTableAddress;
+    std::vector<unsigned char> presented;
+    if (startsWith(entryPoint, "_SM3_")) {
+        // 0x06 length, 0x07 major, 0x08 minor, 0x0C maximum table size,
+        // 0x10 the 64-bit table address.
+        if (entryPoint.size() < smbiosdump::SM3_ENTRY_POINT_SIZE ||
+            entryPoint[6] < smbiosdump::SM3_ENTRY_POINT_SIZE || table.size() > 0xFFFF) {
+            return false;
+        }
+        uint64_t const stated = qword(entryPoint, 0x10);
+        if (canServeAt(stated, table.size(), std::min(below4GiB, lastAddress),
+                       smbiosdump::SM_ENTRY_POINT_SIZE)) {
+            address = static_cast<unsigned long>(stated);
+        }
+        smbiosdump::TableStats const stats = smbiosdump::tableStats(table);
+        presented = smbiosdump::makeSmEntryPoint(
+            entryPoint[7], entryPoint[8], static_cast<uint16_t>(table.size()),
+            static_cast<uint32_t>(address), stats.count, stats.maxSize);
+    } else if (startsWith(entryPoint, "_SM_")) {
+        // 0x05 length, 0x15 intermediate checksum over 0x10-0x1E, 0x18 the
+        // 32-bit table address. The kernel copies 30 to 32 bytes.
+        if (entryPoint.size() < 0x1E) {
+            return false;
+        }
+        presented = entryPoint;
+        uint32_t const stated = dword(presented, 0x18);
+        if (canServeAt(stated, table.size(), lastAddress, presented.size())) {
+            address = static_cast<unsigned long>(stated);
+        } else {
+            putDword(presented, 0x18, static_cast<uint32_t>(address));
+            setChecksum(presented, 0x15, 0x10, 0x1F);
+            setChecksum(presented, 0x04, 0, presented[5]);
+        }
+    } else if (startsWith(entryPoint, "_DMI_")) {
+        // 15 bytes: 0x05 checksum, 0x08 the 32-bit table address.
+        if (entryPoint.size() < smbiosdump::DMI_ENTRY_POINT_SIZE) {
+            return false;
+        }
+        presented = entryPoint;
+        uint32_t const stated = dword(presented, 0x08);
+        if (canServeAt(stated, table.size(), lastAddress, presented.size())) {
+            address = static_cast<unsigned long>(stated);
+        } else {
+            putDword(presented, 0x08, static_cast<uint32_t>(address));
+            setChecksum(presented, 0x05, 0, smbiosdump::DMI_ENTRY_POINT_SIZE);
+        }
+    } else {
+        return false;
+    }
+    return placeEntryPointAndTable(memory, presented, address, std::move(table));
+}
+
+}  // namespace pmem

@@ -1,0 +1,44 @@
+// Fills an in-process memory from files: the image source (files placed at
+// the addresses PMEM_IMAGE names) and the sysfs source (the kernel's
+// copy of the SMBIOS entry point and structure table).
+#pragma once
+
+#include <cstddef>
+#include <string>
+#include <vector>
+
+#include "RegionMemory.h"
+
+namespace pmem {
+
+// Where the sysfs source presents the entry point: the start of the area
+// 0xF0000-0xFFFFF that readers search, which it presents whole (zero but
+// for the entry point), as firmware does.
+constexpr unsigned long kBiosAreaFirst = 0xF0000;
+constexpr unsigned long kBiosAreaSize = 0x10000;
+// Where it serves a table that cannot stay at the address its entry point
+// names: right above the first megabyte.
+constexpr unsigned long kMovedTableAddress = 0x100000;
+
+// The whole file, when it can be read and holds at most `limit` bytes.
+bool readWholeFile(std::string const& path, size_t limit, std::vector<unsigned char>& bytes);
+
+// Places the files of "FILE@BASE[,FILE@BASE...]" (BASE hexadecimal, with or
+// without 0x). False when an item lacks its '@', file or base, a base is not
+// hexadecimal or does not fit an address, a file cannot be read, or two
+// files would overlap.
+bool loadImage(std::string const& list, RegionMemory& memory);
+
+// Presents `folder`/smbios_entry_point at 0xF0000 and `folder`/DMI at the
+// address the presented entry point names. A 2.x "_SM_" or a legacy "_DMI_"
+// entry point is presented as it is; when its table would overlap it (or
+// not fit below the last address) the table is served at 0x100000 instead
+// and the entry point's address and checksums are made to say so. A 3.x
+// "_SM3_" entry point is presented as the equivalent "_SM_" one (same
+// version, both checksums correct), its table at its own address when that
+// lies below 4 GiB, else at 0x100000. False when a file is missing or
+// empty, the entry point is unknown or short, or a 3.x table is longer than
+// a 2.x entry point can state (65535 bytes).
+bool loadSysfsTables(std::string const& folder, RegionMemory& memory);
+
+}  // namespace pmem

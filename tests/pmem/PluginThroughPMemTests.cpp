@@ -1,0 +1,227 @@
+// The plug-in's acquisition (SD::SmBios) reading physical memory through the
+// built libpmem.so, found in the code directory (SMBIOS_OUT_DIR) as on an
+// installed system: through an image, through a fake sysfs folder, with no
+// source at all, and for every dump of the corpus of real machines.
+#include <sys/stat.h>
+
+#include <algorithm>
+#include <fstream>
+#include <regex>
+
+#include "PMemTestSupport.h"
+#include "smbios/SmBios.h"
+
+using pmemtest::imageItem;
+using pmemtest::kAnchor;
+using pmemtest::kBiosArea;
+using pmemtest::kTableAddress;
+
+namespace {
+
+class PluginThroughPMem : public pmemtest::PMemTest {
+protected:
+    void SetUp() override {
+        ASSERT_EQ(SD::SMBIOS_CLASS::_smbios, nullptr)
+            << "the SMBIOS table is acquired once per process: run each test in a process of "
+               "its own (ctest does)";
+        ASSERT_FALSE(pmemtest::outDir().empty()) << "SMBIOS_OUT_DIR is not set";
+    }
+
+    smbiostest::TempDir dataDir_;
+    smbiostest::ScopedEnv data_{"KESTREL_DATA_DIR", dataDir_.path() + "/"};
+    smbiostest::ScopedEnv code_{"KESTREL_CODE_DIR", pmemtest::outDir() + "/"};
+};
+
+std::vector<unsigned int> handlesOf(SD::SmBios const& smbios) {
+    std::vector<unsigned int> handles;
+    for (SD::SmBios::Table const& table : smbios.getTables()) {
+        handles.push_back(table.getHandle());
+    }
+    return handles;
+}
+
+}  // namespace
+
+TEST_F(PluginThroughPMem, ReadsTheTableThroughAnImage) {
+    std::vector<uint8_t> const table = pmemtest::sampleTable();
+    std::vector<uint8_t> const ep = pmemtest::smEntryPoint(table, 2, 7, kTableAddress);
+    env("PMEM_IMAGE", imageItem(file("bios.bin", pmemtest::biosArea(ep, kAnchor)), kBiosArea) +
+                          "," + imageItem(file("table.bin", table), kTableAddress));
+    smbiostest::LogCapture log;
+    SD::SmBios smbios;
+    EXPECT_EQ(smbios.getMajorVersion(), 2);
+    EXPECT_EQ(smbios.getMinorVersion(), 7);
+    EXPECT_EQ(handlesOf(smbios),
+              (std::vector<unsigned int>{0x0000, 0x0100, 0x0200, 0x0400, 0x0500}));
+    EXPECT_TRUE(log.contains("Constructor found _SM_ header at " + std::to_string(kAnchor)))
+        << log.dump();
+    EXPECT_TRUE(log.contains("Constructor success")) << log.dump();
+}
+
+TEST_F(PluginThroughPMem, FindsTheLegacyPartOfAnEntryPointBelowTheBiosArea) {
+    std::vector<uint8_t> const table = pmemtest::sampleTable();
+    std::vector<uint8_t> ep = pmemtest::smEntryPoint(table, 2, 7, kTableAddress);
+    // A BCD revision that differs from the "_SM_" version shows which part
+    // was used.
+    ep[0x1E] = 0x26;
+    pmemtest::setChecksum(ep, 0x15, 0x10, 0x1F);
+    pmemtest::setChecksum(ep, 0x04, 0, 0x1F);
+    env("PMEM_IMAGE", imageItem(file("ep.bin", ep), 0xE0000) + "," +
+                          imageItem(file("table.bin", table), kTableAddress));
+    smbiostest::LogCapture log;
+    SD::SmBios smbios;
+    EXPECT_EQ(smbios.getMajorVersion(), 2);
+    EXPECT_EQ(smbios.getMinorVersion(), 6);
+    EXPECT_EQ(smbios.getTables().size(), 5u);
+    EXPECT_TRUE(log.contains("Constructo found _DMI_ header at ")) << log.dump();
+}
+
+TEST_F(PluginThroughPMem, ReadsA3xTableThroughAFakeSysfsFolder) {
+    std::vector<uint8_t> const table = pmemtest::sampleTable();
+    std::vector<uint8_t> const ep = pmemtest::sm3EntryPoint(3, 3, 0, 0x10000, 0x8F0000000ull);
+    env("PMEM_SYSFS_DIR", sysfsFolder(&ep, &table));
+    smbiostest::LogCapture log;
+    SD::SmBios smbios;
+    EXPECT_EQ(smbios.getMajorVersion(), 3);
+    EXPECT_EQ(smbios.getMinorVersion(), 3);
+    EXPECT_EQ(handlesOf(smbios),
+              (std::vector<unsigned int>{0x0000, 0x0100, 0x0200, 0x0400, 0x0500}));
+    EXPECT_TRUE(log.contains("Constructor found _SM_ header at " + std::to_string(kBiosArea)))
+        << log.dump();
+}
+
+TEST_F(PluginThroughPMem, WithoutAnySourceGetsAnEmptyTable) {
+    env("PMEM_SOURCE", "sysfs");
+    smbiostest::LogCapture log;
+    SD::SmBios smbios;
+    EXPECT_TRUE(smbios.getTables().empty());
+    EXPECT_EQ(smbios.getMajorVersion(), 0);
+    EXPECT_TRUE(log.contains("Constructor Exception=PMEM: library '" + pmemtest::outDir() +
+                             "/libpmem.so' did not initialize."))
+        << log.dump();
+}
+
+namespace {
+
+// The version dmidecode printed for a dump: "SMBIOS 3.1.1 present." gives 3.1.
+std::pair<unsigned int, unsigned int> dmidecodeVersion(std::string const& name) {
+    std::ifstream in(smbiostest::corpusDir() + "/" + name + ".orig.txt");
+    std::regex const present(R"(^SMBIOS (\d+)\.(\d+)(\.\d+)? present\.)");
+    std::string line;
+    while (std::getline(in, line)) {
+        std::smatch m;
+        if (std::regex_search(line, m, present)) {
+            return {static_cast<unsigned int>(std::stoul(m[1])),
+                    static_cast<unsigned int>(std::stoul(m[2]))};
+        }
+    }
+    ADD_FAILURE() << "no version line in " << name << ".orig.txt";
+    return {0, 0};
+}
+
+// The acquisition from an override file made of a dump (the entry point
+// and table smbios_dumpformat reads from it), in a child process.
+pmemtest::Acquired throughOverrideFile(std::vector<uint8_t> const& bin, std::string const& name,
+                                       smbiostest::TempDir const& work) {
+    smbiosdump::DumpImage image;
+    std::string error;
+    EXPECT_TRUE(smbiosdump::readDumpBin(bin, image, error)) << name << ": " << error;
+    std::string const dataDir = work.file("data-" + name);
+    smbiostest::writeOverrideDir(dataDir, image.header, image.table);
+    // A code folder without libpmem.so: only the override file can serve.
+    return pmemtest::acquireInChild({{"KESTREL_DATA_DIR", dataDir + "/"},
+                                     {"KESTREL_CODE_DIR", work.file("no-code-here") + "/"}});
+}
+
+#define REQUIRE_CORPUS()                                                            \
+    do {                                                                            \
+        if (smbiostest::corpusDir().empty()) {                                      \
+            GTEST_SKIP() << "no SMBIOS corpus folder (SMBIOS_CORPUS_DIR); no real " \
+                            "machine's dump to serve";                              \
+        }                                                                           \
+    } while (0)
+
+}  // namespace
+
+// A 2.x dump served as an image at 0: dmidecode's --dump-bin layout puts the
+// "_SM_" entry point at 0 and the table at 0x20. The plug-in's "_SM_" search
+// (0xF0000-0xFFFFF) misses it, and the legacy search from 0 finds its
+// "_DMI_" part at 0x10. The structures are the same as from the dump's
+// override file; the version is the one the legacy part states in its BCD
+// byte (0x1E of the dump), which for some machines differs from the "_SM_"
+// version (a BCD byte of 0 gives 0.0).
+TEST(PluginThroughPMemCorpus, Sm2DumpsServedAsAnImageAtZeroGiveTheOverrideFilesStructures) {
+    REQUIRE_CORPUS();
+    smbiostest::TempDir work;
+    smbiostest::TempDir noOverride;
+    size_t served = 0;
+    for (std::string const& name : smbiostest::corpusNames()) {
+        std::vector<uint8_t> const bin =
+            smbiostest::fileBytes(smbiostest::corpusDir() + "/" + name + ".bin");
+        if (bin.size() < 0x20 || std::string(bin.begin(), bin.begin() + 4) != "_SM_") {
+            continue;
+        }
+        ++served;
+        pmemtest::Acquired const expected = throughOverrideFile(bin, name, work);
+        ASSERT_EQ(expected.failure, "") << name;
+        pmemtest::Acquired const got = pmemtest::acquireInChild(
+            {{"KESTREL_DATA_DIR", noOverride.path() + "/"},
+             {"KESTREL_CODE_DIR", pmemtest::outDir() + "/"},
+             {"PMEM_SOURCE", "image"},
+             {"PMEM_IMAGE", smbiostest::corpusDir() + "/" + name + ".bin@0"}});
+        ASSERT_EQ(got.failure, "") << name;
+        EXPECT_FALSE(got.structures.empty()) << name;
+        EXPECT_EQ(got.structures, expected.structures) << name;
+        EXPECT_EQ(expected.major, bin[6]) << name;
+        EXPECT_EQ(expected.minor, bin[7]) << name;
+        EXPECT_EQ(got.major, static_cast<unsigned int>(bin[0x1E] >> 4)) << name;
+        EXPECT_EQ(got.minor, static_cast<unsigned int>(bin[0x1E] & 0x0F)) << name;
+        EXPECT_EQ(got.revision, 0u) << name;
+    }
+    EXPECT_GT(served, 0u) << "the corpus holds no 2.x dump";
+}
+
+// A 3.x dump served through a fake sysfs folder: its first 0x18 bytes are
+// the "_SM3_" entry point (its table address set to 0x7F6E0000 here, the
+// checksum kept right), the table is what follows 0x20 up to the entry
+// point's maximum size. The plug-in sees the equivalent "_SM_" entry point
+// and gets the dump's structures and the version dmidecode printed.
+TEST(PluginThroughPMemCorpus, Sm3DumpsServedThroughSysfsGiveTheirStructuresAndVersion) {
+    REQUIRE_CORPUS();
+    smbiostest::TempDir work;
+    smbiostest::TempDir noOverride;
+    size_t served = 0;
+    for (std::string const& name : smbiostest::corpusNames()) {
+        std::vector<uint8_t> const bin =
+            smbiostest::fileBytes(smbiostest::corpusDir() + "/" + name + ".bin");
+        if (bin.size() < 0x20 || std::string(bin.begin(), bin.begin() + 5) != "_SM3_") {
+            continue;
+        }
+        ++served;
+        std::vector<uint8_t> ep = pmemtest::slice(bin, 0, 0x18);
+        pmemtest::putQword(ep, 0x10, kTableAddress);
+        pmemtest::setChecksum(ep, 5, 0, 0x18);
+        size_t const tableSize = std::min<size_t>(pmemtest::dword(bin, 0x0C), bin.size() - 0x20);
+        std::vector<uint8_t> const table = pmemtest::slice(bin, 0x20, 0x20 + tableSize);
+        std::string const folder = work.file("sysfs-" + name);
+        ASSERT_EQ(::mkdir(folder.c_str(), 0755), 0) << folder;
+        smbiostest::writeFile(folder + "/smbios_entry_point", ep);
+        smbiostest::writeFile(folder + "/DMI", table);
+
+        pmemtest::Acquired const expected = throughOverrideFile(bin, name, work);
+        ASSERT_EQ(expected.failure, "") << name;
+        pmemtest::Acquired const got =
+            pmemtest::acquireInChild({{"KESTREL_DATA_DIR", noOverride.path() + "/"},
+                                      {"KESTREL_CODE_DIR", pmemtest::outDir() + "/"},
+                                      {"PMEM_SOURCE", "sysfs"},
+                                      {"PMEM_SYSFS_DIR", folder}});
+        ASSERT_EQ(got.failure, "") << name;
+        EXPECT_FALSE(got.structures.empty()) << name;
+        EXPECT_EQ(got.structures, expected.structures) << name;
+        std::pair<unsigned int, unsigned int> const version = dmidecodeVersion(name);
+        EXPECT_EQ(got.major, version.first) << name;
+        EXPECT_EQ(got.minor, version.second) << name;
+        EXPECT_EQ(got.revision, 0u) << name;
+    }
+    EXPECT_GT(served, 0u) << "the corpus holds no 3.x dump";
+}

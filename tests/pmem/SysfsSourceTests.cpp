@@ -1,0 +1,294 @@
+// The sysfs source: the kernel's copy of the SMBIOS entry point and table
+// (smbios_entry_point and DMI in PMEM_SYSFS_DIR), presented as firmware
+// would: the entry point at 0xF0000, the table at the address it names, a
+// 3.x entry point as the equivalent 2.x "_SM_" one.
+#include <climits>
+#include <cstring>
+
+#include "PMemTestSupport.h"
+
+using pmemtest::byteSum;
+using pmemtest::dword;
+using pmemtest::kBiosArea;
+using pmemtest::kTableAddress;
+using pmemtest::PMemLibrary;
+using pmemtest::slice;
+using pmemtest::word;
+
+namespace {
+
+class SysfsSource : public pmemtest::PMemTest {
+protected:
+    void serve(std::vector<uint8_t> const& entryPoint, std::vector<uint8_t> const& table) {
+        env("PMEM_SYSFS_DIR", sysfsFolder(&entryPoint, &table));
+    }
+    // The presented entry point: the 64 bytes read where "_SM_" is found.
+    std::vector<uint8_t> presentedSm(PMemLibrary& pm) {
+        unsigned long const at = pm.search("_SM_", 0xF0000, 0xFFFFF, 16);
+        EXPECT_EQ(at, kBiosArea);
+        int status = -2;
+        std::vector<uint8_t> bytes = pm.bytes(at, 64, status);
+        EXPECT_EQ(status, 0);
+        return bytes;
+    }
+    std::vector<uint8_t> tableAt(PMemLibrary& pm, unsigned long address, size_t size) {
+        int status = -2;
+        std::vector<uint8_t> bytes = pm.bytes(address, size, status);
+        EXPECT_EQ(status, 0) << "no table of " << size << " bytes at " << pmemtest::hex(address);
+        return bytes;
+    }
+    // A "_SM_" entry point presented for a 3.x one: anchor, length, version,
+    // intermediate anchor and both checksums.
+    static void expectEquivalentSm(std::vector<uint8_t> const& ep, uint8_t major, uint8_t minor,
+                                   size_t tableSize) {
+        EXPECT_EQ(std::string(ep.begin(), ep.begin() + 4), "_SM_");
+        EXPECT_EQ(ep[5], 0x1F);
+        EXPECT_EQ(ep[6], major);
+        EXPECT_EQ(ep[7], minor);
+        EXPECT_EQ(byteSum(ep, 0, 0x1F), 0) << "entry-point checksum";
+        EXPECT_EQ(std::string(ep.begin() + 0x10, ep.begin() + 0x15), "_DMI_");
+        EXPECT_EQ(byteSum(ep, 0x10, 0x1F), 0) << "intermediate checksum";
+        EXPECT_EQ(word(ep, 0x16), tableSize);
+    }
+    // A table of exactly `size` bytes: the sample table, then a structure
+    // of type 126 (inactive) whose strings fill the rest.
+    static std::vector<uint8_t> tableOfSize(size_t size) {
+        std::vector<uint8_t> table = pmemtest::sampleTable();
+        size_t const filler = size - table.size();
+        std::vector<uint8_t> inactive = {126, 4, 0xFE, 0xFF};
+        inactive.resize(filler, 'x');
+        inactive[filler - 1] = 0;
+        inactive[filler - 2] = 0;
+        table.insert(table.end(), inactive.begin(), inactive.end());
+        return table;
+    }
+};
+
+}  // namespace
+
+TEST_F(SysfsSource, SmEntryPointIsPresentedAsItIsAtF0000AndItsTableAtItsAddress) {
+    std::vector<uint8_t> const table = pmemtest::sampleTable();
+    std::vector<uint8_t> const ep = pmemtest::smEntryPoint(table, 2, 8, kTableAddress);
+    serve(ep, table);
+    PMemLibrary& pm = load();
+    ASSERT_NE(pm.isInitialized(), 0);
+    ASSERT_NE(pm.open(), 0);
+    std::vector<uint8_t> const presented = presentedSm(pm);
+    EXPECT_EQ(slice(presented, 0, ep.size()), ep);
+    EXPECT_EQ(slice(presented, ep.size(), 64), std::vector<uint8_t>(64 - ep.size(), 0));
+    EXPECT_EQ(tableAt(pm, kTableAddress, table.size()), table);
+    EXPECT_EQ(pm.search("_DMI_", 0, 0xFFFFF, 16), kBiosArea + 0x10);
+    EXPECT_NE(pm.close(), 0);
+}
+
+TEST_F(SysfsSource, SmTableOnTheEntryPointIsMovedAndTheEntryPointSaysWhere) {
+    std::vector<uint8_t> const table = pmemtest::sampleTable();
+    std::vector<uint8_t> const ep = pmemtest::smEntryPoint(table, 2, 7, 0xF0010);
+    serve(ep, table);
+    PMemLibrary& pm = load();
+    ASSERT_NE(pm.isInitialized(), 0);
+    std::vector<uint8_t> const presented = presentedSm(pm);
+    unsigned long const address = dword(presented, 0x18);
+    EXPECT_EQ(address, 0x100000ul);
+    EXPECT_EQ(tableAt(pm, address, table.size()), table);
+    EXPECT_EQ(byteSum(presented, 0, 0x1F), 0);
+    EXPECT_EQ(byteSum(presented, 0x10, 0x1F), 0);
+    // Only the address and the two checksums changed.
+    for (size_t i = 0; i < ep.size(); ++i) {
+        if (i != 0x04 && i != 0x15 && (i < 0x18 || i > 0x1B)) {
+            EXPECT_EQ(presented[i], ep[i]) << "byte " << i;
+        }
+    }
+}
+
+TEST_F(SysfsSource, SmTableInsideTheBiosAreaBesideTheEntryPointStaysWhereItIs) {
+    std::vector<uint8_t> const table = pmemtest::sampleTable();
+    std::vector<uint8_t> const ep = pmemtest::smEntryPoint(table, 2, 4, 0xF1000);
+    serve(ep, table);
+    PMemLibrary& pm = load();
+    ASSERT_NE(pm.isInitialized(), 0);
+    EXPECT_EQ(slice(presentedSm(pm), 0, ep.size()), ep);
+    EXPECT_EQ(tableAt(pm, 0xF1000, table.size()), table);
+}
+
+TEST_F(SysfsSource, SmTableRunningOutOfTheBiosAreaIsServedWholeWithIt) {
+    std::vector<uint8_t> const table = tableOfSize(0x200);
+    std::vector<uint8_t> const ep = pmemtest::smEntryPoint(table, 2, 6, 0xFFF00);
+    serve(ep, table);
+    PMemLibrary& pm = load();
+    ASSERT_NE(pm.isInitialized(), 0);
+    EXPECT_EQ(slice(presentedSm(pm), 0, ep.size()), ep);
+    EXPECT_EQ(tableAt(pm, 0xFFF00, table.size()), table);
+    unsigned char byte = 0;
+    EXPECT_NE(pm.read(&byte, 0xFFF00 + 0x200, 1), 0);
+}
+
+TEST_F(SysfsSource, Sm3EntryPointIsPresentedAsTheEquivalentSmEntryPoint) {
+    std::vector<uint8_t> const table = pmemtest::sampleTable();
+    smbiosdump::TableStats const stats = smbiosdump::tableStats(table);
+    std::vector<uint8_t> const ep3 = pmemtest::sm3EntryPoint(3, 2, 1, 0x10000, kTableAddress);
+    serve(ep3, table);
+    PMemLibrary& pm = load();
+    ASSERT_NE(pm.isInitialized(), 0);
+    ASSERT_NE(pm.open(), 0);
+    EXPECT_EQ(pm.search("_SM3_", 0xF0000, 0xFFFFF, 16), 0ul);
+    std::vector<uint8_t> const ep = presentedSm(pm);
+    expectEquivalentSm(ep, 3, 2, table.size());
+    EXPECT_EQ(dword(ep, 0x18), kTableAddress);
+    EXPECT_EQ(word(ep, 0x1C), stats.count);
+    EXPECT_EQ(word(ep, 0x08), stats.maxSize);
+    EXPECT_EQ(ep[0x1E], 0x32) << "BCD revision";
+    EXPECT_EQ(tableAt(pm, kTableAddress, table.size()), table);
+    EXPECT_NE(pm.close(), 0);
+}
+
+TEST_F(SysfsSource, Sm3TableAbove4GiBIsServedAt1MiB) {
+    std::vector<uint8_t> const table = pmemtest::sampleTable();
+    serve(pmemtest::sm3EntryPoint(3, 4, 0, 0x10000, 0x1234560000ull), table);
+    PMemLibrary& pm = load();
+    ASSERT_NE(pm.isInitialized(), 0);
+    std::vector<uint8_t> const ep = presentedSm(pm);
+    expectEquivalentSm(ep, 3, 4, table.size());
+    EXPECT_EQ(dword(ep, 0x18), 0x100000u);
+    EXPECT_EQ(tableAt(pm, 0x100000, table.size()), table);
+}
+
+TEST_F(SysfsSource, Sm3TableEndingAbove4GiBIsServedAt1MiB) {
+    std::vector<uint8_t> const table = pmemtest::sampleTable();
+    serve(pmemtest::sm3EntryPoint(3, 0, 0, 0x10000, 0xFFFFFFF0ull), table);
+    PMemLibrary& pm = load();
+    ASSERT_NE(pm.isInitialized(), 0);
+    std::vector<uint8_t> const ep = presentedSm(pm);
+    EXPECT_EQ(dword(ep, 0x18), 0x100000u);
+    EXPECT_EQ(tableAt(pm, 0x100000, table.size()), table);
+}
+
+TEST_F(SysfsSource, Sm3TableOnTheEntryPointIsServedAt1MiB) {
+    std::vector<uint8_t> const table = pmemtest::sampleTable();
+    serve(pmemtest::sm3EntryPoint(3, 1, 1, 0x10000, 0xF0000), table);
+    PMemLibrary& pm = load();
+    ASSERT_NE(pm.isInitialized(), 0);
+    std::vector<uint8_t> const ep = presentedSm(pm);
+    expectEquivalentSm(ep, 3, 1, table.size());
+    EXPECT_EQ(dword(ep, 0x18), 0x100000u);
+    EXPECT_EQ(tableAt(pm, 0x100000, table.size()), table);
+}
+
+TEST_F(SysfsSource, Sm3TableOf65535BytesIsServed) {
+    std::vector<uint8_t> const table = tableOfSize(0xFFFF);
+    serve(pmemtest::sm3EntryPoint(3, 3, 0, 0x20000, kTableAddress), table);
+    PMemLibrary& pm = load();
+    ASSERT_NE(pm.isInitialized(), 0);
+    std::vector<uint8_t> const ep = presentedSm(pm);
+    expectEquivalentSm(ep, 3, 3, 0xFFFF);
+    EXPECT_EQ(tableAt(pm, kTableAddress, table.size()), table);
+}
+
+TEST_F(SysfsSource, Sm3TableLongerThan65535BytesMakesTheSourceUnusable) {
+    serve(pmemtest::sm3EntryPoint(3, 3, 0, 0x20000, kTableAddress), tableOfSize(0x10000));
+    env("PMEM_SOURCE", "sysfs");
+    PMemLibrary& pm = load();
+    EXPECT_EQ(pm.isInitialized(), 0);
+    EXPECT_EQ(pm.search("_SM_", 0xF0000, 0xFFFFF, 16), 0ul);
+}
+
+TEST_F(SysfsSource, LegacyDmiEntryPointIsPresentedAsItIs) {
+    std::vector<uint8_t> const table = pmemtest::sampleTable();
+    std::vector<uint8_t> const ep =
+        smbiosdump::makeDmiEntryPoint(0x21, static_cast<uint16_t>(table.size()), kTableAddress, 5);
+    serve(ep, table);
+    PMemLibrary& pm = load();
+    ASSERT_NE(pm.isInitialized(), 0);
+    EXPECT_EQ(pm.search("_SM_", 0xF0000, 0xFFFFF, 16), 0ul);
+    EXPECT_EQ(pm.search("_DMI_", 0, 0xFFFFF, 16), kBiosArea);
+    int status = -2;
+    EXPECT_EQ(pm.bytes(kBiosArea, 15, status), ep);
+    EXPECT_EQ(status, 0);
+    EXPECT_EQ(tableAt(pm, kTableAddress, table.size()), table);
+}
+
+TEST_F(SysfsSource, LegacyDmiTableOnTheEntryPointIsMovedAndItsChecksumKeptRight) {
+    std::vector<uint8_t> const table = pmemtest::sampleTable();
+    std::vector<uint8_t> const ep =
+        smbiosdump::makeDmiEntryPoint(0x21, static_cast<uint16_t>(table.size()), 0xF0008, 5);
+    serve(ep, table);
+    PMemLibrary& pm = load();
+    ASSERT_NE(pm.isInitialized(), 0);
+    int status = -2;
+    std::vector<uint8_t> const presented = pm.bytes(kBiosArea, 15, status);
+    ASSERT_EQ(status, 0);
+    EXPECT_EQ(dword(presented, 8), 0x100000u);
+    EXPECT_EQ(byteSum(presented, 0, 15), 0);
+    EXPECT_EQ(slice(presented, 0, 5), slice(ep, 0, 5));
+    EXPECT_EQ(slice(presented, 6, 8), slice(ep, 6, 8));
+    EXPECT_EQ(slice(presented, 12, 15), slice(ep, 12, 15));
+    EXPECT_EQ(tableAt(pm, 0x100000, table.size()), table);
+}
+
+// Folders the forced sysfs source cannot serve from.
+struct BadSysfs {
+    char const* name;
+    std::vector<uint8_t> entryPoint;  // empty: no smbios_entry_point file
+    size_t tableSize;                 // 0 with hasTable: an empty DMI file
+    bool hasTable;
+};
+
+void PrintTo(BadSysfs const& bad, std::ostream* out) { *out << bad.name; }
+
+class BadSysfsFolder : public pmemtest::PMemTest, public ::testing::WithParamInterface<BadSysfs> {};
+
+TEST_P(BadSysfsFolder, MakesTheSysfsSourceUnusable) {
+    BadSysfs const& bad = GetParam();
+    std::vector<uint8_t> const table(bad.tableSize, 0);
+    env("PMEM_SYSFS_DIR", sysfsFolder(bad.entryPoint.empty() ? nullptr : &bad.entryPoint,
+                                      bad.hasTable ? &table : nullptr));
+    env("PMEM_SOURCE", "sysfs");
+    PMemLibrary& pm = load();
+    EXPECT_EQ(pm.isInitialized(), 0);
+    EXPECT_EQ(pm.open(), 0);
+    unsigned char buffer[16] = {};
+    EXPECT_NE(pm.read(buffer, kBiosArea, 16), 0);
+    EXPECT_EQ(pm.search("_SM_", 0xF0000, 0xFFFFF, 16), 0ul);
+}
+
+namespace {
+
+std::vector<uint8_t> sized(std::vector<uint8_t> bytes, size_t size) {
+    bytes.resize(size);
+    return bytes;
+}
+
+std::vector<uint8_t> withAnchor(char const* anchor) {
+    std::vector<uint8_t> ep(0x1F, 0);
+    std::memcpy(ep.data(), anchor, std::strlen(anchor));
+    return ep;
+}
+
+}  // namespace
+
+INSTANTIATE_TEST_SUITE_P(
+    SysfsSource, BadSysfsFolder,
+    ::testing::Values(
+        BadSysfs{"EmptyFolder", {}, 0, false},
+        BadSysfs{"NoEntryPoint", {}, 64, true},
+        BadSysfs{"NoTable", pmemtest::smEntryPoint(std::vector<uint8_t>(64, 0), 2, 7, 0x100000),
+                 0, false},
+        BadSysfs{"EmptyTable",
+                 pmemtest::smEntryPoint(std::vector<uint8_t>(64, 0), 2, 7, 0x100000), 0, true},
+        BadSysfs{"UnknownAnchor", withAnchor("_XM_"), 64, true},
+        BadSysfs{"ShortSmEntryPoint",
+                 sized(pmemtest::smEntryPoint(std::vector<uint8_t>(64, 0), 2, 7, 0x100000), 0x1D),
+                 64, true},
+        BadSysfs{"ShortSm3EntryPoint",
+                 sized(pmemtest::sm3EntryPoint(3, 0, 0, 64, 0x100000), 0x17), 64, true},
+        BadSysfs{"Sm3EntryPointStatingAShortLength",
+                 [] {
+                     std::vector<uint8_t> ep = pmemtest::sm3EntryPoint(3, 0, 0, 64, 0x100000);
+                     ep[6] = 0x10;
+                     pmemtest::setChecksum(ep, 5, 0, 0x18);
+                     return ep;
+                 }(),
+                 64, true},
+        BadSysfs{"ShortDmiEntryPoint",
+                 sized(smbiosdump::makeDmiEntryPoint(0x21, 64, 0x100000, 1), 14), 64, true}),
+    [](::testing::TestParamInfo<BadSysfs> const& info) { return std::string(info.param.name); });
