@@ -1,0 +1,108 @@
+#include "DumpTestSupport.h"
+
+#include <dirent.h>
+#include <sys/stat.h>
+
+#include <algorithm>
+#include <fstream>
+#include <iterator>
+#include <nlohmann/json.hpp>
+
+#include "TestSupport.h"
+#include "smbios/SmBiosInitializer.h"
+
+namespace dumptest {
+
+std::string toolPath() { return hosttest::outDir() + "/smbios-dump"; }
+
+hosttest::RunResult runDump(std::vector<std::string> const& args,
+                            hosttest::Environment const& environment) {
+    return hosttest::runProgram(toolPath(), args, environment);
+}
+
+std::string fakePMem(std::string const& variant) {
+    return hosttest::outDir() + "/" + DUMP_FAKE_PMEM_FROM_OUT + "/" + variant + "/libpmem.so";
+}
+
+ReadBack readBackThroughPlugin(std::string const& path) {
+    ReadBack result;
+    std::vector<std::string> head;
+    std::vector<std::string> tables;
+    result.imported = SD::importSmBios(path, head, tables);
+    if (result.imported != 0) {
+        return result;
+    }
+    result.head = SD::readHead(result.header, head);
+    result.tables = SD::readTables(result.table, tables);
+    return result;
+}
+
+std::vector<std::string> folderEntries(std::string const& folder) {
+    std::vector<std::string> names;
+    DIR* handle = opendir(folder.c_str());
+    if (handle == nullptr) {
+        return names;
+    }
+    while (dirent* entry = readdir(handle)) {
+        std::string const name = entry->d_name;
+        if (name != "." && name != "..") {
+            names.push_back(name);
+        }
+    }
+    closedir(handle);
+    std::sort(names.begin(), names.end());
+    return names;
+}
+
+bool exists(std::string const& path) {
+    struct stat info;
+    return lstat(path.c_str(), &info) == 0;
+}
+
+std::string readText(std::string const& path) {
+    std::ifstream in(path, std::ios::binary);
+    return std::string(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
+}
+
+std::string inventoryWithoutClock(std::string const& json, unsigned& masked) {
+    masked = 0;
+    nlohmann::ordered_json document = nlohmann::ordered_json::parse(json, nullptr, false);
+    if (document.is_discarded() || !document.contains("nodes")) {
+        return "";
+    }
+    for (auto& node : document["nodes"]) {
+        if (node.value("type", 0u) != 40 || !node.contains("properties")) {
+            continue;
+        }
+        masked += static_cast<unsigned>(node["properties"].erase("126"));
+        masked += static_cast<unsigned>(node["properties"].erase("127"));
+    }
+    return document.dump(2);
+}
+
+uint8_t byteSum(Bytes const& bytes, size_t begin, size_t end) {
+    uint8_t sum = 0;
+    for (size_t i = begin; i < end && i < bytes.size(); ++i) {
+        sum = static_cast<uint8_t>(sum + bytes[i]);
+    }
+    return sum;
+}
+
+uint16_t word(Bytes const& bytes, size_t offset) {
+    return static_cast<uint16_t>(bytes.at(offset) | (bytes.at(offset + 1) << 8));
+}
+
+uint32_t dword(Bytes const& bytes, size_t offset) {
+    return static_cast<uint32_t>(word(bytes, offset)) |
+           (static_cast<uint32_t>(word(bytes, offset + 2)) << 16);
+}
+
+Bytes sampleTable() {
+    return smbiostest::TableBuilder()
+        .add(smbiostest::Structure(0, 0x0000).str("Corvane").str("1.02").byte(0x0F))
+        .add(smbiostest::Structure(1, 0x0001).str("Corvane").str("RS-7400").byte(6))
+        .endOfTable(0x0002)
+        .build();
+}
+
+}  // namespace dumptest

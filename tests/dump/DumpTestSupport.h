@@ -1,0 +1,64 @@
+// Helpers of the smbios-dump tests: running the built tool, reading what it
+// wrote back through the plug-in's own import, the stand-in physical-memory
+// libraries and small file-system checks.
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <string>
+#include <vector>
+
+#include "HostRunner.h"
+
+namespace dumptest {
+
+typedef std::vector<uint8_t> Bytes;
+
+// The built smbios-dump in SMBIOS_OUT_DIR.
+std::string toolPath();
+
+// Runs the built smbios-dump.
+hosttest::RunResult runDump(std::vector<std::string> const& args,
+                            hosttest::Environment const& environment = hosttest::Environment());
+
+// A stand-in physical-memory library: "full" exports the five functions,
+// "nosearch" all but PMemSearch.
+std::string fakePMem(std::string const& variant);
+
+// An override dump file read the way the plug-in reads it: importSmBios,
+// then readHead and readTables (each result 0 on success).
+struct ReadBack {
+    int imported = -1;
+    int head = -1;
+    int tables = -1;
+    std::vector<unsigned char> header;
+    std::vector<unsigned char> table;
+
+    bool ok() const { return imported == 0 && head == 0 && tables == 0; }
+};
+ReadBack readBackThroughPlugin(std::string const& path);
+
+// The names in a folder (without "." and ".."), sorted.
+std::vector<std::string> folderEntries(std::string const& folder);
+
+bool exists(std::string const& path);
+
+// The whole file as text; "" when it cannot be read.
+std::string readText(std::string const& path);
+
+// smbios-inventory's JSON without the two values the plug-in reads from the
+// clock (properties 126, the current date-time, and 127, the time-zone
+// offset, of the computer-system nodes), so that two runs compare as text.
+// `masked` counts the values removed. "" when the text is not JSON.
+std::string inventoryWithoutClock(std::string const& json, unsigned& masked);
+
+// The 8-bit sum of bytes[begin, end).
+uint8_t byteSum(Bytes const& bytes, size_t begin, size_t end);
+
+uint16_t word(Bytes const& bytes, size_t offset);
+uint32_t dword(Bytes const& bytes, size_t offset);
+
+// A small table of three structures (BIOS, system, end of table).
+Bytes sampleTable();
+
+}  // namespace dumptest

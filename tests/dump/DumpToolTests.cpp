@@ -1,0 +1,366 @@
+// The built smbios-dump run as a child process: its command line, its
+// outputs (a file, the install location, standard output), its refusal to
+// replace a file, and its exits on bad input with nothing written.
+#include <gtest/gtest.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <string>
+#include <vector>
+
+#include "DumpFormat.h"
+#include "DumpTestSupport.h"
+#include "HostRunner.h"
+#include "TestSupport.h"
+
+using dumptest::Bytes;
+using dumptest::runDump;
+using hosttest::describe;
+using hosttest::RunResult;
+using smbiostest::TempDir;
+
+namespace {
+
+// A folder holding the sample table as a raw table file "table.bin".
+struct TableInput {
+    TableInput() { smbiostest::writeFile(path(), dumptest::sampleTable()); }
+    std::string path() const { return dir.file("table.bin"); }
+    TempDir dir;
+};
+
+std::string wroteLine(std::string const& target) {
+    return "smbios-dump: wrote " + target + ": SMBIOS 2.7, 3 structures, " +
+           std::to_string(dumptest::sampleTable().size()) + " bytes\n";
+}
+
+TEST(DumpTool, FromTableWritesFileAndSaysWhat) {
+    TableInput input;
+    std::string const out = input.dir.file("smbios.txt");
+    RunResult const run = runDump({"--from-table", input.path(), "--version", "2.7", "-o", out});
+    ASSERT_EQ(run.exitStatus, 0) << describe(run);
+    EXPECT_EQ(run.err, wroteLine(out));
+    EXPECT_TRUE(run.out.empty()) << describe(run);
+    dumptest::ReadBack const back = dumptest::readBackThroughPlugin(out);
+    ASSERT_TRUE(back.ok()) << back.imported << " " << back.head << " " << back.tables;
+    EXPECT_EQ(back.table, dumptest::sampleTable());
+    ASSERT_EQ(back.header.size(), 31u);
+    EXPECT_EQ(back.header[6], 2);
+    EXPECT_EQ(back.header[7], 7);
+}
+
+TEST(DumpTool, OutputLinesAreOfModerateLength) {
+    TableInput input;
+    smbiostest::TableBuilder big;
+    for (uint16_t handle = 0; handle < 40; ++handle) {
+        big.add(smbiostest::Structure(0x80, handle).bytes(Bytes(60, 0x5A)).str("text"));
+    }
+    smbiostest::writeFile(input.path(), big.endOfTable(0x100).build());
+    std::string const out = input.dir.file("smbios.txt");
+    RunResult const run =
+        runDump({"--from-table", input.path(), "--version", "3.2", "--output", out});
+    ASSERT_EQ(run.exitStatus, 0) << describe(run);
+    std::string const text = dumptest::readText(out);
+    ASSERT_GT(text.size(), 2000u);
+    size_t longest = 0;
+    size_t lines = 0;
+    size_t begin = 0;
+    while (begin < text.size()) {
+        size_t const end = text.find('\n', begin);
+        ASSERT_NE(end, std::string::npos) << "last line without a line end";
+        longest = std::max(longest, end - begin);
+        ++lines;
+        begin = end + 1;
+    }
+    EXPECT_LE(longest, 80u);
+    EXPECT_GT(lines, 30u);
+    EXPECT_EQ(text.compare(text.size() - 14, 14, "</SHOWSMBIOS>\n"), 0);
+}
+
+TEST(DumpTool, RefusesToReplaceExistingFileWithoutForce) {
+    TableInput input;
+    std::string const out = input.dir.file("smbios.txt");
+    smbiostest::writeFile(out, "keep me\n");
+    RunResult const run = runDump({"--from-table", input.path(), "--version", "2.7", "-o", out});
+    EXPECT_EQ(run.exitStatus, 1) << describe(run);
+    EXPECT_NE(run.err.find(out + " exists"), std::string::npos) << describe(run);
+    EXPECT_NE(run.err.find("--force"), std::string::npos) << describe(run);
+    EXPECT_EQ(dumptest::readText(out), "keep me\n");
+    EXPECT_EQ(dumptest::folderEntries(input.dir.path()),
+              (std::vector<std::string>{"smbios.txt", "table.bin"}));
+}
+
+TEST(DumpTool, ForceReplacesExistingFile) {
+    TableInput input;
+    std::string const out = input.dir.file("smbios.txt");
+    smbiostest::writeFile(out, "old\n");
+    RunResult const run =
+        runDump({"--from-table", input.path(), "--version", "2.7", "-o", out, "--force"});
+    ASSERT_EQ(run.exitStatus, 0) << describe(run);
+    EXPECT_EQ(run.err, wroteLine(out));
+    dumptest::ReadBack const back = dumptest::readBackThroughPlugin(out);
+    ASSERT_TRUE(back.ok());
+    EXPECT_EQ(back.table, dumptest::sampleTable());
+    EXPECT_EQ(dumptest::folderEntries(input.dir.path()),
+              (std::vector<std::string>{"smbios.txt", "table.bin"}));
+}
+
+TEST(DumpTool, DashWritesToStandardOutput) {
+    TableInput input;
+    RunResult const run = runDump({"--from-table", input.path(), "--version", "2.7", "-o", "-"});
+    ASSERT_EQ(run.exitStatus, 0) << describe(run);
+    Bytes const table = dumptest::sampleTable();
+    Bytes header;
+    Bytes parsedTable;
+    std::string error;
+    ASSERT_TRUE(smbiosdump::parseOverride(run.out, header, parsedTable, error)) << error;
+    EXPECT_EQ(parsedTable, table);
+    EXPECT_EQ(run.out, smbiosdump::formatOverride(header, table));
+    EXPECT_EQ(run.err, wroteLine("standard output"));
+    EXPECT_EQ(dumptest::folderEntries(input.dir.path()), (std::vector<std::string>{"table.bin"}));
+}
+
+TEST(DumpTool, InstallWritesOverrideFileUnderDataDir) {
+    TableInput input;
+    TempDir data;
+    RunResult const run = runDump(
+        {"--from-table", input.path(), "--version", "2.7", "--install", "--data-dir", data.path()});
+    ASSERT_EQ(run.exitStatus, 0) << describe(run);
+    std::string const target = data.path() + "/SmBiosOverride/smbios.txt";
+    EXPECT_EQ(run.err, wroteLine(target));
+    EXPECT_EQ(dumptest::folderEntries(data.file("SmBiosOverride")),
+              (std::vector<std::string>{"smbios.txt"}));
+    dumptest::ReadBack const back = dumptest::readBackThroughPlugin(target);
+    ASSERT_TRUE(back.ok());
+    EXPECT_EQ(back.table, dumptest::sampleTable());
+
+    // A second install refuses, a forced one replaces.
+    RunResult const again = runDump(
+        {"--from-table", input.path(), "--version", "2.7", "--install", "--data-dir", data.path()});
+    EXPECT_EQ(again.exitStatus, 1) << describe(again);
+    EXPECT_NE(again.err.find(target), std::string::npos) << describe(again);
+    RunResult const forced = runDump({"--from-table", input.path(), "--version", "2.8", "--install",
+                                      "--data-dir", data.path() + "/", "--force"});
+    ASSERT_EQ(forced.exitStatus, 0) << describe(forced);
+    dumptest::ReadBack const replaced = dumptest::readBackThroughPlugin(target);
+    ASSERT_TRUE(replaced.ok());
+    EXPECT_EQ(replaced.header.at(7), 8);
+}
+
+TEST(DumpTool, InstallUsesKestrelDataDirFromEnvironment) {
+    TableInput input;
+    TempDir data;
+    hosttest::Environment env;
+    env.set["KESTREL_DATA_DIR"] = data.path() + "/";
+    RunResult const run =
+        runDump({"--from-table", input.path(), "--version", "2.7", "--install"}, env);
+    ASSERT_EQ(run.exitStatus, 0) << describe(run);
+    std::string const target = data.path() + "/SmBiosOverride/smbios.txt";
+    EXPECT_EQ(run.err, wroteLine(target));
+    EXPECT_TRUE(dumptest::readBackThroughPlugin(target).ok());
+}
+
+TEST(DumpTool, InstalledFileIsWhatPluginReadsFirst) {
+    if (hosttest::outDir().empty()) {
+        GTEST_SKIP() << "SMBIOS_OUT_DIR is unset; no built host and plug-in to run";
+    }
+    TableInput input;
+    TempDir data;
+    std::string const file = input.dir.file("smbios.txt");
+    ASSERT_EQ(runDump({"--from-table", input.path(), "--version", "2.7", "-o", file}).exitStatus,
+              0);
+    ASSERT_EQ(runDump({"--from-table", input.path(), "--version", "2.7", "--install", "--data-dir",
+                       data.path()})
+                  .exitStatus,
+              0);
+    // The plug-in in the data directory (no dump given) and the plug-in on
+    // the written file agree.
+    RunResult const installed =
+        hosttest::runHost({"--data-dir", data.path() + "/", "--format", "json"});
+    RunResult const dumped = hosttest::runHost({"--dump", file, "--format", "json"});
+    ASSERT_EQ(installed.exitStatus, 0) << describe(installed);
+    ASSERT_EQ(dumped.exitStatus, 0) << describe(dumped);
+    // They agree but for the clock the plug-in reads.
+    unsigned maskedInstalled = 0;
+    unsigned maskedDumped = 0;
+    std::string const fromInstalled =
+        dumptest::inventoryWithoutClock(installed.out, maskedInstalled);
+    std::string const fromDumped = dumptest::inventoryWithoutClock(dumped.out, maskedDumped);
+    EXPECT_EQ(maskedInstalled, maskedDumped);
+    EXPECT_EQ(fromInstalled, fromDumped);
+    EXPECT_NE(fromInstalled.find("RS-7400"), std::string::npos) << installed.out;
+}
+
+TEST(DumpTool, InstallIntoMissingDataDirFails) {
+    TableInput input;
+    std::string const missing = input.dir.file("no-data");
+    RunResult const run = runDump(
+        {"--from-table", input.path(), "--version", "2.7", "--install", "--data-dir", missing});
+    EXPECT_EQ(run.exitStatus, 1) << describe(run);
+    EXPECT_NE(run.err.find(missing), std::string::npos) << describe(run);
+    EXPECT_FALSE(dumptest::exists(missing));
+}
+
+TEST(DumpTool, UnwritableFolderLeavesNoFile) {
+    TableInput input;
+    std::string const folder = input.dir.file("locked");
+    ASSERT_EQ(mkdir(folder.c_str(), 0555), 0);
+    if (access(folder.c_str(), W_OK) == 0) {
+        chmod(folder.c_str(), 0755);
+        GTEST_SKIP() << "this process may write into a read-only folder (it runs as root); "
+                        "DumpTool.FailedRenameLeavesNoTemporaryFile covers a failed write";
+    }
+    RunResult const run =
+        runDump({"--from-table", input.path(), "--version", "2.7", "-o", folder + "/smbios.txt"});
+    chmod(folder.c_str(), 0755);
+    EXPECT_EQ(run.exitStatus, 1) << describe(run);
+    EXPECT_NE(run.err.find(folder), std::string::npos) << describe(run);
+    EXPECT_TRUE(dumptest::folderEntries(folder).empty());
+}
+
+TEST(DumpTool, FailedRenameLeavesNoTemporaryFile) {
+    // --force on a folder: the temporary file is written, its rename fails.
+    TableInput input;
+    std::string const target = input.dir.file("smbios.txt");
+    ASSERT_EQ(mkdir(target.c_str(), 0755), 0);
+    RunResult const run =
+        runDump({"--from-table", input.path(), "--version", "2.7", "-o", target, "--force"});
+    EXPECT_EQ(run.exitStatus, 1) << describe(run);
+    EXPECT_NE(run.err.find(target), std::string::npos) << describe(run);
+    EXPECT_EQ(dumptest::folderEntries(input.dir.path()),
+              (std::vector<std::string>{"smbios.txt", "table.bin"}));
+    EXPECT_TRUE(dumptest::folderEntries(target).empty());
+}
+
+TEST(DumpTool, MissingOutputFolderFails) {
+    TableInput input;
+    std::string const target = input.dir.file("missing/smbios.txt");
+    RunResult const run = runDump({"--from-table", input.path(), "--version", "2.7", "-o", target});
+    EXPECT_EQ(run.exitStatus, 1) << describe(run);
+    EXPECT_NE(run.err.find(input.dir.file("missing")), std::string::npos) << describe(run);
+    EXPECT_EQ(dumptest::folderEntries(input.dir.path()), (std::vector<std::string>{"table.bin"}));
+}
+
+// --- bad input: exit 1, the file and the reason named, nothing written ---
+
+void expectInputRefused(RunResult const& run, std::string const& file, std::string const& reason,
+                        TempDir const& dir, std::vector<std::string> const& entries) {
+    EXPECT_EQ(run.exitStatus, 1) << describe(run);
+    EXPECT_NE(run.err.find(file + ": "), std::string::npos) << describe(run);
+    EXPECT_NE(run.err.find(reason), std::string::npos) << describe(run);
+    EXPECT_TRUE(run.out.empty()) << describe(run);
+    EXPECT_EQ(dumptest::folderEntries(dir.path()), entries);
+}
+
+TEST(DumpTool, UnreadableInputFails) {
+    TempDir dir;
+    std::string const missing = dir.file("missing.bin");
+    expectInputRefused(runDump({"--from-bin", missing, "-o", dir.file("out.txt")}), missing,
+                       "No such file or directory", dir, {});
+    expectInputRefused(
+        runDump({"--from-table", missing, "--version", "2.7", "-o", dir.file("out.txt")}), missing,
+        "No such file or directory", dir, {});
+    // A folder opens but does not read.
+    ASSERT_EQ(mkdir(dir.file("folder").c_str(), 0755), 0);
+    expectInputRefused(runDump({"--from-bin", dir.file("folder"), "-o", dir.file("out.txt")}),
+                       dir.file("folder"), "cannot read", dir, {"folder"});
+}
+
+TEST(DumpTool, MalformedImageFails) {
+    TempDir dir;
+    std::string const text = dir.file("text.bin");
+    smbiostest::writeFile(text, "SMBIOS 2.7 present.\n");
+    expectInputRefused(runDump({"--from-bin", text, "-o", dir.file("out.txt")}), text,
+                       "no entry point anchor", dir, {"text.bin"});
+
+    // The entry point names more table than the image holds.
+    std::string const cut = dir.file("cut.bin");
+    Bytes image = smbiosdump::makeSmEntryPoint(2, 7, 900, smbiosdump::DUMP_BIN_TABLE_OFFSET, 3, 40);
+    image.resize(0x20 + 100, 0);
+    smbiostest::writeFile(cut, image);
+    expectInputRefused(runDump({"--from-bin", cut, "-o", dir.file("out.txt")}), cut,
+                       "runs past the end", dir, {"cut.bin", "text.bin"});
+}
+
+TEST(DumpTool, MalformedRawTableFails) {
+    TempDir dir;
+    std::string const empty = dir.file("empty.bin");
+    smbiostest::writeFile(empty, "");
+    expectInputRefused(
+        runDump({"--from-table", empty, "--version", "2.7", "-o", dir.file("out.txt")}), empty,
+        "empty", dir, {"empty.bin"});
+    std::string const junk = dir.file("junk.bin");
+    smbiostest::writeFile(junk, Bytes{0x01, 0x02, 0x03});
+    expectInputRefused(
+        runDump({"--from-table", junk, "--version", "2.7", "-o", dir.file("out.txt")}), junk,
+        "no whole SMBIOS structure", dir, {"empty.bin", "junk.bin"});
+}
+
+// --- the command line -------------------------------------------------------
+
+TEST(DumpTool, HelpAndVersion) {
+    RunResult const help = runDump({"--help"});
+    EXPECT_EQ(help.exitStatus, 0) << describe(help);
+    for (char const* option : {"--from-bin", "--from-table", "--from-machine", "--pmem", "--output",
+                               "--install", "--data-dir", "--force", "--version"}) {
+        EXPECT_NE(help.out.find(option), std::string::npos) << option << "\n" << help.out;
+    }
+    RunResult const version = runDump({"--version"});
+    EXPECT_EQ(version.exitStatus, 0) << describe(version);
+    EXPECT_EQ(version.out, std::string("smbios-dump ") + PROJECT_VERSION + "\n");
+}
+
+TEST(DumpTool, WrongCommandLinesExitTwoWithMessage) {
+    TableInput input;
+    std::string const out = input.dir.file("out.txt");
+    std::string const table = input.path();
+    struct Case {
+        std::vector<std::string> args;
+        char const* says;
+    };
+    std::vector<Case> const cases = {
+        {{}, "exactly one source"},
+        {{"-o", out}, "exactly one source"},
+        {{"--from-table", table, "-o", out}, "--version MAJ.MIN"},
+        {{"--from-table", table, "--version", "-o", out}, "--version MAJ.MIN"},
+        {{"--from-table", table, "--version", "2.7.1", "-o", out}, "bad SMBIOS version '2.7.1'"},
+        {{"--from-table", table, "--version", "2.256", "-o", out}, "bad SMBIOS version"},
+        {{"--from-bin", table, "--version", "2.7", "-o", out}, "only goes with --from-table"},
+        {{"--from-bin", table, "--from-table", table, "--version", "2.7", "-o", out}, "excludes"},
+        {{"--from-bin", table, "--from-machine", "-o", out}, "excludes"},
+        {{"--from-bin", table}, "no output"},
+        {{"--from-bin", table, "-o", out, "--install"}, "excludes"},
+        {{"--from-bin", table, "-o", out, "--data-dir", input.dir.path()}, "--install"},
+        {{"--from-bin", table, "-o", out, "--pmem", table}, "--from-machine"},
+        {{"--from-bin", table, "-o", ""}, "empty file name"},
+        {{"--from-bin", table, "-o", out, "--bogus"}, "--bogus"},
+        {{"--from-bin", table, "-o", out, "extra"}, "extra"},
+        {{"--from-bin"}, "--from-bin"},
+    };
+    for (Case const& c : cases) {
+        std::string joined;
+        for (std::string const& arg : c.args) {
+            joined += " '" + arg + "'";
+        }
+        SCOPED_TRACE("smbios-dump" + joined);
+        RunResult const run = runDump(c.args);
+        EXPECT_EQ(run.exitStatus, 2) << describe(run);
+        EXPECT_EQ(run.err.rfind("smbios-dump: ", 0), 0u) << describe(run);
+        EXPECT_NE(run.err.find(c.says), std::string::npos) << describe(run);
+        EXPECT_TRUE(run.out.empty()) << describe(run);
+        EXPECT_EQ(dumptest::folderEntries(input.dir.path()),
+                  (std::vector<std::string>{"table.bin"}));
+    }
+}
+
+TEST(DumpTool, VersionMayComeBeforeTableOption) {
+    TableInput input;
+    std::string const out = input.dir.file("smbios.txt");
+    RunResult const run = runDump({"--version", "2.4", "--from-table", input.path(), "-o", out});
+    ASSERT_EQ(run.exitStatus, 0) << describe(run);
+    dumptest::ReadBack const back = dumptest::readBackThroughPlugin(out);
+    ASSERT_TRUE(back.ok());
+    EXPECT_EQ(back.header.at(6), 2);
+    EXPECT_EQ(back.header.at(7), 4);
+}
+
+}  // namespace

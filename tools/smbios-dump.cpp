@@ -1,0 +1,260 @@
+// smbios-dump: captures an SMBIOS table into the override dump file that the
+// plug-in reads instead of physical memory ("SmBiosOverride/smbios.txt"
+// under the agent's data directory), so that one machine's inventory can be
+// reproduced on another.
+//
+// The table comes from a dmidecode --dump-bin image, from a raw structure
+// table of a stated SMBIOS version, or from this machine through the
+// physical-memory library libpmem.so. The input is read completely before
+// anything is written, and the file is written all or nothing.
+//
+// Exit status: 0 after writing, 1 when the input cannot be read or the file
+// cannot be written (nothing is written then), 2 for a wrong command line.
+
+#include <limits.h>
+#include <unistd.h>
+
+#include <CLI/CLI.hpp>
+#include <cstdio>
+#include <iostream>
+#include <string>
+#include <vector>
+
+#include "DumpFormat.h"
+#include "dump/DumpInput.h"
+#include "dump/DumpOutput.h"
+
+namespace {
+
+char const kProgram[] = "smbios-dump";
+
+int const kExitFailure = 1;
+int const kExitUsage = 2;
+
+// Bytes of the table per line of the dump file: 64 hexadecimal digits.
+size_t const kBytesPerLine = 32;
+
+void complain(std::string const& message) { std::cerr << kProgram << ": " << message << std::endl; }
+
+int usage(std::string const& message) {
+    complain(message + " (see --help)");
+    return kExitUsage;
+}
+
+// The folder that holds this program.
+std::string ownFolder() {
+    std::vector<char> buffer(PATH_MAX + 1);
+    ssize_t length = readlink("/proc/self/exe", buffer.data(), buffer.size() - 1);
+    if (length <= 0) {
+        return ".";
+    }
+    std::string path(buffer.data(), static_cast<size_t>(length));
+    size_t slash = path.rfind('/');
+    if (slash == std::string::npos) {
+        return ".";
+    }
+    return slash == 0 ? std::string("/") : path.substr(0, slash);
+}
+
+std::string oneLine(std::string message) {
+    while (!message.empty() && (message.back() == '\n' || message.back() == '\r')) {
+        message.pop_back();
+    }
+    for (char& c : message) {
+        if (c == '\n' || c == '\r') {
+            c = ' ';
+        }
+    }
+    return message;
+}
+
+bool writeToStandardOutput(std::string const& text) {
+    std::fwrite(text.data(), 1, text.size(), stdout);
+    return std::fflush(stdout) == 0 && std::ferror(stdout) == 0;
+}
+
+int run(int argc, char** argv) {
+    CLI::App app{
+        "Writes an SMBIOS table into the override dump file that the SMBIOS plug-in reads "
+        "instead of physical memory.",
+        kProgram};
+    app.footer(
+        "Exactly one source and one output. --install writes <data dir>/SmBiosOverride/"
+        "smbios.txt, the data dir being --data-dir, else KESTREL_DATA_DIR, else "
+        "/var/lib/kestrel/. --version without a value prints this program's version.");
+
+    std::string fromBin;
+    std::string fromTable;
+    std::string tableVersion;
+    bool fromMachine = false;
+    std::string pmemPath;
+    std::string output;
+    bool install = false;
+    std::string dataDir;
+    bool force = false;
+
+    auto* fromBinOption =
+        app.add_option("--from-bin", fromBin, "Source: a dmidecode --dump-bin image")
+            ->type_name("FILE");
+    auto* fromTableOption =
+        app.add_option("--from-table", fromTable,
+                       "Source: a raw SMBIOS structure table (needs --version MAJ.MIN)")
+            ->type_name("FILE");
+    auto* versionOption =
+        app.add_option("--version", tableVersion,
+                       "The SMBIOS version of the --from-table table; without a value, print "
+                       "this program's version and exit")
+            ->type_name("MAJ.MIN")
+            ->expected(0, 1);
+    auto* fromMachineOption = app.add_flag("--from-machine", fromMachine,
+                                           "Source: this machine, through the libpmem.so library");
+    auto* pmemOption =
+        app.add_option("--pmem", pmemPath,
+                       "The physical-memory library for --from-machine (default: libpmem.so "
+                       "beside this program, else in ../lib from it)")
+            ->type_name("PATH");
+    auto* outputOption =
+        app.add_option("-o,--output", output, "Write the dump file here (- for standard output)")
+            ->type_name("FILE");
+    auto* installOption = app.add_flag("--install", install,
+                                       "Write the dump file where the plug-in looks for it first");
+    auto* dataDirOption =
+        app.add_option("--data-dir", dataDir, "The agent's data directory for --install")
+            ->type_name("DIR");
+    app.add_flag("--force", force, "Replace the output file when it exists");
+
+    fromBinOption->excludes(fromTableOption)->excludes(fromMachineOption);
+    fromTableOption->excludes(fromMachineOption);
+    pmemOption->needs(fromMachineOption);
+    outputOption->excludes(installOption);
+    dataDirOption->needs(installOption);
+
+    try {
+        app.parse(argc, argv);
+    } catch (CLI::CallForHelp const&) {
+        std::cout << app.help();
+        return 0;
+    } catch (CLI::CallForAllHelp const&) {
+        std::cout << app.help("", CLI::AppFormatMode::All);
+        return 0;
+    } catch (CLI::ParseError const& error) {
+        return usage(oneLine(error.what()));
+    }
+
+    int const sources = (fromBinOption->count() > 0 ? 1 : 0) +
+                        (fromTableOption->count() > 0 ? 1 : 0) + (fromMachine ? 1 : 0);
+    bool const versionGiven = versionOption->count() > 0;
+    if (versionGiven && tableVersion.empty() && sources == 0) {
+        std::cout << kProgram << " " << PROJECT_VERSION << std::endl;
+        return 0;
+    }
+    if (sources != 1) {
+        return usage(
+            "exactly one source is needed: --from-bin FILE, --from-table FILE --version MAJ.MIN "
+            "or --from-machine");
+    }
+    uint8_t major = 0;
+    uint8_t minor = 0;
+    if (fromTableOption->count() > 0) {
+        if (tableVersion.empty()) {
+            return usage("--from-table needs the table's SMBIOS version: --version MAJ.MIN");
+        }
+        if (!smbiosdump::parseSmbiosVersion(tableVersion, major, minor)) {
+            return usage("--version: bad SMBIOS version '" + tableVersion +
+                         "' (MAJ.MIN expected, each 0-255)");
+        }
+    } else if (versionGiven) {
+        return usage("--version MAJ.MIN only goes with --from-table");
+    }
+    if (outputOption->count() == 0 && !install) {
+        return usage("no output: give -o FILE, -o - (standard output) or --install");
+    }
+    if (outputOption->count() > 0 && output.empty()) {
+        return usage("-o: empty file name");
+    }
+
+    // Where the file goes; an existing one is refused before any input is
+    // read, and again (without a race) when it is put in place.
+    bool const toStandardOutput = !install && output == "-";
+    std::string target = output;
+    std::string installDataDir;
+    if (install) {
+        installDataDir = smbiosdump::dataDirectory(dataDir);
+        target = smbiosdump::overridePath(installDataDir);
+    }
+    if (!toStandardOutput && !force && access(target.c_str(), F_OK) == 0) {
+        complain(target + " exists; not replaced (use --force to replace it)");
+        return kExitFailure;
+    }
+
+    // The whole input, before anything is written.
+    smbiosdump::Capture capture;
+    std::string error;
+    if (fromBinOption->count() > 0 || fromTableOption->count() > 0) {
+        std::string const& path = fromBinOption->count() > 0 ? fromBin : fromTable;
+        std::vector<uint8_t> bytes;
+        if (!smbiosdump::readInputFile(path, bytes, error)) {
+            complain(path + ": " + error);
+            return kExitFailure;
+        }
+        bool const captured =
+            fromBinOption->count() > 0
+                ? smbiosdump::captureFromDumpBin(bytes, capture, error)
+                : smbiosdump::captureFromTable(bytes, major, minor, capture, error);
+        if (!captured) {
+            complain(path + ": " + error);
+            return kExitFailure;
+        }
+    } else {
+        std::string const library =
+            pmemPath.empty() ? smbiosdump::defaultPMemPath(ownFolder()) : pmemPath;
+        if (!smbiosdump::captureFromMachine(library, capture, error)) {
+            // The library's sources (the kernel's tables, /dev/mem) are
+            // root's to read.
+            complain("cannot read this machine's SMBIOS table: " + error +
+                     (geteuid() != 0 ? " (reading physical memory usually needs root)" : ""));
+            return kExitFailure;
+        }
+    }
+    std::string const text =
+        smbiosdump::formatOverride(capture.header, capture.table, kBytesPerLine);
+    std::string const summary = smbiosdump::describeCapture(capture);
+
+    if (toStandardOutput) {
+        if (!writeToStandardOutput(text)) {
+            complain("cannot write to standard output");
+            return kExitFailure;
+        }
+        std::cerr << kProgram << ": wrote standard output: " << summary << std::endl;
+        return 0;
+    }
+    if (install && !smbiosdump::makeOverrideFolder(installDataDir, error)) {
+        complain(error);
+        return kExitFailure;
+    }
+    switch (smbiosdump::writeFileAtomically(target, text, force, error)) {
+        case smbiosdump::WriteResult::WRITTEN:
+            break;
+        case smbiosdump::WriteResult::EXISTS:
+            complain(target + " exists; not replaced (use --force to replace it)");
+            return kExitFailure;
+        case smbiosdump::WriteResult::FAILED:
+            complain(error);
+            return kExitFailure;
+    }
+    std::cerr << kProgram << ": wrote " << target << ": " << summary << std::endl;
+    return 0;
+}
+
+}  // namespace
+
+int main(int argc, char** argv) {
+    try {
+        return run(argc, argv);
+    } catch (std::exception const& error) {
+        complain(std::string("unexpected failure: ") + error.what());
+    } catch (...) {
+        complain("unexpected failure");
+    }
+    return kExitFailure;
+}
