@@ -33,11 +33,7 @@ MutableNode* SmBiosMI::newNode(unsigned int parentId, unsigned int nodeType, uns
 
 Error SmBiosMI::initialize(unsigned int id, Number const& a, Number const& b) {
     SMBIOS_DETAIL(logger, "initialize entry");
-    std::unique_ptr<std::vector<TableData>> owners[256];
-    std::vector<TableData>* lists[256];
     for (unsigned int type = 0; type < 256; ++type) {
-        owners[type].reset(new std::vector<TableData>());
-        lists[type] = owners[type].get();
         tablecount[type] = 0;
     }
 
@@ -65,21 +61,9 @@ Error SmBiosMI::initialize(unsigned int id, Number const& a, Number const& b) {
         SMBIOS_DETAIL(logger, "SmBiosMI Revision is 0 or NULL");
     }
 
-    unsigned int type = 0;
-    for (SD::SmBios::Table const& structure : smbios.getTables()) {
-        try {
-            type = structure.getType();
-            unsigned int const length = structure.getLength();
-            lists[type]->push_back(TableData(&structure, length));
-        } catch (std::exception const& e) {
-            SMBIOS_ERROR(logger, "Exception=" << e.what() << " Type=" << typeid(e).name()
-                                              << "Table " << type);
-        } catch (ICException const& e) {
-            SMBIOS_ERROR(logger, "ICException=" << e.what() << "Table=" << type);
-        } catch (...) {
-            SMBIOS_ERROR(logger, "Error in table " << type);
-        }
-    }
+    std::unique_ptr<std::vector<TableData>> owners[256];
+    std::vector<TableData>* lists[256];
+    groupStructures(smbios, owners, lists);
 
     makeRootNode(lists);
 
@@ -98,6 +82,62 @@ Error SmBiosMI::initialize(unsigned int id, Number const& a, Number const& b) {
     Error const result = myerr;
     SMBIOS_DETAIL(logger, "initialize exit");
     return result;
+}
+
+void SmBiosMI::groupStructures(SD::SmBios const& smbios,
+                               std::unique_ptr<std::vector<TableData>> (&owners)[256],
+                               std::vector<TableData>* (&lists)[256]) {
+    for (unsigned int t = 0; t < 256; ++t) {
+        owners[t].reset(new std::vector<TableData>());
+        lists[t] = owners[t].get();
+    }
+    unsigned int type = 0;
+    for (SD::SmBios::Table const& structure : smbios.getTables()) {
+        try {
+            type = structure.getType();
+            unsigned int const length = structure.getLength();
+            lists[type]->push_back(TableData(&structure, length));
+        } catch (std::exception const& e) {
+            SMBIOS_ERROR(logger, "Exception=" << e.what() << " Type=" << typeid(e).name()
+                                              << "Table " << type);
+        } catch (ICException const& e) {
+            SMBIOS_ERROR(logger, "ICException=" << e.what() << "Table=" << type);
+        } catch (...) {
+            SMBIOS_ERROR(logger, "Error in table " << type);
+        }
+    }
+}
+
+bool SmBiosMI::makeRequestedNodes(unsigned int parentId, unsigned int const* locations,
+                                  unsigned int locationCount, bool bmc) {
+    SMBIOS_DETAIL(logger, "makeRequestedNodes entry");
+    bool parentFound = false;
+    for (Node const* node : nodeList) {
+        if (node != nullptr && node->getNodeId() == parentId) {
+            parentFound = true;
+            break;
+        }
+    }
+    if (!parentFound) {
+        SMBIOS_ERROR(logger, "makeRequestedNodes: no node with id " << parentId);
+        return false;
+    }
+
+    // The table initialize acquired: this copy reads nothing again.
+    SD::SmBios smbios;
+    std::unique_ptr<std::vector<TableData>> owners[256];
+    std::vector<TableData>* lists[256];
+    groupStructures(smbios, owners, lists);
+
+    for (unsigned int i = 0; i < locationCount; ++i) {
+        makeTemperatureSensorNodes(lists, parentId, locations[i]);
+        makeVoltageSensorNodes(lists, parentId, locations[i]);
+    }
+    if (bmc) {
+        makeBMCNodes(lists, parentId);
+    }
+    SMBIOS_DETAIL(logger, "makeRequestedNodes exit");
+    return true;
 }
 
 // Readers and writers. Offsets are checked against the formatted-area
@@ -352,4 +392,19 @@ extern "C" int OpenMI(IC::ManagementInterface** mi, IC::Error** err) {
     *err = &IC::myerr;
     SMBIOS_DETAIL(IC::logger, "OpenMI exit");
     return 0;
+}
+
+extern "C" int SmBiosMIExtraNodes(unsigned int parentId, unsigned int const* locations,
+                                  unsigned int locationCount, int bmc) {
+    if (locations == nullptr) {
+        locationCount = 0;
+    }
+    try {
+        bool const made =
+            IC::mysmbiosmi.makeRequestedNodes(parentId, locations, locationCount, bmc != 0);
+        return made ? 0 : 1;
+    } catch (...) {
+        SMBIOS_ERROR(IC::logger, "SmBiosMIExtraNodes: the nodes could not be made");
+        return 2;
+    }
 }

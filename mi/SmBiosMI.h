@@ -6,6 +6,7 @@
 
 #include <exception>
 #include <map>
+#include <memory>
 #include <string>
 #include <typeinfo>
 #include <utility>
@@ -50,6 +51,13 @@ public:
     ~SmBiosMI() override;
 
     Error initialize(unsigned int id, Number const& a, Number const& b) override;
+
+    // After initialize: the temperature and voltage sensor nodes of the
+    // probes at each location, in the order given, then, with bmc, the BMC
+    // nodes, all under parentId, from the table initialize acquired. False
+    // (logged) when parentId names no node.
+    bool makeRequestedNodes(unsigned int parentId, unsigned int const* locations,
+                            unsigned int locationCount, bool bmc);
 
     // Builders.
     void makeRootNode(TableLists lists);
@@ -166,6 +174,15 @@ protected:
 
     unsigned int smbiosMajorVersion = 0;
     unsigned int smbiosMinorVersion = 0;
+
+private:
+    // Makes the structure lists, one new list per SMBIOS type in owners
+    // (lists holds the same lists for the builders), and files every
+    // structure of smbios in the list of its type; a structure that cannot
+    // be read is logged and left out.
+    void groupStructures(SD::SmBios const& smbios,
+                         std::unique_ptr<std::vector<TableData>> (&owners)[256],
+                         std::vector<TableData>* (&lists)[256]);
 };
 
 // A copy of s without its trailing blanks, or, when s starts with blanks,
@@ -188,6 +205,14 @@ extern unsigned int tablecount[256];
 // error record, and returns 0.
 extern "C" __attribute__((visibility("default"))) int OpenMI(IC::ManagementInterface** mi,
                                                              IC::Error** err);
+
+// The optional entry point for a host that wants the nodes nothing in the
+// plug-in makes (see SmBiosMI::makeRequestedNodes): sensor nodes for the
+// probes at each of the locationCount locations, and the BMC nodes when bmc
+// is not 0, under the node parentId. Call it after initialize. Returns 0,
+// 1 when parentId names no node, 2 when the nodes could not be made.
+extern "C" __attribute__((visibility("default"))) int SmBiosMIExtraNodes(
+    unsigned int parentId, unsigned int const* locations, unsigned int locationCount, int bmc);
 
 // The three handlers that guard the handling of one structure in a builder:
 // the failure is logged and the builder goes on with the next structure.

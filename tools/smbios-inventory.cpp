@@ -11,7 +11,9 @@
 #include <unistd.h>
 
 #include <CLI/CLI.hpp>
+#include <algorithm>
 #include <cerrno>
+#include <cstdint>
 #include <cstdio>
 #include <cstring>
 #include <filesystem>
@@ -20,8 +22,10 @@
 #include <string>
 #include <vector>
 
+#include "DumpFormat.h"
 #include "IC/Error.h"
 #include "IC/ManagementInterface.h"
+#include "IC/MutableNode.h"
 #include "IC/Node.h"
 #include "IC/Number.h"
 #include "QNLog/QNLogger.h"
@@ -31,6 +35,28 @@ namespace {
 
 char const kProgram[] = "smbios-inventory";
 char const kPluginName[] = "libsmbiosmi.so";
+// The plug-in's optional entry point that makes the nodes its initialize
+// does not: sensor nodes for the probes at given locations, and BMC nodes.
+char const kExtraNodesEntry[] = "SmBiosMIExtraNodes";
+typedef int (*ExtraNodesFunction)(unsigned int parentId, unsigned int const* locations,
+                                  unsigned int locationCount, int bmc);
+
+// Node types of the nodes the extra nodes hang under: the planar, else the
+// root.
+unsigned int const kPlanarNodeType = 41;
+unsigned int const kRootNodeType = 59;
+
+// The SMBIOS probe location codes by name, for --sensors.
+struct NamedLocation {
+    char const* name;
+    unsigned int code;
+};
+NamedLocation const kLocations[] = {
+    {"motherboard", 2},   {"processor", 3},        {"disk", 4},          {"peripheral-bay", 5},
+    {"memory-module", 7}, {"processor-module", 8}, {"power-unit", 9},    {"add-in-card", 10},
+    {"front-panel", 11},  {"back-panel", 12},      {"power-system", 13}, {"drive-back-plane", 14},
+};
+unsigned int const kLastLocation = 31;
 
 int const kExitFailure = 1;
 int const kExitUsage = 2;
@@ -180,6 +206,69 @@ bool writeWholeFile(std::string const& path, std::string const& content, std::st
     return true;
 }
 
+// An SMBIOS probe location: a name of kLocations, or a code from 0 to 31 in
+// decimal or with 0x in hexadecimal.
+bool parseLocation(std::string const& text, unsigned int& code) {
+    for (NamedLocation const& location : kLocations) {
+        if (text == location.name) {
+            code = location.code;
+            return true;
+        }
+    }
+    bool const hex = text.size() > 2 && text[0] == '0' && (text[1] == 'x' || text[1] == 'X');
+    std::string const digits = hex ? text.substr(2) : text;
+    if (digits.empty()) {
+        return false;
+    }
+    unsigned int value = 0;
+    for (char c : digits) {
+        unsigned int digit = 0;
+        if (c >= '0' && c <= '9') {
+            digit = static_cast<unsigned int>(c - '0');
+        } else if (hex && c >= 'a' && c <= 'f') {
+            digit = static_cast<unsigned int>(c - 'a' + 10);
+        } else if (hex && c >= 'A' && c <= 'F') {
+            digit = static_cast<unsigned int>(c - 'A' + 10);
+        } else {
+            return false;
+        }
+        value = value * (hex ? 16u : 10u) + digit;
+        if (value > kLastLocation) {
+            return false;
+        }
+    }
+    code = value;
+    return true;
+}
+
+std::string locationNames() {
+    std::string names;
+    for (NamedLocation const& location : kLocations) {
+        names += names.empty() ? "" : ", ";
+        names += location.name;
+    }
+    return names;
+}
+
+// What the user asked for beyond what initialize makes.
+struct ExtraNodes {
+    std::vector<unsigned int> locations;  // each once, in the order given
+    bool bmc = false;
+
+    bool requested() const { return bmc || !locations.empty(); }
+};
+
+// The id of the first node of the given type, or 0 when there is none.
+unsigned int firstNodeOfType(std::vector<IC::Node*> const& nodes, unsigned int type) {
+    for (IC::Node const* node : nodes) {
+        auto const* mutableNode = dynamic_cast<IC::MutableNode const*>(node);
+        if (mutableNode != nullptr && mutableNode->getNodeType() == type) {
+            return mutableNode->getNodeId();
+        }
+    }
+    return 0;
+}
+
 bool setEnvironment(char const* name, std::string const& value) {
     if (setenv(name, value.c_str(), 1) != 0) {
         complain(std::string("cannot set ") + name + ": " + std::strerror(errno));
@@ -206,9 +295,40 @@ bool applyLevel(char const* option, std::string const& text, void (*apply)(int))
     return true;
 }
 
-// Loads the plug-in, opens and initializes its management interface and
-// fills nodes. Returns 0, or 1 after saying why.
-int loadInventory(std::string const& pluginPath, std::vector<IC::Node*>& nodes) {
+// Asks the plug-in for the extra nodes under the planar node, else the root.
+// Returns 0, or 1 after saying why.
+int makeExtraNodes(ExtraNodesFunction extraNodes, ExtraNodes const& extra) {
+    std::vector<IC::Node*> nodes;
+    IC::Error mapped = gInterface->getMap(nodes);
+    if (mapped.getStatus() != 0) {
+        complain("getMap failed with status " + std::to_string(mapped.getStatus()) + ": " +
+                 mapped.getMessage());
+        return kExitFailure;
+    }
+    unsigned int parentId = firstNodeOfType(nodes, kPlanarNodeType);
+    if (parentId == 0) {
+        parentId = firstNodeOfType(nodes, kRootNodeType);
+    }
+    if (parentId == 0) {
+        complain("the inventory has neither a planar nor a root node for the sensor and BMC nodes");
+        return kExitFailure;
+    }
+    int const made =
+        extraNodes(parentId, extra.locations.data(),
+                   static_cast<unsigned int>(extra.locations.size()), extra.bmc ? 1 : 0);
+    if (made != 0) {
+        complain(std::string(kExtraNodesEntry) + " returned " + std::to_string(made) +
+                 " for the parent node " + std::to_string(parentId));
+        return kExitFailure;
+    }
+    return 0;
+}
+
+// Loads the plug-in, opens and initializes its management interface, makes
+// the extra nodes when asked to and fills nodes. Returns 0, or 1 after
+// saying why.
+int loadInventory(std::string const& pluginPath, ExtraNodes const& extra,
+                  std::vector<IC::Node*>& nodes) {
     // The plug-in and the framework may print while they start; that output
     // goes to standard error.
     StdoutToStderr redirect;
@@ -237,6 +357,22 @@ int loadInventory(std::string const& pluginPath, std::vector<IC::Node*>& nodes) 
     static_assert(sizeof openMI == sizeof symbol, "function and data pointers differ in size");
     std::memcpy(&openMI, &symbol, sizeof openMI);
 
+    // The extra entry point is looked for only when it is needed: a
+    // plug-in without it serves every other run.
+    ExtraNodesFunction extraNodes = nullptr;
+    if (extra.requested()) {
+        dlerror();
+        void* extraSymbol = dlsym(gPlugin, kExtraNodesEntry);
+        if (extraSymbol == nullptr) {
+            complain("the plug-in " + pluginPath + " has no " + kExtraNodesEntry +
+                     " entry point, which --sensors and --bmc need");
+            return kExitFailure;
+        }
+        static_assert(sizeof extraNodes == sizeof extraSymbol,
+                      "function and data pointers differ in size");
+        std::memcpy(&extraNodes, &extraSymbol, sizeof extraNodes);
+    }
+
     int opened = openMI(&gInterface, &gOpenError);
     if (opened != 0) {
         std::string message = "OpenMI of " + pluginPath + " returned " + std::to_string(opened);
@@ -257,6 +393,12 @@ int loadInventory(std::string const& pluginPath, std::vector<IC::Node*>& nodes) 
                  initialized.getMessage());
         return kExitFailure;
     }
+    if (extraNodes != nullptr) {
+        int const status = makeExtraNodes(extraNodes, extra);
+        if (status != 0) {
+            return status;
+        }
+    }
     IC::Error mapped = gInterface->getMap(nodes);
     if (mapped.getStatus() != 0) {
         complain("getMap failed with status " + std::to_string(mapped.getStatus()) + ": " +
@@ -273,6 +415,7 @@ int run(int argc, char** argv) {
         "the inventory tree that it builds.",
         kProgram};
     std::string dumpFile;
+    std::string binFile;
     std::string dataDir;
     std::string codeDir;
     std::string pluginPath;
@@ -280,6 +423,8 @@ int run(int argc, char** argv) {
     std::string logFile;
     std::string logLevel;
     std::string traceLevel;
+    std::vector<std::string> sensorLocations;
+    bool bmc = false;
 
     auto* dumpOption = app.add_option("--dump", dumpFile,
                                       "Run the plug-in on this dump file instead of the "
@@ -290,6 +435,13 @@ int run(int argc, char** argv) {
         app.add_option("--data-dir", dataDir, "Data directory of the agent (KESTREL_DATA_DIR)")
             ->type_name("DIR");
     dumpOption->excludes(dataDirOption);
+    auto* binOption = app.add_option("--from-bin", binFile,
+                                     "Run the plug-in on this dmidecode --dump-bin file instead "
+                                     "of the machine's own table")
+                          ->type_name("FILE")
+                          ->check(quiet(CLI::ExistingFile));
+    binOption->excludes(dumpOption);
+    binOption->excludes(dataDirOption);
     app.add_option("--code-dir", codeDir, "Code directory of the agent (KESTREL_CODE_DIR)")
         ->type_name("DIR");
     app.add_option("--plugin", pluginPath,
@@ -305,6 +457,14 @@ int run(int argc, char** argv) {
         ->type_name("N");
     app.add_option("--trace-level", traceLevel, "Trace threshold: a decimal number or \"off\"")
         ->type_name("N");
+    app.add_option("--sensors", sensorLocations,
+                   "Also make the temperature and voltage sensor nodes of the probes at this "
+                   "location (repeatable): a code from 0 to 31 or one of " +
+                       locationNames())
+        ->type_name("LOCATION")
+        ->expected(1)
+        ->multi_option_policy(CLI::MultiOptionPolicy::TakeAll);
+    app.add_flag("--bmc", bmc, "Also make the BMC nodes");
     app.set_version_flag("--version", std::string(kProgram) + " " + PROJECT_VERSION,
                          "Print the version and exit");
 
@@ -345,8 +505,24 @@ int run(int argc, char** argv) {
         return kExitUsage;
     }
 
+    ExtraNodes extra;
+    extra.bmc = bmc;
+    for (std::string const& text : sensorLocations) {
+        unsigned int code = 0;
+        if (!parseLocation(text, code)) {
+            complain("--sensors: bad location '" + text + "' (a number from 0 to " +
+                     std::to_string(kLastLocation) + ", or one of " + locationNames() + ")");
+            return kExitUsage;
+        }
+        if (std::find(extra.locations.begin(), extra.locations.end(), code) ==
+            extra.locations.end()) {
+            extra.locations.push_back(code);
+        }
+    }
+
     // Read the dump before anything is created, so that an unreadable file
-    // is a command-line error.
+    // is a command-line error. A --dump-bin file becomes the text of an
+    // override file, as --dump would have given it.
     std::string dumpContent;
     if (!dumpFile.empty()) {
         std::string why;
@@ -354,7 +530,22 @@ int run(int argc, char** argv) {
             complain("--dump: " + why);
             return kExitUsage;
         }
+    } else if (!binFile.empty()) {
+        std::string bytes;
+        std::string why;
+        if (!readWholeFile(binFile, bytes, why)) {
+            complain("--from-bin: " + why);
+            return kExitUsage;
+        }
+        smbiosdump::DumpImage image;
+        if (!smbiosdump::readDumpBin(std::vector<std::uint8_t>(bytes.begin(), bytes.end()), image,
+                                     why)) {
+            complain("--from-bin: " + binFile + ": " + why);
+            return kExitUsage;
+        }
+        dumpContent = smbiosdump::formatOverride(image.header, image.table);
     }
+    bool const onDump = !dumpFile.empty() || !binFile.empty();
 
     if (!dataDir.empty() && !setEnvironment("KESTREL_DATA_DIR", dataDir)) {
         return kExitFailure;
@@ -366,7 +557,7 @@ int run(int argc, char** argv) {
     // A dump runs in a private data directory whose override file is a copy
     // of it; the real data directory is left alone.
     TemporaryDataDir temporary;
-    if (!dumpFile.empty()) {
+    if (onDump) {
         std::string why;
         if (!temporary.create(why)) {
             complain(why);
@@ -396,7 +587,7 @@ int run(int argc, char** argv) {
     }
 
     std::vector<IC::Node*> nodes;
-    int status = loadInventory(pluginPath, nodes);
+    int status = loadInventory(pluginPath, extra, nodes);
     if (status != 0) {
         return status;
     }

@@ -4,59 +4,23 @@
 #include <fcntl.h>
 #include <spawn.h>
 #include <stdlib.h>
-#include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
 #include <algorithm>
-#include <cstdio>
+#include <cstdint>
 #include <cstring>
-#include <filesystem>
+#include <exception>
+#include <memory>
 #include <sstream>
+
+#include "TestSupport.h"
 
 extern char** environ;
 
 namespace hosttest {
 
 namespace {
-
-std::string tempBase() {
-    char const* base = std::getenv("TMPDIR");
-    std::string folder = (base != nullptr && *base != '\0') ? base : "/tmp";
-    if (folder.back() != '/') {
-        folder += '/';
-    }
-    return folder;
-}
-
-// A file that takes one output of the child; it is removed when done.
-class CaptureFile {
-public:
-    CaptureFile() {
-        std::string pattern = tempBase() + "host-capture.XXXXXX";
-        std::vector<char> buffer(pattern.begin(), pattern.end());
-        buffer.push_back('\0');
-        fd_ = mkstemp(buffer.data());
-        if (fd_ >= 0) {
-            path_ = buffer.data();
-        }
-    }
-    ~CaptureFile() {
-        if (fd_ >= 0) {
-            close(fd_);
-            unlink(path_.c_str());
-        }
-    }
-    CaptureFile(CaptureFile const&) = delete;
-    CaptureFile& operator=(CaptureFile const&) = delete;
-
-    int fd() const { return fd_; }
-    std::string content() const { return readFile(path_); }
-
-private:
-    int fd_ = -1;
-    std::string path_;
-};
 
 std::vector<std::string> childEnvironment(Environment const& environment) {
     std::vector<std::string> entries;
@@ -83,17 +47,26 @@ std::string outDir() {
     return dir != nullptr ? dir : "";
 }
 
+std::string sourceDir() {
+    char const* dir = std::getenv("SMBIOS_SOURCE_DIR");
+    return dir != nullptr ? dir : "";
+}
+
 std::string hostPath() { return outDir() + "/smbios-inventory"; }
 
 RunResult runProgram(std::string const& program, std::vector<std::string> const& args,
                      Environment const& environment) {
     RunResult result;
-    CaptureFile out;
-    CaptureFile err;
-    if (out.fd() < 0 || err.fd() < 0) {
-        result.startError = std::string("cannot create capture files: ") + std::strerror(errno);
+    // The child's outputs go to two files of a private folder.
+    std::unique_ptr<smbiostest::TempDir> captures;
+    try {
+        captures.reset(new smbiostest::TempDir());
+    } catch (std::exception const& error) {
+        result.startError = std::string("cannot create the capture folder: ") + error.what();
         return result;
     }
+    std::string const outPath = captures->file("stdout");
+    std::string const errPath = captures->file("stderr");
 
     std::vector<std::string> argStrings;
     argStrings.push_back(program);
@@ -114,8 +87,10 @@ RunResult runProgram(std::string const& program, std::vector<std::string> const&
     posix_spawn_file_actions_t actions;
     posix_spawn_file_actions_init(&actions);
     posix_spawn_file_actions_addopen(&actions, STDIN_FILENO, "/dev/null", O_RDONLY, 0);
-    posix_spawn_file_actions_adddup2(&actions, out.fd(), STDOUT_FILENO);
-    posix_spawn_file_actions_adddup2(&actions, err.fd(), STDERR_FILENO);
+    posix_spawn_file_actions_addopen(&actions, STDOUT_FILENO, outPath.c_str(),
+                                     O_WRONLY | O_CREAT | O_TRUNC, 0600);
+    posix_spawn_file_actions_addopen(&actions, STDERR_FILENO, errPath.c_str(),
+                                     O_WRONLY | O_CREAT | O_TRUNC, 0600);
 
     pid_t pid = 0;
     int spawned = posix_spawn(&pid, program.c_str(), &actions, nullptr, argv.data(), envp.data());
@@ -139,8 +114,8 @@ RunResult runProgram(std::string const& program, std::vector<std::string> const&
     } else if (WIFSIGNALED(status)) {
         result.signal = WTERMSIG(status);
     }
-    result.out = out.content();
-    result.err = err.content();
+    result.out = fileText(outPath);
+    result.err = fileText(errPath);
     return result;
 }
 
@@ -161,52 +136,9 @@ std::string describe(RunResult const& result) {
     return text.str();
 }
 
-TempDir::TempDir() {
-    std::string pattern = tempBase() + "host-test.XXXXXX";
-    std::vector<char> buffer(pattern.begin(), pattern.end());
-    buffer.push_back('\0');
-    if (mkdtemp(buffer.data()) != nullptr) {
-        path_ = buffer.data();
-    }
-}
-
-TempDir::~TempDir() {
-    if (!path_.empty()) {
-        std::error_code ignored;
-        std::filesystem::remove_all(path_, ignored);
-    }
-}
-
-std::string TempDir::file(std::string const& name) const { return path_ + "/" + name; }
-
-std::string readFile(std::string const& path) {
-    std::FILE* file = std::fopen(path.c_str(), "rb");
-    if (file == nullptr) {
-        return std::string();
-    }
-    std::string content;
-    char buffer[65536];
-    size_t count = 0;
-    while ((count = std::fread(buffer, 1, sizeof buffer, file)) > 0) {
-        content.append(buffer, count);
-    }
-    std::fclose(file);
-    return content;
-}
-
-bool writeFile(std::string const& path, std::string const& content) {
-    std::FILE* file = std::fopen(path.c_str(), "wb");
-    if (file == nullptr) {
-        return false;
-    }
-    bool ok = std::fwrite(content.data(), 1, content.size(), file) == content.size();
-    ok = std::fclose(file) == 0 && ok;
-    return ok;
-}
-
-bool pathExists(std::string const& path) {
-    struct stat info;
-    return stat(path.c_str(), &info) == 0;
+std::string fileText(std::string const& path) {
+    std::vector<uint8_t> const bytes = smbiostest::fileBytes(path);
+    return std::string(bytes.begin(), bytes.end());
 }
 
 }  // namespace hosttest

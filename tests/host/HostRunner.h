@@ -31,6 +31,9 @@ struct Environment {
 // it is not set.
 std::string outDir();
 
+// SMBIOS_SOURCE_DIR, the root of the repository; "" when it is not set.
+std::string sourceDir();
+
 // The built smbios-inventory in SMBIOS_OUT_DIR.
 std::string hostPath();
 
@@ -46,28 +49,8 @@ RunResult runHost(std::vector<std::string> const& args,
 // A readable account of a run, for failure messages.
 std::string describe(RunResult const& result);
 
-// A private folder that is removed with everything in it when the object
-// goes away.
-class TempDir {
-public:
-    TempDir();
-    ~TempDir();
-    TempDir(TempDir const&) = delete;
-    TempDir& operator=(TempDir const&) = delete;
-
-    // The folder, without a trailing separator; "" when it could not be made.
-    std::string const& path() const { return path_; }
-    // path() + "/" + name.
-    std::string file(std::string const& name) const;
-
-private:
-    std::string path_;
-};
-
-// The whole content of a file; "" when it cannot be read.
-std::string readFile(std::string const& path);
-// Writes content to path; returns false when it cannot.
-bool writeFile(std::string const& path, std::string const& content);
-bool pathExists(std::string const& path);
+// The whole file as text; throws std::runtime_error when it cannot be read
+// (smbiostest::fileBytes).
+std::string fileText(std::string const& path);
 
 }  // namespace hosttest

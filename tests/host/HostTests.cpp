@@ -13,8 +13,10 @@
 #include <string>
 #include <vector>
 
+#include "DumpFormat.h"
 #include "FakePluginIds.h"
 #include "HostRunner.h"
+#include "TestSupport.h"
 
 namespace {
 
@@ -58,9 +60,9 @@ protected:
     void SetUp() override {
         ASSERT_FALSE(hosttest::outDir().empty())
             << "SMBIOS_OUT_DIR is not set; run the tests through ctest";
-        ASSERT_TRUE(hosttest::pathExists(hosttest::hostPath()))
+        ASSERT_TRUE(std::filesystem::exists(hosttest::hostPath()))
             << "smbios-inventory is not built: " << hosttest::hostPath();
-        ASSERT_TRUE(hosttest::pathExists(fakePlugin()))
+        ASSERT_TRUE(std::filesystem::exists(fakePlugin()))
             << "the fake plug-in is not built: " << fakePlugin();
     }
 
@@ -360,23 +362,20 @@ TEST_F(HostTest, BadFormatExitsTwo) {
 TEST_F(HostTest, MissingOptionValueExitsTwo) { expectUsageError({"--format"}, "--format"); }
 
 TEST_F(HostTest, MissingDumpFileExitsTwo) {
-    hosttest::TempDir folder;
-    ASSERT_FALSE(folder.path().empty());
+    smbiostest::TempDir folder;
     std::string const missing = folder.file("no-such-dump.txt");
     expectUsageError({"--plugin", fakePlugin(), "--dump", missing}, "no-such-dump.txt");
 }
 
 TEST_F(HostTest, DumpThatIsAFolderExitsTwo) {
-    hosttest::TempDir folder;
-    ASSERT_FALSE(folder.path().empty());
+    smbiostest::TempDir folder;
     expectUsageError({"--plugin", fakePlugin(), "--dump", folder.path()}, "--dump");
 }
 
 TEST_F(HostTest, DumpWithDataDirExitsTwo) {
-    hosttest::TempDir folder;
-    ASSERT_FALSE(folder.path().empty());
+    smbiostest::TempDir folder;
     std::string const dump = folder.file("smbios.txt");
-    ASSERT_TRUE(hosttest::writeFile(dump, "<SHOWSMBIOS>\n</SHOWSMBIOS>\n"));
+    smbiostest::writeFile(dump, "<SHOWSMBIOS>\n</SHOWSMBIOS>\n");
     expectUsageError({"--plugin", fakePlugin(), "--dump", dump, "--data-dir", folder.path()},
                      "--data-dir");
     EXPECT_EQ(folderEntries(folder.path()), std::vector<std::string>{"smbios.txt"});
@@ -405,11 +404,83 @@ TEST_F(HostTest, HelpListsTheOptionsAndExitsZero) {
     }
 }
 
+// ---- --sensors, --bmc and --from-bin on the command line --------------------
+
+TEST_F(HostTest, SensorsWithUnknownLocationExitsTwo) {
+    for (char const* location :
+         {"cpu", "Processor", "32", "0x20", "-1", "3x", "0x", "0x1g", "", " 3", "0x0000020"}) {
+        SCOPED_TRACE(std::string("location '") + location + "'");
+        expectUsageError({"--plugin", fakePlugin(), "--sensors", location}, "--sensors");
+    }
+}
+
+TEST_F(HostTest, SensorsWithoutLocationExitsTwo) {
+    expectUsageError({"--plugin", fakePlugin(), "--sensors"}, "--sensors");
+}
+
+TEST_F(HostTest, HelpListsTheExtraNodeOptionsAndLocationNames) {
+    RunResult run = hosttest::runHost({"--help"});
+    EXPECT_EQ(run.exitStatus, 0) << hosttest::describe(run);
+    for (char const* text : {"--sensors", "--bmc", "--from-bin", "processor", "drive-back-plane"}) {
+        EXPECT_NE(run.out.find(text), std::string::npos) << text << " in\n" << run.out;
+    }
+}
+
+TEST_F(HostTest, FromBinWithDumpOrDataDirExitsTwo) {
+    smbiostest::TempDir folder;
+    std::string const file = folder.file("machine.bin");
+    smbiostest::writeFile(file, "_SM_");
+    for (std::string const excluded : {"--dump", "--data-dir"}) {
+        SCOPED_TRACE(excluded);
+        expectUsageError({"--plugin", fakePlugin(), "--from-bin", file, excluded,
+                          excluded == "--dump" ? file : folder.path()},
+                         excluded);
+    }
+    // Nothing was written beside the file.
+    EXPECT_EQ(folderEntries(folder.path()), std::vector<std::string>{"machine.bin"});
+}
+
+TEST_F(HostTest, MissingFromBinFileExitsTwo) {
+    smbiostest::TempDir folder;
+    expectUsageError({"--plugin", fakePlugin(), "--from-bin", folder.file("no-such-dump.bin")},
+                     "no-such-dump.bin");
+}
+
+TEST_F(HostTest, FromBinFileThatIsNoDumpBinExitsTwoWithItsReason) {
+    smbiostest::TempDir folder;
+    std::string const file = folder.file("notes.bin");
+    std::string const content = "these are notes, not a table\n";
+    smbiostest::writeFile(file, content);
+    smbiosdump::DumpImage image;
+    std::string reason;
+    ASSERT_FALSE(smbiosdump::readDumpBin(std::vector<uint8_t>(content.begin(), content.end()),
+                                         image, reason));
+    ASSERT_FALSE(reason.empty());
+    expectUsageError({"--plugin", fakePlugin(), "--from-bin", file}, reason);
+    EXPECT_NE(hosttest::runHost({"--plugin", fakePlugin(), "--from-bin", file}).err.find(file),
+              std::string::npos);
+}
+
+TEST_F(HostTest, SensorsWithPluginLackingTheExtraEntryPointExitsOne) {
+    RunResult run = hosttest::runHost({"--plugin", fakePlugin(), "--sensors", "processor"});
+    EXPECT_EQ(run.exitStatus, 1) << hosttest::describe(run);
+    EXPECT_NE(run.err.find("no SmBiosMIExtraNodes entry point"), std::string::npos)
+        << hosttest::describe(run);
+    EXPECT_EQ(run.out, "");
+}
+
+TEST_F(HostTest, BmcWithPluginLackingTheExtraEntryPointExitsOne) {
+    RunResult run = hosttest::runHost({"--plugin", fakePlugin(), "--format", "json", "--bmc"});
+    EXPECT_EQ(run.exitStatus, 1) << hosttest::describe(run);
+    EXPECT_NE(run.err.find("no SmBiosMIExtraNodes entry point"), std::string::npos)
+        << hosttest::describe(run);
+    EXPECT_EQ(run.out, "");
+}
+
 // ---- failures of the plug-in ------------------------------------------------
 
 TEST_F(HostTest, MissingPluginExitsOneAndSaysWhy) {
-    hosttest::TempDir folder;
-    ASSERT_FALSE(folder.path().empty());
+    smbiostest::TempDir folder;
     std::string const missing = folder.file("libnothing.so");
     RunResult run = hosttest::runHost({"--plugin", missing});
     EXPECT_EQ(run.exitStatus, 1) << hosttest::describe(run);
@@ -421,7 +492,7 @@ TEST_F(HostTest, MissingPluginExitsOneAndSaysWhy) {
 TEST_F(HostTest, PluginWithoutOpenMIExitsOne) {
     // The platform library is a shared library without the entry point.
     std::string const library = hosttest::outDir() + "/libkestrel.so";
-    ASSERT_TRUE(hosttest::pathExists(library)) << library;
+    ASSERT_TRUE(std::filesystem::exists(library)) << library;
     RunResult run = hosttest::runHost({"--plugin", library});
     EXPECT_EQ(run.exitStatus, 1) << hosttest::describe(run);
     EXPECT_NE(run.err.find("no OpenMI"), std::string::npos) << hosttest::describe(run);
@@ -463,16 +534,13 @@ TEST_F(HostTest, InitializeFailureExitsOneWithStatusAndMessage) {
 // ---- environment of the plug-in ---------------------------------------------
 
 TEST_F(HostTest, DumpRunsOnACopyInAPrivateDataDirThatIsRemovedAfterwards) {
-    hosttest::TempDir input;
-    hosttest::TempDir temporary;
-    hosttest::TempDir realData;
-    ASSERT_FALSE(input.path().empty());
-    ASSERT_FALSE(temporary.path().empty());
-    ASSERT_FALSE(realData.path().empty());
+    smbiostest::TempDir input;
+    smbiostest::TempDir temporary;
+    smbiostest::TempDir realData;
     std::string const content =
         "<SHOWSMBIOS> first line of the dump\n<EPHEADER>\n5F534D5F\n</EPHEADER>\n</SHOWSMBIOS>\n";
     std::string const dump = input.file("machine.txt");
-    ASSERT_TRUE(hosttest::writeFile(dump, content));
+    smbiostest::writeFile(dump, content);
 
     Environment environment;
     environment.set["TMPDIR"] = temporary.path();
@@ -491,19 +559,17 @@ TEST_F(HostTest, DumpRunsOnACopyInAPrivateDataDirThatIsRemovedAfterwards) {
     EXPECT_EQ(property(kRootNode, kOverrideSizeProperty)["value"], content.size());
 
     // Gone after the run; the real data directory was never touched.
-    EXPECT_FALSE(hosttest::pathExists(dir)) << dir;
+    EXPECT_FALSE(std::filesystem::exists(dir)) << dir;
     EXPECT_TRUE(folderEntries(temporary.path()).empty());
     EXPECT_TRUE(folderEntries(realData.path()).empty());
-    EXPECT_EQ(hosttest::readFile(dump), content);
+    EXPECT_EQ(hosttest::fileText(dump), content);
 }
 
 TEST_F(HostTest, DumpTemporaryFolderIsRemovedWhenThePluginFails) {
-    hosttest::TempDir input;
-    hosttest::TempDir temporary;
-    ASSERT_FALSE(input.path().empty());
-    ASSERT_FALSE(temporary.path().empty());
+    smbiostest::TempDir input;
+    smbiostest::TempDir temporary;
     std::string const dump = input.file("machine.txt");
-    ASSERT_TRUE(hosttest::writeFile(dump, "<SHOWSMBIOS>\n</SHOWSMBIOS>\n"));
+    smbiostest::writeFile(dump, "<SHOWSMBIOS>\n</SHOWSMBIOS>\n");
 
     Environment environment;
     environment.set["TMPDIR"] = temporary.path();
@@ -514,10 +580,8 @@ TEST_F(HostTest, DumpTemporaryFolderIsRemovedWhenThePluginFails) {
 }
 
 TEST_F(HostTest, DataDirAndCodeDirReachThePlugin) {
-    hosttest::TempDir data;
-    hosttest::TempDir code;
-    ASSERT_FALSE(data.path().empty());
-    ASSERT_FALSE(code.path().empty());
+    smbiostest::TempDir data;
+    smbiostest::TempDir code;
     ASSERT_NO_FATAL_FAILURE(
         runJson({"--data-dir", data.path() + "/", "--code-dir", code.path() + "/"}, Environment()));
     EXPECT_EQ(property(kRootNode, kDataDirProperty)["value"], data.path() + "/");
@@ -529,35 +593,32 @@ TEST_F(HostTest, DataDirAndCodeDirReachThePlugin) {
 // ---- logging ----------------------------------------------------------------
 
 TEST_F(HostTest, LogOptionsSendPluginMessagesToTheLogFile) {
-    hosttest::TempDir folder;
-    ASSERT_FALSE(folder.path().empty());
+    smbiostest::TempDir folder;
     std::string const log = folder.file("host.log");
     ASSERT_NO_FATAL_FAILURE(
         runJson({"--log", log, "--log-level", "0", "--trace-level", "off"}, Environment()));
-    std::string const text = hosttest::readFile(log);
+    std::string const text = hosttest::fileText(log);
     EXPECT_NE(text.find(kLogText), std::string::npos) << text;
     EXPECT_EQ(text.find(kTraceText), std::string::npos) << text;
     EXPECT_EQ(run_.err.find(kLogText), std::string::npos) << run_.err;
 }
 
 TEST_F(HostTest, TraceLevelSendsTraceMessagesToTheLogFile) {
-    hosttest::TempDir folder;
-    ASSERT_FALSE(folder.path().empty());
+    smbiostest::TempDir folder;
     std::string const log = folder.file("host.log");
     ASSERT_NO_FATAL_FAILURE(
         runJson({"--log", log, "--log-level", "off", "--trace-level", "5000"}, Environment()));
-    std::string const text = hosttest::readFile(log);
+    std::string const text = hosttest::fileText(log);
     EXPECT_NE(text.find(kTraceText), std::string::npos) << text;
     EXPECT_EQ(text.find(kLogText), std::string::npos) << text;
 }
 
 TEST_F(HostTest, LogLevelAboveTheMessagesWritesNone) {
-    hosttest::TempDir folder;
-    ASSERT_FALSE(folder.path().empty());
+    smbiostest::TempDir folder;
     std::string const log = folder.file("host.log");
     ASSERT_NO_FATAL_FAILURE(
         runJson({"--log", log, "--log-level", "5001", "--trace-level", "off"}, Environment()));
-    std::string const text = hosttest::readFile(log);
+    std::string const text = hosttest::fileText(log);
     EXPECT_EQ(text.find(kLogText), std::string::npos) << text;
 }
 
@@ -569,7 +630,6 @@ class InstalledHostTest : public HostTest {
 protected:
     void SetUp() override {
         ASSERT_NO_FATAL_FAILURE(HostTest::SetUp());
-        ASSERT_FALSE(prefix_.path().empty());
         namespace fs = std::filesystem;
         fs::create_directories(prefix_.file("bin"));
         fs::create_directories(prefix_.file("lib"));
@@ -599,7 +659,7 @@ protected:
         return std::string();
     }
 
-    hosttest::TempDir prefix_;
+    smbiostest::TempDir prefix_;
     std::string host_;
     Environment environment_;
 };

@@ -110,6 +110,15 @@ TEST(InventoryRender, FormatValueGivesShortestDoublesAndSignedEnums) {
               "{\"a\\x0A\"}");
 }
 
+TEST(InventoryRender, FormatValueWritesWholeDoublesWithoutExponent) {
+    using IC::PropertyValue;
+    EXPECT_EQ(inventory::formatValue(PropertyValue(IC::Number(40.0), false)), "40");
+    EXPECT_EQ(inventory::formatValue(PropertyValue(IC::Number(100.0), false)), "100");
+    EXPECT_EQ(inventory::formatValue(PropertyValue(IC::Number(3276.8), false)), "3276.8");
+    EXPECT_EQ(inventory::formatValue(PropertyValue(IC::Number(0.0), false)), "0");
+    EXPECT_EQ(inventory::formatValue(PropertyValue(IC::Number(1e-7), false)), "1e-07");
+}
+
 TEST(InventoryRender, JsonOfAnEmptyListIsAnEmptyNodeArray) {
     EXPECT_EQ(inventory::renderJson({}), "{\n  \"nodes\": []\n}\n");
 }

@@ -10,10 +10,9 @@
 #include "PlatformTestHelpers.h"
 #include "SD/PlatformUtilities.h"
 
-using platform_test::ScopedEnv;
-using platform_test::ScratchFile;
 using SD::_FileHandle;
 using SD::PlatformUtilities;
+using smbiostest::ScopedEnv;
 
 namespace {
 
@@ -49,6 +48,14 @@ std::vector<std::string> readAll(std::string const& path) {
     EXPECT_EQ(0, PlatformUtilities::closeFile(&file));
     EXPECT_EQ(nullptr, file);
     return result;
+}
+
+// The lines readLine gives for a file with this content.
+std::vector<std::string> linesOf(std::string const& content) {
+    smbiostest::TempDir scratch;
+    std::string const file = scratch.file("lines.txt");
+    smbiostest::writeFile(file, content);
+    return readAll(file);
 }
 
 }  // namespace
@@ -100,9 +107,10 @@ TEST(PlatformUtilities, CodeDirDefaultWhenUnset) {
 TEST(PlatformUtilities, SeparatorIsSlash) { EXPECT_EQ('/', PlatformUtilities::getSeparator()); }
 
 TEST(PlatformUtilities, OpenMissingFileReportsErrno) {
-    ScratchFile missing("never-written");
-    _FileHandle* file = reinterpret_cast<_FileHandle*>(&missing);
-    EXPECT_EQ(ENOENT, PlatformUtilities::openFile(missing.path().c_str(), &file, 0, 0));
+    smbiostest::TempDir scratch;
+    std::string const missing = scratch.file("never-written");
+    _FileHandle* file = reinterpret_cast<_FileHandle*>(&scratch);
+    EXPECT_EQ(ENOENT, PlatformUtilities::openFile(missing.c_str(), &file, 0, 0));
     EXPECT_EQ(nullptr, file);
 }
 
@@ -113,46 +121,31 @@ TEST(PlatformUtilities, OpenNullPathIsInvalid) {
 }
 
 TEST(PlatformUtilities, ReadLineStripsLineFeeds) {
-    ScratchFile file("lf.txt");
-    file.write("first\nsecond\nthird\n");
-    EXPECT_EQ((std::vector<std::string>{"first", "second", "third"}), readAll(file.path()));
+    EXPECT_EQ((std::vector<std::string>{"first", "second", "third"}),
+              linesOf("first\nsecond\nthird\n"));
 }
 
 TEST(PlatformUtilities, ReadLineStripsCarriageReturnLineFeeds) {
-    ScratchFile file("crlf.txt");
-    file.write("first\r\nsecond\r\n");
-    EXPECT_EQ((std::vector<std::string>{"first", "second"}), readAll(file.path()));
+    EXPECT_EQ((std::vector<std::string>{"first", "second"}), linesOf("first\r\nsecond\r\n"));
 }
 
 TEST(PlatformUtilities, ReadLineStripsFinalLoneCarriageReturn) {
-    ScratchFile file("cr.txt");
-    file.write("first\nlast\r");
-    EXPECT_EQ((std::vector<std::string>{"first", "last"}), readAll(file.path()));
+    EXPECT_EQ((std::vector<std::string>{"first", "last"}), linesOf("first\nlast\r"));
 }
 
 TEST(PlatformUtilities, ReadLineReturnsEmptyLinesAsEmptyStrings) {
-    ScratchFile file("empty-lines.txt");
-    file.write("a\n\n\r\nb\n");
-    EXPECT_EQ((std::vector<std::string>{"a", "", "", "b"}), readAll(file.path()));
+    EXPECT_EQ((std::vector<std::string>{"a", "", "", "b"}), linesOf("a\n\n\r\nb\n"));
 }
 
 TEST(PlatformUtilities, ReadLineReturnsLastLineWithoutTerminator) {
-    ScratchFile file("no-final-newline.txt");
-    file.write("a\nlast");
-    EXPECT_EQ((std::vector<std::string>{"a", "last"}), readAll(file.path()));
+    EXPECT_EQ((std::vector<std::string>{"a", "last"}), linesOf("a\nlast"));
 }
 
-TEST(PlatformUtilities, ReadLineOfEmptyFileEndsAtOnce) {
-    ScratchFile file("empty.txt");
-    file.write("");
-    EXPECT_TRUE(readAll(file.path()).empty());
-}
+TEST(PlatformUtilities, ReadLineOfEmptyFileEndsAtOnce) { EXPECT_TRUE(linesOf("").empty()); }
 
 TEST(PlatformUtilities, ReadLineReadsLongLines) {
     std::string const longLine(10000, 'x');
-    ScratchFile file("long.txt");
-    file.write(longLine + "\nshort\n" + longLine);
-    std::vector<std::string> const read = readAll(file.path());
+    std::vector<std::string> const read = linesOf(longLine + "\nshort\n" + longLine);
     ASSERT_EQ(3u, read.size());
     EXPECT_EQ(longLine, read[0]);
     EXPECT_EQ("short", read[1]);
@@ -160,10 +153,11 @@ TEST(PlatformUtilities, ReadLineReadsLongLines) {
 }
 
 TEST(PlatformUtilities, ReadLineSetsLength) {
-    ScratchFile file("length.txt");
-    file.write("abc\r\n\n");
+    smbiostest::TempDir scratch;
+    std::string const file = scratch.file("length.txt");
+    smbiostest::writeFile(file, "abc\r\n\n");
     _FileHandle* handle = nullptr;
-    ASSERT_EQ(0, PlatformUtilities::openFile(file.path().c_str(), &handle, 0, 0));
+    ASSERT_EQ(0, PlatformUtilities::openFile(file.c_str(), &handle, 0, 0));
     int length = -1;
     char* line = PlatformUtilities::readLine(handle, length);
     ASSERT_NE(nullptr, line);

@@ -17,7 +17,7 @@
 
 extern char** environ;
 
-using platform_test::ScratchFile;
+using platform_test::fileText;
 using QNLog::LEVEL_OFF;
 using QNLog::QNLogger;
 using QNLog::QNLogRecord;
@@ -66,7 +66,7 @@ protected:
     void SetUp() override {
         QNLogger::setLogLevel(LEVEL_OFF);
         QNLogger::setTraceLevel(LEVEL_OFF);
-        ASSERT_TRUE(QNLogger::setLogFile(logFile_.path()));
+        ASSERT_TRUE(QNLogger::setLogFile(logFile_));
     }
     void TearDown() override {
         QNLogger::stopCapture();
@@ -76,7 +76,8 @@ protected:
         QNLogger::setTraceLevel(LEVEL_OFF);
     }
 
-    ScratchFile logFile_{"qnlog.log"};
+    smbiostest::TempDir scratch_;
+    std::string const logFile_ = scratch_.file("qnlog.log");
 };
 
 }  // namespace
@@ -117,7 +118,7 @@ TEST_F(QNLoggerTest, MessageBelowThresholdIsNotWritten) {
     logAt(4999, "below-threshold");
     logAt(5000, "at-threshold");
     logAt(6000, "above-threshold");
-    std::string const text = logFile_.read();
+    std::string const text = fileText(logFile_);
     EXPECT_FALSE(contains(text, "below-threshold")) << text;
     EXPECT_TRUE(contains(text, "at-threshold")) << text;
     EXPECT_TRUE(contains(text, "above-threshold")) << text;
@@ -127,7 +128,7 @@ TEST_F(QNLoggerTest, MessageBelowThresholdIsNotWritten) {
 TEST_F(QNLoggerTest, LineNamesOutputLevelLoggerFunctionFileBaseNameAndText) {
     QNLogger::setLogLevel(5000);
     logAt(6000, "hello world", "/some/folder/Source.cpp", 42);
-    std::vector<std::string> const written = lines(logFile_.read());
+    std::vector<std::string> const written = lines(fileText(logFile_));
     ASSERT_EQ(1u, written.size());
     EXPECT_TRUE(std::regex_match(
         written[0], std::regex(R"(\d{4}-\d{2}-\d{2}T\d{2}:\d{2}:\d{2}\.\d{3} )"
@@ -142,7 +143,7 @@ TEST_F(QNLoggerTest, TraceHasItsOwnThreshold) {
     traceAt(3000, "trace-written");
     traceAt(2999, "trace-below");
     logAt(6000, "log-off");
-    std::vector<std::string> const written = lines(logFile_.read());
+    std::vector<std::string> const written = lines(fileText(logFile_));
     ASSERT_EQ(1u, written.size());
     EXPECT_TRUE(contains(written[0], " trace 3000 TestLogger tracer Traced.cpp:7 trace-written"))
         << written[0];
@@ -153,7 +154,7 @@ TEST_F(QNLoggerTest, OffThresholdTakesNoLevel) {
     EXPECT_FALSE(QNLogger::isLogEnabled(INT_MAX));
     EXPECT_FALSE(QNLogger::isTraceEnabled(INT_MAX));
     logAt(INT_MAX, "never-written");
-    EXPECT_EQ("", logFile_.read());
+    EXPECT_EQ("", fileText(logFile_));
 }
 
 TEST_F(QNLoggerTest, LevelEnabledWhenEitherOutputOrCaptureTakesIt) {
@@ -194,7 +195,7 @@ TEST_F(QNLoggerTest, CaptureRecordsBothOutputsWhateverThresholds) {
     EXPECT_EQ(1u, QNLogger::capturedCount("captured"));
     EXPECT_EQ(1u, QNLogger::capturedCount("captured", "trace"));
     EXPECT_EQ(0u, QNLogger::capturedCount("absent", "log"));
-    EXPECT_EQ("", logFile_.read());  // both outputs are off
+    EXPECT_EQ("", fileText(logFile_));  // both outputs are off
 }
 
 TEST_F(QNLoggerTest, CaptureAlsoWritesWhenOutputTakesLevel) {
@@ -203,7 +204,7 @@ TEST_F(QNLoggerTest, CaptureAlsoWritesWhenOutputTakesLevel) {
     logAt(6000, "both-ways");
     QNLogger::stopCapture();
     EXPECT_EQ(1u, QNLogger::capturedCount("both-ways"));
-    EXPECT_TRUE(contains(logFile_.read(), "both-ways"));
+    EXPECT_TRUE(contains(fileText(logFile_), "both-ways"));
 }
 
 TEST_F(QNLoggerTest, StopCaptureKeepsRecordsAndTakesNoMore) {
@@ -238,23 +239,22 @@ TEST_F(QNLoggerTest, CapturedCountCountsEveryMatchingRecord) {
 }
 
 TEST_F(QNLoggerTest, SetLogFileAppendsToExistingContent) {
-    ScratchFile other("append.log");
-    other.write("earlier line\n");
-    ASSERT_TRUE(QNLogger::setLogFile(other.path()));
+    std::string const other = scratch_.file("append.log");
+    smbiostest::writeFile(other, "earlier line\n");
+    ASSERT_TRUE(QNLogger::setLogFile(other));
     QNLogger::setLogLevel(0);
     logAt(1, "appended line");
-    std::vector<std::string> const written = lines(other.read());
+    std::vector<std::string> const written = lines(fileText(other));
     ASSERT_EQ(2u, written.size());
     EXPECT_EQ("earlier line", written[0]);
     EXPECT_TRUE(contains(written[1], "appended line"));
 }
 
 TEST_F(QNLoggerTest, SetLogFileFailureKeepsCurrentFile) {
-    ScratchFile missingFolder("no-such-folder");
-    EXPECT_FALSE(QNLogger::setLogFile(missingFolder.path() + "/x.log"));
+    EXPECT_FALSE(QNLogger::setLogFile(scratch_.file("no-such-folder") + "/x.log"));
     QNLogger::setLogLevel(0);
     logAt(1, "still here");
-    EXPECT_TRUE(contains(logFile_.read(), "still here"));
+    EXPECT_TRUE(contains(fileText(logFile_), "still here"));
 }
 
 TEST_F(QNLoggerTest, ConcurrentMessagesStayWholeLines) {
@@ -272,7 +272,7 @@ TEST_F(QNLoggerTest, ConcurrentMessagesStayWholeLines) {
     for (std::thread& worker : workers) {
         worker.join();
     }
-    std::vector<std::string> const written = lines(logFile_.read());
+    std::vector<std::string> const written = lines(fileText(logFile_));
     ASSERT_EQ(static_cast<size_t>(threads * perThread), written.size());
     std::regex const whole(R"(\S+ log 1 TestLogger writer Source\.cpp:42 thread \d+ message \d+)");
     for (std::string const& line : written) {
@@ -307,14 +307,13 @@ ProbeRun runProbe(std::vector<std::string> const& settings) {
     }
     envp.push_back(nullptr);
 
-    ScratchFile out("probe.out");
-    ScratchFile err("probe.err");
+    smbiostest::TempDir scratch;
+    std::string const out = scratch.file("probe.out");
+    std::string const err = scratch.file("probe.err");
     posix_spawn_file_actions_t actions;
     posix_spawn_file_actions_init(&actions);
-    posix_spawn_file_actions_addopen(&actions, 1, out.path().c_str(), O_WRONLY | O_CREAT | O_TRUNC,
-                                     0600);
-    posix_spawn_file_actions_addopen(&actions, 2, err.path().c_str(), O_WRONLY | O_CREAT | O_TRUNC,
-                                     0600);
+    posix_spawn_file_actions_addopen(&actions, 1, out.c_str(), O_WRONLY | O_CREAT | O_TRUNC, 0600);
+    posix_spawn_file_actions_addopen(&actions, 2, err.c_str(), O_WRONLY | O_CREAT | O_TRUNC, 0600);
     char* argv[] = {&probe[0], nullptr};
     pid_t pid = 0;
     int const spawned = posix_spawn(&pid, probe.c_str(), &actions, nullptr, argv, envp.data());
@@ -327,8 +326,8 @@ ProbeRun runProbe(std::vector<std::string> const& settings) {
     if (waitpid(pid, &status, 0) == pid && WIFEXITED(status)) {
         run.status = WEXITSTATUS(status);
     }
-    run.out = out.read();
-    run.err = err.read();
+    run.out = fileText(out);
+    run.err = fileText(err);
     return run;
 }
 
@@ -345,13 +344,14 @@ TEST(QNLoggerEnvironment, DefaultsLogFrom5000ToStandardErrorAndTraceOff) {
 }
 
 TEST(QNLoggerEnvironment, LevelsAndFileComeFromEnvironment) {
-    ScratchFile logFile("env.log");
+    smbiostest::TempDir scratch;
+    std::string const logFile = scratch.file("env.log");
     ProbeRun const run =
-        runProbe({"QNLOG_LEVEL=50", "QNLOG_TRACE_LEVEL=5000", "QNLOG_FILE=" + logFile.path()});
+        runProbe({"QNLOG_LEVEL=50", "QNLOG_TRACE_LEVEL=5000", "QNLOG_FILE=" + logFile});
     ASSERT_EQ(0, run.status);
     EXPECT_EQ("log=50 trace=5000\n", run.out);
     EXPECT_EQ("", run.err);
-    std::string const text = logFile.read();
+    std::string const text = fileText(logFile);
     EXPECT_TRUE(contains(text, "probe-log-low")) << text;
     EXPECT_TRUE(contains(text, "probe-log-high")) << text;
     EXPECT_TRUE(contains(text, "probe-trace-high")) << text;
@@ -361,13 +361,14 @@ TEST(QNLoggerEnvironment, LevelsAndFileComeFromEnvironment) {
 }
 
 TEST(QNLoggerEnvironment, OffTurnsOutputOff) {
-    ScratchFile logFile("off.log");
+    smbiostest::TempDir scratch;
+    std::string const logFile = scratch.file("off.log");
     ProbeRun const run =
-        runProbe({"QNLOG_LEVEL=Off", "QNLOG_TRACE_LEVEL=off", "QNLOG_FILE=" + logFile.path()});
+        runProbe({"QNLOG_LEVEL=Off", "QNLOG_TRACE_LEVEL=off", "QNLOG_FILE=" + logFile});
     ASSERT_EQ(0, run.status);
     EXPECT_EQ("log=" + std::to_string(LEVEL_OFF) + " trace=" + std::to_string(LEVEL_OFF) + "\n",
               run.out);
-    EXPECT_EQ("", logFile.read());
+    EXPECT_EQ("", fileText(logFile));
 }
 
 TEST(QNLoggerEnvironment, InvalidValuesKeepDefaults) {

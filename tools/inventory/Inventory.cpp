@@ -2,6 +2,7 @@
 
 #include <cstdio>
 #include <cstdlib>
+#include <cstring>
 #include <map>
 #include <nlohmann/json.hpp>
 #include <utility>
@@ -50,15 +51,23 @@ void appendHexByte(std::string& out, unsigned char byte) {
 }
 
 std::string formatDouble(double value) {
-    // The shortest text that reads back as the same value.
+    // The shortest text that reads back as the same value, without an
+    // exponent when one of up to 17 digits does (40 rather than 4e+01).
+    std::string shortest;
     char buffer[64];
     for (int precision = 1; precision <= 17; ++precision) {
         std::snprintf(buffer, sizeof buffer, "%.*g", precision, value);
-        if (std::strtod(buffer, nullptr) == value) {
-            break;
+        if (std::strtod(buffer, nullptr) != value) {
+            continue;
+        }
+        if (std::strchr(buffer, 'e') == nullptr) {
+            return buffer;
+        }
+        if (shortest.empty()) {
+            shortest = buffer;
         }
     }
-    return buffer;
+    return shortest.empty() ? std::string(buffer) : shortest;
 }
 
 std::string formatNumber(IC::Number const& number) {
