@@ -35,7 +35,7 @@ build: $(BUILD)/CMakeCache.txt
 	$(CMAKE) --build $(BUILD) -j $(JOBS)
 
 demo: build
-	$(BUILD)/out/smbios-inventory --dump $(EXAMPLE)
+	$(BUILD)/out/smbios-inventory --dump $(EXAMPLE) --sensors processor --sensors disk --bmc
 
 test: build
 	$(CTEST) --test-dir $(BUILD) --output-on-failure -j $(JOBS)
