@@ -11,7 +11,6 @@
 // Exit status: 0 after writing, 1 when the input cannot be read or the file
 // cannot be written (nothing is written then), 2 for a wrong command line.
 
-#include <limits.h>
 #include <unistd.h>
 
 #include <CLI/CLI.hpp>
@@ -21,6 +20,7 @@
 #include <vector>
 
 #include "DumpFormat.h"
+#include "ToolSupport.h"
 #include "dump/DumpInput.h"
 #include "dump/DumpOutput.h"
 
@@ -28,45 +28,12 @@ namespace {
 
 char const kProgram[] = "smbios-dump";
 
-int const kExitFailure = 1;
-int const kExitUsage = 2;
-
 // Bytes of the table per line of the dump file: 64 hexadecimal digits.
 size_t const kBytesPerLine = 32;
 
-void complain(std::string const& message) { std::cerr << kProgram << ": " << message << std::endl; }
+void complain(std::string const& message) { smbiostool::complain(kProgram, message); }
 
-int usage(std::string const& message) {
-    complain(message + " (see --help)");
-    return kExitUsage;
-}
-
-// The folder that holds this program.
-std::string ownFolder() {
-    std::vector<char> buffer(PATH_MAX + 1);
-    ssize_t length = readlink("/proc/self/exe", buffer.data(), buffer.size() - 1);
-    if (length <= 0) {
-        return ".";
-    }
-    std::string path(buffer.data(), static_cast<size_t>(length));
-    size_t slash = path.rfind('/');
-    if (slash == std::string::npos) {
-        return ".";
-    }
-    return slash == 0 ? std::string("/") : path.substr(0, slash);
-}
-
-std::string oneLine(std::string message) {
-    while (!message.empty() && (message.back() == '\n' || message.back() == '\r')) {
-        message.pop_back();
-    }
-    for (char& c : message) {
-        if (c == '\n' || c == '\r') {
-            c = ' ';
-        }
-    }
-    return message;
-}
+int usage(std::string const& message) { return smbiostool::usage(kProgram, message); }
 
 bool writeToStandardOutput(std::string const& text) {
     std::fwrite(text.data(), 1, text.size(), stdout);
@@ -129,16 +96,9 @@ int run(int argc, char** argv) {
     outputOption->excludes(installOption);
     dataDirOption->needs(installOption);
 
-    try {
-        app.parse(argc, argv);
-    } catch (CLI::CallForHelp const&) {
-        std::cout << app.help();
-        return 0;
-    } catch (CLI::CallForAllHelp const&) {
-        std::cout << app.help("", CLI::AppFormatMode::All);
-        return 0;
-    } catch (CLI::ParseError const& error) {
-        return usage(oneLine(error.what()));
+    int exitStatus = 0;
+    if (!smbiostool::parseCommandLine(app, argc, argv, kProgram, exitStatus)) {
+        return exitStatus;
     }
 
     int const sources = (fromBinOption->count() > 0 ? 1 : 0) +
@@ -184,7 +144,7 @@ int run(int argc, char** argv) {
     }
     if (!toStandardOutput && !force && access(target.c_str(), F_OK) == 0) {
         complain(target + " exists; not replaced (use --force to replace it)");
-        return kExitFailure;
+        return smbiostool::EXIT_FAILED;
     }
 
     // The whole input, before anything is written.
@@ -195,7 +155,7 @@ int run(int argc, char** argv) {
         std::vector<uint8_t> bytes;
         if (!smbiosdump::readInputFile(path, bytes, error)) {
             complain(path + ": " + error);
-            return kExitFailure;
+            return smbiostool::EXIT_FAILED;
         }
         bool const captured =
             fromBinOption->count() > 0
@@ -203,17 +163,17 @@ int run(int argc, char** argv) {
                 : smbiosdump::captureFromTable(bytes, major, minor, capture, error);
         if (!captured) {
             complain(path + ": " + error);
-            return kExitFailure;
+            return smbiostool::EXIT_FAILED;
         }
     } else {
         std::string const library =
-            pmemPath.empty() ? smbiosdump::defaultPMemPath(ownFolder()) : pmemPath;
+            pmemPath.empty() ? smbiosdump::defaultPMemPath(smbiostool::ownFolder()) : pmemPath;
         if (!smbiosdump::captureFromMachine(library, capture, error)) {
             // The library's sources (the kernel's tables, /dev/mem) are
             // root's to read.
             complain("cannot read this machine's SMBIOS table: " + error +
                      (geteuid() != 0 ? " (reading physical memory usually needs root)" : ""));
-            return kExitFailure;
+            return smbiostool::EXIT_FAILED;
         }
     }
     std::string const text =
@@ -223,24 +183,24 @@ int run(int argc, char** argv) {
     if (toStandardOutput) {
         if (!writeToStandardOutput(text)) {
             complain("cannot write to standard output");
-            return kExitFailure;
+            return smbiostool::EXIT_FAILED;
         }
         std::cerr << kProgram << ": wrote standard output: " << summary << std::endl;
         return 0;
     }
     if (install && !smbiosdump::makeOverrideFolder(installDataDir, error)) {
         complain(error);
-        return kExitFailure;
+        return smbiostool::EXIT_FAILED;
     }
     switch (smbiosdump::writeFileAtomically(target, text, force, error)) {
         case smbiosdump::WriteResult::WRITTEN:
             break;
         case smbiosdump::WriteResult::EXISTS:
             complain(target + " exists; not replaced (use --force to replace it)");
-            return kExitFailure;
+            return smbiostool::EXIT_FAILED;
         case smbiosdump::WriteResult::FAILED:
             complain(error);
-            return kExitFailure;
+            return smbiostool::EXIT_FAILED;
     }
     std::cerr << kProgram << ": wrote " << target << ": " << summary << std::endl;
     return 0;
@@ -248,13 +208,4 @@ int run(int argc, char** argv) {
 
 }  // namespace
 
-int main(int argc, char** argv) {
-    try {
-        return run(argc, argv);
-    } catch (std::exception const& error) {
-        complain(std::string("unexpected failure: ") + error.what());
-    } catch (...) {
-        complain("unexpected failure");
-    }
-    return kExitFailure;
-}
+int main(int argc, char** argv) { return smbiostool::runMain(kProgram, run, argc, argv); }

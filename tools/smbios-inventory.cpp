@@ -6,7 +6,6 @@
 // fails, 2 for a wrong command line.
 
 #include <dlfcn.h>
-#include <limits.h>
 #include <stdlib.h>
 #include <unistd.h>
 
@@ -29,6 +28,7 @@
 #include "IC/Node.h"
 #include "IC/Number.h"
 #include "QNLog/QNLogger.h"
+#include "ToolSupport.h"
 #include "inventory/Inventory.h"
 
 namespace {
@@ -58,9 +58,6 @@ NamedLocation const kLocations[] = {
 };
 unsigned int const kLastLocation = 31;
 
-int const kExitFailure = 1;
-int const kExitUsage = 2;
-
 // The plug-in, its management interface and the error record it handed out
 // stay alive until the process ends: the nodes belong to the plug-in, and it
 // is never unloaded.
@@ -68,7 +65,7 @@ void* gPlugin = nullptr;
 IC::ManagementInterface* gInterface = nullptr;
 IC::Error* gOpenError = nullptr;
 
-void complain(std::string const& message) { std::cerr << kProgram << ": " << message << std::endl; }
+void complain(std::string const& message) { smbiostool::complain(kProgram, message); }
 
 // The private folder that stands in for the data directory when the host
 // runs on a dump file; it is removed with everything in it when the run
@@ -147,30 +144,10 @@ private:
     int saved_ = -1;
 };
 
-// The folder that holds this program.
-std::string ownFolder() {
-    std::vector<char> buffer(PATH_MAX + 1);
-    ssize_t length = readlink("/proc/self/exe", buffer.data(), buffer.size() - 1);
-    if (length <= 0) {
-        return ".";
-    }
-    std::string path(buffer.data(), static_cast<size_t>(length));
-    size_t slash = path.rfind('/');
-    if (slash == std::string::npos) {
-        return ".";
-    }
-    return slash == 0 ? std::string("/") : path.substr(0, slash);
-}
-
 // The plug-in beside this program, else the one in ../lib from it (an
 // installed program in PREFIX/bin and the plug-in in PREFIX/lib).
 std::string defaultPluginPath() {
-    std::string folder = ownFolder();
-    std::string beside = folder + "/" + kPluginName;
-    if (access(beside.c_str(), F_OK) == 0) {
-        return beside;
-    }
-    return folder + "/../lib/" + kPluginName;
+    return smbiostool::installedLibrary(smbiostool::ownFolder(), kPluginName);
 }
 
 bool readWholeFile(std::string const& path, std::string& content, std::string& why) {
@@ -303,7 +280,7 @@ int makeExtraNodes(ExtraNodesFunction extraNodes, ExtraNodes const& extra) {
     if (mapped.getStatus() != 0) {
         complain("getMap failed with status " + std::to_string(mapped.getStatus()) + ": " +
                  mapped.getMessage());
-        return kExitFailure;
+        return smbiostool::EXIT_FAILED;
     }
     unsigned int parentId = firstNodeOfType(nodes, kPlanarNodeType);
     if (parentId == 0) {
@@ -311,7 +288,7 @@ int makeExtraNodes(ExtraNodesFunction extraNodes, ExtraNodes const& extra) {
     }
     if (parentId == 0) {
         complain("the inventory has neither a planar nor a root node for the sensor and BMC nodes");
-        return kExitFailure;
+        return smbiostool::EXIT_FAILED;
     }
     int const made =
         extraNodes(parentId, extra.locations.data(),
@@ -319,7 +296,7 @@ int makeExtraNodes(ExtraNodesFunction extraNodes, ExtraNodes const& extra) {
     if (made != 0) {
         complain(std::string(kExtraNodesEntry) + " returned " + std::to_string(made) +
                  " for the parent node " + std::to_string(parentId));
-        return kExitFailure;
+        return smbiostool::EXIT_FAILED;
     }
     return 0;
 }
@@ -334,7 +311,7 @@ int loadInventory(std::string const& pluginPath, ExtraNodes const& extra,
     StdoutToStderr redirect;
     if (!redirect.active()) {
         complain(std::string("cannot redirect standard output: ") + std::strerror(errno));
-        return kExitFailure;
+        return smbiostool::EXIT_FAILED;
     }
 
     dlerror();
@@ -343,7 +320,7 @@ int loadInventory(std::string const& pluginPath, ExtraNodes const& extra,
         char const* why = dlerror();
         complain("cannot load the plug-in " + pluginPath + ": " +
                  (why != nullptr ? why : "unknown error"));
-        return kExitFailure;
+        return smbiostool::EXIT_FAILED;
     }
     dlerror();
     void* symbol = dlsym(gPlugin, "OpenMI");
@@ -351,7 +328,7 @@ int loadInventory(std::string const& pluginPath, ExtraNodes const& extra,
         char const* why = dlerror();
         complain("the plug-in " + pluginPath + " has no OpenMI entry point" +
                  (why != nullptr ? std::string(": ") + why : std::string()));
-        return kExitFailure;
+        return smbiostool::EXIT_FAILED;
     }
     IC::OpenMIFunction openMI = nullptr;
     static_assert(sizeof openMI == sizeof symbol, "function and data pointers differ in size");
@@ -366,7 +343,7 @@ int loadInventory(std::string const& pluginPath, ExtraNodes const& extra,
         if (extraSymbol == nullptr) {
             complain("the plug-in " + pluginPath + " has no " + kExtraNodesEntry +
                      " entry point, which --sensors and --bmc need");
-            return kExitFailure;
+            return smbiostool::EXIT_FAILED;
         }
         static_assert(sizeof extraNodes == sizeof extraSymbol,
                       "function and data pointers differ in size");
@@ -380,18 +357,18 @@ int loadInventory(std::string const& pluginPath, ExtraNodes const& extra,
             message += ": " + gOpenError->getMessage();
         }
         complain(message);
-        return kExitFailure;
+        return smbiostool::EXIT_FAILED;
     }
     if (gInterface == nullptr) {
         complain("OpenMI of " + pluginPath + " gave no management interface");
-        return kExitFailure;
+        return smbiostool::EXIT_FAILED;
     }
 
     IC::Error initialized = gInterface->initialize(1, IC::Number(0u), IC::Number(0u));
     if (initialized.getStatus() != 0) {
         complain("initialize failed with status " + std::to_string(initialized.getStatus()) + ": " +
                  initialized.getMessage());
-        return kExitFailure;
+        return smbiostool::EXIT_FAILED;
     }
     if (extraNodes != nullptr) {
         int const status = makeExtraNodes(extraNodes, extra);
@@ -403,7 +380,7 @@ int loadInventory(std::string const& pluginPath, ExtraNodes const& extra,
     if (mapped.getStatus() != 0) {
         complain("getMap failed with status " + std::to_string(mapped.getStatus()) + ": " +
                  mapped.getMessage());
-        return kExitFailure;
+        return smbiostool::EXIT_FAILED;
     }
     redirect.end();
     return 0;
@@ -468,41 +445,21 @@ int run(int argc, char** argv) {
     app.set_version_flag("--version", std::string(kProgram) + " " + PROJECT_VERSION,
                          "Print the version and exit");
 
-    try {
-        app.parse(argc, argv);
-    } catch (CLI::CallForHelp const&) {
-        std::cout << app.help();
-        return 0;
-    } catch (CLI::CallForAllHelp const&) {
-        std::cout << app.help("", CLI::AppFormatMode::All);
-        return 0;
-    } catch (CLI::CallForVersion const& version) {
-        std::cout << version.what() << std::endl;
-        return 0;
-    } catch (CLI::ParseError const& error) {
-        std::string message = error.what();
-        while (!message.empty() && (message.back() == '\n' || message.back() == '\r')) {
-            message.pop_back();
-        }
-        for (char& c : message) {
-            if (c == '\n' || c == '\r') {
-                c = ' ';
-            }
-        }
-        complain(message + " (see --help)");
-        return kExitUsage;
+    int exitStatus = 0;
+    if (!smbiostool::parseCommandLine(app, argc, argv, kProgram, exitStatus)) {
+        return exitStatus;
     }
 
     if (!logLevel.empty() && !applyLevel("--log-level", logLevel, &QNLog::QNLogger::setLogLevel)) {
-        return kExitUsage;
+        return smbiostool::EXIT_USAGE;
     }
     if (!traceLevel.empty() &&
         !applyLevel("--trace-level", traceLevel, &QNLog::QNLogger::setTraceLevel)) {
-        return kExitUsage;
+        return smbiostool::EXIT_USAGE;
     }
     if (!logFile.empty() && !QNLog::QNLogger::setLogFile(logFile)) {
         complain("--log: cannot open " + logFile + " for appending");
-        return kExitUsage;
+        return smbiostool::EXIT_USAGE;
     }
 
     ExtraNodes extra;
@@ -512,7 +469,7 @@ int run(int argc, char** argv) {
         if (!parseLocation(text, code)) {
             complain("--sensors: bad location '" + text + "' (a number from 0 to " +
                      std::to_string(kLastLocation) + ", or one of " + locationNames() + ")");
-            return kExitUsage;
+            return smbiostool::EXIT_USAGE;
         }
         if (std::find(extra.locations.begin(), extra.locations.end(), code) ==
             extra.locations.end()) {
@@ -528,30 +485,30 @@ int run(int argc, char** argv) {
         std::string why;
         if (!readWholeFile(dumpFile, dumpContent, why)) {
             complain("--dump: " + why);
-            return kExitUsage;
+            return smbiostool::EXIT_USAGE;
         }
     } else if (!binFile.empty()) {
         std::string bytes;
         std::string why;
         if (!readWholeFile(binFile, bytes, why)) {
             complain("--from-bin: " + why);
-            return kExitUsage;
+            return smbiostool::EXIT_USAGE;
         }
         smbiosdump::DumpImage image;
         if (!smbiosdump::readDumpBin(std::vector<std::uint8_t>(bytes.begin(), bytes.end()), image,
                                      why)) {
             complain("--from-bin: " + binFile + ": " + why);
-            return kExitUsage;
+            return smbiostool::EXIT_USAGE;
         }
         dumpContent = smbiosdump::formatOverride(image.header, image.table);
     }
     bool const onDump = !dumpFile.empty() || !binFile.empty();
 
     if (!dataDir.empty() && !setEnvironment("KESTREL_DATA_DIR", dataDir)) {
-        return kExitFailure;
+        return smbiostool::EXIT_FAILED;
     }
     if (!codeDir.empty() && !setEnvironment("KESTREL_CODE_DIR", codeDir)) {
-        return kExitFailure;
+        return smbiostool::EXIT_FAILED;
     }
 
     // A dump runs in a private data directory whose override file is a copy
@@ -561,20 +518,20 @@ int run(int argc, char** argv) {
         std::string why;
         if (!temporary.create(why)) {
             complain(why);
-            return kExitFailure;
+            return smbiostool::EXIT_FAILED;
         }
         std::string const overrideDir = temporary.path() + "/SmBiosOverride";
         std::error_code error;
         if (!std::filesystem::create_directory(overrideDir, error)) {
             complain("cannot create " + overrideDir + ": " + error.message());
-            return kExitFailure;
+            return smbiostool::EXIT_FAILED;
         }
         if (!writeWholeFile(overrideDir + "/smbios.txt", dumpContent, why)) {
             complain(why);
-            return kExitFailure;
+            return smbiostool::EXIT_FAILED;
         }
         if (!setEnvironment("KESTREL_DATA_DIR", temporary.path() + "/")) {
-            return kExitFailure;
+            return smbiostool::EXIT_FAILED;
         }
     }
 
@@ -598,20 +555,11 @@ int run(int argc, char** argv) {
     std::cout.flush();
     if (!std::cout) {
         complain("cannot write the inventory to standard output");
-        return kExitFailure;
+        return smbiostool::EXIT_FAILED;
     }
     return 0;
 }
 
 }  // namespace
 
-int main(int argc, char** argv) {
-    try {
-        return run(argc, argv);
-    } catch (std::exception const& error) {
-        complain(std::string("unexpected failure: ") + error.what());
-    } catch (...) {
-        complain("unexpected failure");
-    }
-    return kExitFailure;
-}
+int main(int argc, char** argv) { return smbiostool::runMain(kProgram, run, argc, argv); }

@@ -32,18 +32,11 @@ using buildertest::nodesOfType;
 using buildertest::propertyIds;
 using buildertest::StructureLists;
 using buildertest::TestMI;
+using frametest::OverrideTable;
 using smbiostest::Structure;
 using smbiostest::TableBuilder;
 
 namespace {
-
-#define SKIP_IF_TABLE_ACQUIRED()                                                           \
-    do {                                                                                   \
-        if (frametest::tableAlreadyAcquired()) {                                           \
-            GTEST_SKIP() << "the SMBIOS table of this process was acquired by an earlier " \
-                            "test; run each test case in a process of its own (ctest)";    \
-        }                                                                                  \
-    } while (0)
 
 std::vector<uint8_t> const UUID_BYTES = {0x00, 0x11, 0x22, 0x33, 0x44, 0x55, 0x66, 0x77,
                                          0x88, 0x99, 0xAA, 0xBB, 0xCC, 0xDD, 0xEE, 0xFF};
@@ -109,20 +102,6 @@ Structure group(uint16_t handle, std::string const& name,
     }
     return structure;
 }
-
-// Writes the override file of the table at the given version and points the
-// data folder at it while the object lives.
-class OverrideTable {
-public:
-    OverrideTable(std::vector<uint8_t> const& table, uint8_t major, uint8_t minor)
-        : env_("KESTREL_DATA_DIR", dir_.path() + "/") {
-        frametest::writeOverride(dir_.path(), table, major, minor);
-    }
-
-private:
-    smbiostest::TempDir dir_;
-    smbiostest::ScopedEnv env_;
-};
 
 // Sets the process's time zone while the object lives, then restores it.
 class ScopedTimeZone {

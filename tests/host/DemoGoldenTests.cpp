@@ -67,13 +67,13 @@ TEST_F(DemoGolden, DemoServerWithSensorsAndBmcMatchesTheGoldenFile) {
     ASSERT_FALSE(HasFailure());
     if (updating()) {
         smbiostest::writeFile(goldenPath(), actual);
-        EXPECT_EQ(hosttest::fileText(goldenPath()), actual);
+        EXPECT_EQ(smbiostest::fileText(goldenPath()), actual);
         std::cout << "wrote " << goldenPath() << "\n";
         return;
     }
     ASSERT_TRUE(std::filesystem::exists(goldenPath()))
         << goldenPath() << " is missing; make it with SMBIOS_UPDATE_GOLDEN=1";
-    std::string const golden = hosttest::fileText(goldenPath());
+    std::string const golden = smbiostest::fileText(goldenPath());
     EXPECT_TRUE(golden == actual) << hosttest::firstDifference(golden, actual)
                                   << "regenerate with SMBIOS_UPDATE_GOLDEN=1 if the change is "
                                      "deliberate";
@@ -84,7 +84,7 @@ TEST_F(DemoGolden, DemoServerWithSensorsAndBmcMatchesTheGoldenFile) {
 // lose a builder's nodes.
 TEST_F(DemoGolden, GoldenFileHoldsEveryBuildersNodes) {
     ASSERT_TRUE(std::filesystem::exists(goldenPath())) << goldenPath();
-    std::string const golden = hosttest::fileText(goldenPath());
+    std::string const golden = smbiostest::fileText(goldenPath());
     Json const document = Json::parse(golden);
     std::set<unsigned int> types;
     for (Json const& node : document.at("nodes")) {

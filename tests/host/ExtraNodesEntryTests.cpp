@@ -49,7 +49,7 @@ protected:
         std::filesystem::create_directory(data_.file("SmBiosOverride"));
         smbiostest::writeFile(
             data_.file("SmBiosOverride/smbios.txt"),
-            hosttest::fileText(hosttest::sourceDir() + "/examples/demo-server.smbios.txt"));
+            smbiostest::fileText(hosttest::sourceDir() + "/examples/demo-server.smbios.txt"));
 
         std::string const plugin = hosttest::outDir() + "/libsmbiosmi.so";
         // The plug-in stays loaded until the process ends, as under the

@@ -270,7 +270,7 @@ TEST_F(HostExtraNodes, FromBinOfTheDemoTableGivesTheDemoInventory) {
     std::vector<uint8_t> header;
     std::vector<uint8_t> table;
     std::string error;
-    ASSERT_TRUE(smbiosdump::parseOverride(hosttest::fileText(demoDump()), header, table, error))
+    ASSERT_TRUE(smbiosdump::parseOverride(smbiostest::fileText(demoDump()), header, table, error))
         << error;
     ASSERT_EQ(header.size(), smbiosdump::SM_ENTRY_POINT_SIZE);
     uint16_t const structureCount = static_cast<uint16_t>(header[0x1C] | header[0x1D] << 8);

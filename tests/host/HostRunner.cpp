@@ -114,8 +114,8 @@ RunResult runProgram(std::string const& program, std::vector<std::string> const&
     } else if (WIFSIGNALED(status)) {
         result.signal = WTERMSIG(status);
     }
-    result.out = fileText(outPath);
-    result.err = fileText(errPath);
+    result.out = smbiostest::fileText(outPath);
+    result.err = smbiostest::fileText(errPath);
     return result;
 }
 
@@ -134,11 +134,6 @@ std::string describe(RunResult const& result) {
     }
     text << "\n--- stdout ---\n" << result.out << "\n--- stderr ---\n" << result.err;
     return text.str();
-}
-
-std::string fileText(std::string const& path) {
-    std::vector<uint8_t> const bytes = smbiostest::fileBytes(path);
-    return std::string(bytes.begin(), bytes.end());
 }
 
 }  // namespace hosttest

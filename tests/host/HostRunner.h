@@ -49,8 +49,4 @@ RunResult runHost(std::vector<std::string> const& args,
 // A readable account of a run, for failure messages.
 std::string describe(RunResult const& result);
 
-// The whole file as text; throws std::runtime_error when it cannot be read
-// (smbiostest::fileBytes).
-std::string fileText(std::string const& path);
-
 }  // namespace hosttest

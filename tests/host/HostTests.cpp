@@ -562,7 +562,7 @@ TEST_F(HostTest, DumpRunsOnACopyInAPrivateDataDirThatIsRemovedAfterwards) {
     EXPECT_FALSE(std::filesystem::exists(dir)) << dir;
     EXPECT_TRUE(folderEntries(temporary.path()).empty());
     EXPECT_TRUE(folderEntries(realData.path()).empty());
-    EXPECT_EQ(hosttest::fileText(dump), content);
+    EXPECT_EQ(smbiostest::fileText(dump), content);
 }
 
 TEST_F(HostTest, DumpTemporaryFolderIsRemovedWhenThePluginFails) {
@@ -597,7 +597,7 @@ TEST_F(HostTest, LogOptionsSendPluginMessagesToTheLogFile) {
     std::string const log = folder.file("host.log");
     ASSERT_NO_FATAL_FAILURE(
         runJson({"--log", log, "--log-level", "0", "--trace-level", "off"}, Environment()));
-    std::string const text = hosttest::fileText(log);
+    std::string const text = smbiostest::fileText(log);
     EXPECT_NE(text.find(kLogText), std::string::npos) << text;
     EXPECT_EQ(text.find(kTraceText), std::string::npos) << text;
     EXPECT_EQ(run_.err.find(kLogText), std::string::npos) << run_.err;
@@ -608,7 +608,7 @@ TEST_F(HostTest, TraceLevelSendsTraceMessagesToTheLogFile) {
     std::string const log = folder.file("host.log");
     ASSERT_NO_FATAL_FAILURE(
         runJson({"--log", log, "--log-level", "off", "--trace-level", "5000"}, Environment()));
-    std::string const text = hosttest::fileText(log);
+    std::string const text = smbiostest::fileText(log);
     EXPECT_NE(text.find(kTraceText), std::string::npos) << text;
     EXPECT_EQ(text.find(kLogText), std::string::npos) << text;
 }
@@ -618,7 +618,7 @@ TEST_F(HostTest, LogLevelAboveTheMessagesWritesNone) {
     std::string const log = folder.file("host.log");
     ASSERT_NO_FATAL_FAILURE(
         runJson({"--log", log, "--log-level", "5001", "--trace-level", "off"}, Environment()));
-    std::string const text = hosttest::fileText(log);
+    std::string const text = smbiostest::fileText(log);
     EXPECT_EQ(text.find(kLogText), std::string::npos) << text;
 }
 

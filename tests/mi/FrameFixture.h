@@ -1,8 +1,8 @@
 // Shared by the tests of the plug-in frame: a plug-in object whose base
 // state (own id, next node id, id list, node list) the tests can reach, the
 // 256 structure lists made from a parsed table the way initialize makes them,
-// checks of node properties, the captured log in order, and override files
-// for the end-to-end initialize tests.
+// checks of the root node and of node properties, the captured log in order,
+// and override files for the end-to-end tests that acquire a table.
 #pragma once
 
 #include <gtest/gtest.h>
@@ -81,6 +81,46 @@ inline ::testing::AssertionResult hasNodeType(IC::Node const* node, unsigned int
     if (mutableNode->getNodeType() != type) {
         return ::testing::AssertionFailure()
                << "node type " << mutableNode->getNodeType() << ", expected " << type;
+    }
+    return ::testing::AssertionSuccess();
+}
+
+// The root node of a plug-in whose own id is 1, made first after the
+// interface node: type 59, id 2, linked to the interface node 1, index 0,
+// status 1, "ROOT Node", the interface ids {1}, no property.
+inline ::testing::AssertionResult isFirstRootNode(IC::Node const* node) {
+    ::testing::AssertionResult type = hasNodeType(node, 59);
+    if (!type) {
+        return type;
+    }
+    std::ostringstream wrong;
+    if (node->getNodeId() != 2u) {
+        wrong << " id " << node->getNodeId() << ", expected 2;";
+    }
+    if (node->getLinkedId() != 1u) {
+        wrong << " linked id " << node->getLinkedId() << ", expected 1;";
+    }
+    if (node->getIndex() != 0u) {
+        wrong << " index " << node->getIndex() << ", expected 0;";
+    }
+    if (node->getStatus() != 1u) {
+        wrong << " status " << node->getStatus() << ", expected 1;";
+    }
+    if (node->getDescription() != "ROOT Node") {
+        wrong << " description \"" << node->getDescription() << "\", expected \"ROOT Node\";";
+    }
+    if (node->getMIIds() != std::vector<unsigned int>{1}) {
+        wrong << " interface ids {";
+        for (unsigned int id : node->getMIIds()) {
+            wrong << " " << id;
+        }
+        wrong << " }, expected {1};";
+    }
+    if (!node->getProperties().empty()) {
+        wrong << " " << node->getProperties().size() << " properties, expected none;";
+    }
+    if (!wrong.str().empty()) {
+        return ::testing::AssertionFailure() << "root node:" << wrong.str();
     }
     return ::testing::AssertionSuccess();
 }
@@ -245,6 +285,15 @@ inline std::string firstLogged(std::string const& text) {
 // every test case in a process of its own.
 inline bool tableAlreadyAcquired() { return SD::SMBIOS_CLASS::_smbios != nullptr; }
 
+// Skips the test when an earlier test of this process acquired the table.
+#define SKIP_IF_TABLE_ACQUIRED()                                                           \
+    do {                                                                                   \
+        if (frametest::tableAlreadyAcquired()) {                                           \
+            GTEST_SKIP() << "the SMBIOS table of this process was acquired by an earlier " \
+                            "test; run each test case in a process of its own (ctest)";    \
+        }                                                                                  \
+    } while (0)
+
 // Writes dataDir/SmBiosOverride/smbios.txt with an "_SM_" entry point of
 // the given version that describes the table.
 inline void writeOverride(std::string const& dataDir, std::vector<uint8_t> const& table,
@@ -255,5 +304,19 @@ inline void writeOverride(std::string const& dataDir, std::vector<uint8_t> const
                                      smbiosdump::DUMP_BIN_TABLE_OFFSET, stats.count, stats.maxSize);
     smbiostest::writeOverrideDir(dataDir, header, table);
 }
+
+// Writes the override file of the table at the given version and points the
+// data folder at it; both stay while the object lives.
+class OverrideTable {
+public:
+    OverrideTable(std::vector<uint8_t> const& table, uint8_t major, uint8_t minor)
+        : env_("KESTREL_DATA_DIR", dir_.path() + "/") {
+        writeOverride(dir_.path(), table, major, minor);
+    }
+
+private:
+    smbiostest::TempDir dir_;
+    smbiostest::ScopedEnv env_;
+};
 
 }  // namespace frametest

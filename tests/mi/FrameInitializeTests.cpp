@@ -13,19 +13,11 @@
 using frametest::hasNodeType;
 using frametest::hasVersion;
 using frametest::lacksProperty;
+using frametest::OverrideTable;
 using smbiostest::Structure;
 using smbiostest::TableBuilder;
 
 namespace {
-
-// Skips the test when an earlier test of this process acquired the table.
-#define SKIP_IF_TABLE_ACQUIRED()                                                           \
-    do {                                                                                   \
-        if (frametest::tableAlreadyAcquired()) {                                           \
-            GTEST_SKIP() << "the SMBIOS table of this process was acquired by an earlier " \
-                            "test; run each test case in a process of its own (ctest)";    \
-        }                                                                                  \
-    } while (0)
 
 // What the agent sees of a node, for comparing two initializations.
 struct NodeShape {
@@ -72,25 +64,20 @@ std::vector<uint8_t> smallTable() {
     return table.build();
 }
 
-// Writes the override file of the table and points the data folder at it;
-// both stay while the object lives.
-class OverrideTable {
-public:
-    OverrideTable(std::vector<uint8_t> const& table, uint8_t major, uint8_t minor)
-        : env_("KESTREL_DATA_DIR", dir_.path() + "/") {
-        frametest::writeOverride(dir_.path(), table, major, minor);
-    }
-
-private:
-    smbiostest::TempDir dir_;
-    smbiostest::ScopedEnv env_;
-};
-
 IC::ManagementInterface* openPlugin() {
     IC::ManagementInterface* mi = nullptr;
     IC::Error* err = nullptr;
     EXPECT_EQ(0, OpenMI(&mi, &err));
     return mi;
+}
+
+// Initializes the interface as the agent does (own id 1, no codes) and
+// returns the nodes getMap then hands out.
+std::vector<IC::Node*> initializedNodes(IC::ManagementInterface* mi) {
+    mi->initialize(1, IC::Number(0u), IC::Number(0u));
+    std::vector<IC::Node*> nodes;
+    mi->getMap(nodes);
+    return nodes;
 }
 
 }  // namespace
@@ -142,15 +129,7 @@ TEST(FrameInitialize, EmptyTableLogsSizeZeroAndStillMakesInterfaceAndRootNodes) 
     EXPECT_TRUE(lacksProperty(miNode, 307));
     EXPECT_EQ(1u, miNode->getProperties().size());
 
-    IC::Node const* root = nodes[1];
-    EXPECT_TRUE(hasNodeType(root, 59));
-    EXPECT_EQ(2u, root->getNodeId());
-    EXPECT_EQ(1u, root->getLinkedId());
-    EXPECT_EQ(0u, root->getIndex());
-    EXPECT_EQ(1u, root->getStatus());
-    EXPECT_EQ("ROOT Node", root->getDescription());
-    EXPECT_EQ(std::vector<unsigned int>{1}, root->getMIIds());
-    EXPECT_TRUE(root->getProperties().empty());
+    EXPECT_TRUE(frametest::isFirstRootNode(nodes[1]));
 }
 
 TEST(FrameInitialize, ZeroRevisionSetsNoProperty307AndLogsIt) {
@@ -160,10 +139,7 @@ TEST(FrameInitialize, ZeroRevisionSetsNoProperty307AndLogsIt) {
     smbiostest::LogCapture log;
     IC::ManagementInterface* mi = openPlugin();
     ASSERT_NE(nullptr, mi);
-    mi->initialize(1, IC::Number(0u), IC::Number(0u));
-
-    std::vector<IC::Node*> nodes;
-    mi->getMap(nodes);
+    std::vector<IC::Node*> const nodes = initializedNodes(mi);
     ASSERT_GE(nodes.size(), 1u);
     EXPECT_TRUE(hasNodeType(nodes[0], 15));
     EXPECT_TRUE(hasVersion(nodes[0], 306, 3, 2));
@@ -245,10 +221,7 @@ TEST(FrameInitialize, NodeIdsFollowCreationOrderFromTheInterfaceNode) {
     smbiostest::LogCapture log;
     IC::ManagementInterface* mi = openPlugin();
     ASSERT_NE(nullptr, mi);
-    mi->initialize(1, IC::Number(0u), IC::Number(0u));
-
-    std::vector<IC::Node*> nodes;
-    mi->getMap(nodes);
+    std::vector<IC::Node*> const nodes = initializedNodes(mi);
     ASSERT_GE(nodes.size(), 2u);
     EXPECT_TRUE(hasNodeType(nodes[0], 15));
     EXPECT_TRUE(hasNodeType(nodes[1], 59));
@@ -293,17 +266,11 @@ TEST(FrameInitialize, SecondInitializeRebuildsTheNodeList) {
     IC::ManagementInterface* mi = openPlugin();
     ASSERT_NE(nullptr, mi);
 
-    mi->initialize(1, IC::Number(0u), IC::Number(0u));
-    std::vector<IC::Node*> first;
-    mi->getMap(first);
-    std::vector<NodeShape> const firstShapes = shapes(first);
+    std::vector<NodeShape> const firstShapes = shapes(initializedNodes(mi));
     ASSERT_GE(firstShapes.size(), 2u);
 
-    mi->initialize(1, IC::Number(0u), IC::Number(0u));
-    std::vector<IC::Node*> second;
-    mi->getMap(second);
     // The nodes of the first call are gone (not kept beside the new ones),
     // and the new list has the same shape, ids included.
-    EXPECT_EQ(firstShapes, shapes(second));
+    EXPECT_EQ(firstShapes, shapes(initializedNodes(mi)));
     EXPECT_EQ(4u, log.count("initialize exit")) << log.dump();
 }

@@ -28,6 +28,13 @@ std::vector<unsigned int> formattedBytes(Structure const& structure) {
     return std::vector<unsigned int>(bytes.begin(), bytes.begin() + bytes[1]);
 }
 
+// Runs makeSMBIOSTableNodes over the structure lists of the parsed table,
+// under the parent PARENT_ID.
+void makeRawTableNodes(TestMI& mi, SD::SmBios const& parsed) {
+    StructureLists lists(parsed);
+    mi.makeSMBIOSTableNodes(lists.get(), PARENT_ID);
+}
+
 // Every text of the "Table <type> count =<n>" lines, in the order logged.
 std::vector<std::string> countLines() {
     std::vector<std::string> lines;
@@ -59,10 +66,9 @@ TEST(FrameRawTable, FullStructureGetsHeaderFieldsFormattedBytesAndStrings) {
     TableBuilder table;
     table.add(bios);
     SD::SmBios const parsed = frametest::parse(table);
-    StructureLists lists(parsed);
     TestMI mi;
 
-    mi.makeSMBIOSTableNodes(lists.get(), PARENT_ID);
+    makeRawTableNodes(mi, parsed);
 
     ASSERT_EQ(1u, mi.nodeList.size()) << log.dump();
     IC::Node const* node = mi.nodeList[0];
@@ -96,10 +102,9 @@ TEST(FrameRawTable, Type40GetsNoRawNodeAndType31Does) {
     table.add(Structure(200, 0x00C8).byte(1));
     table.endOfTable(0x007F);
     SD::SmBios const parsed = frametest::parse(table);
-    StructureLists lists(parsed);
     TestMI mi;
 
-    mi.makeSMBIOSTableNodes(lists.get(), PARENT_ID);
+    makeRawTableNodes(mi, parsed);
 
     ASSERT_EQ(1u, mi.nodeList.size()) << log.dump();
     IC::Node const* node = mi.nodeList[0];
@@ -130,10 +135,9 @@ TEST(FrameRawTable, EmptyMiddleStringIsLeftOutOfStringsAndCount) {
     // string is now empty.
     std::vector<unsigned char>& data = const_cast<std::vector<unsigned char>&>(oem.getData());
     data.erase(data.begin() + 7);
-    StructureLists lists(parsed);
     TestMI mi;
 
-    mi.makeSMBIOSTableNodes(lists.get(), PARENT_ID);
+    makeRawTableNodes(mi, parsed);
 
     ASSERT_EQ(1u, mi.nodeList.size()) << log.dump();
     IC::Node const* node = mi.nodeList[0];
@@ -150,10 +154,9 @@ TEST(FrameRawTable, StructureWithoutStringsGetsEmptyStringListAndCountZero) {
     SD::SmBios const parsed = frametest::parse(table);
     ASSERT_EQ(1u, parsed.getTables().size());
     ASSERT_EQ(1u, parsed.getTables()[0].getStrCount());
-    StructureLists lists(parsed);
     TestMI mi;
 
-    mi.makeSMBIOSTableNodes(lists.get(), PARENT_ID);
+    makeRawTableNodes(mi, parsed);
 
     ASSERT_EQ(1u, mi.nodeList.size()) << log.dump();
     IC::Node const* node = mi.nodeList[0];
@@ -170,10 +173,9 @@ TEST(FrameRawTable, IndexRunsAcrossTypesInTypeOrderAndIdsFollowCreation) {
     table.add(Structure(0, 0x0000).str("Corvane").str("1.0"));
     table.add(Structure(17, 0x1101).word(0x1000).str("DIMM B"));
     SD::SmBios const parsed = frametest::parse(table);
-    StructureLists lists(parsed);
     TestMI mi;
 
-    mi.makeSMBIOSTableNodes(lists.get(), PARENT_ID);
+    makeRawTableNodes(mi, parsed);
 
     ASSERT_EQ(3u, mi.nodeList.size()) << log.dump();
     struct Expected {
@@ -210,10 +212,9 @@ TEST(FrameRawTable, LogsTheCountOfEveryTypeFrom0To31) {
     table.add(Structure(32, 0x0032).bytes({0, 0, 0, 0, 0, 0, 0}));
     table.endOfTable(0x007F);
     SD::SmBios const parsed = frametest::parse(table);
-    StructureLists lists(parsed);
     TestMI mi;
 
-    mi.makeSMBIOSTableNodes(lists.get(), PARENT_ID);
+    makeRawTableNodes(mi, parsed);
 
     std::vector<std::string> expected;
     for (unsigned int type = 0; type <= 31; ++type) {
@@ -227,10 +228,9 @@ TEST(FrameRawTable, LogsTheCountOfEveryTypeFrom0To31) {
 TEST(FrameRawTable, WithoutStructuresMakesNoNodeAndStillLogsEveryCount) {
     smbiostest::LogCapture log;
     SD::SmBios const parsed(std::vector<unsigned char>{});
-    StructureLists lists(parsed);
     TestMI mi;
 
-    mi.makeSMBIOSTableNodes(lists.get(), PARENT_ID);
+    makeRawTableNodes(mi, parsed);
 
     EXPECT_TRUE(mi.nodeList.empty());
     EXPECT_EQ(2u, mi.nextNodeId);
@@ -253,10 +253,9 @@ TEST(FrameRawTable, FailingStructureIsLoggedWithItsPositionAndTheNextOneGetsItsN
     // structure and its lookup throws std::out_of_range.
     std::vector<unsigned char>& data = const_cast<std::vector<unsigned char>&>(broken.getData());
     data.erase(data.begin() + 7, data.begin() + 10);
-    StructureLists lists(parsed);
     TestMI mi;
 
-    mi.makeSMBIOSTableNodes(lists.get(), PARENT_ID);
+    makeRawTableNodes(mi, parsed);
 
     std::string const failure = frametest::firstLogged("Exception=");
     EXPECT_EQ(0u, failure.find("Exception=")) << log.dump();

@@ -79,6 +79,20 @@ protected:
         return node.getProperty(id, value).getStatus() == 0;
     }
 
+    // A writer's failed check on the sample: property ID is not set, and
+    // the diagnostic line (text, offset, " length=24") was logged.
+    ::testing::AssertionResult refused(LogCapture const& log, std::string const& text,
+                                       unsigned int off) {
+        if (isSet()) {
+            return ::testing::AssertionFailure() << "property " << ID << " is set";
+        }
+        std::string const line = failText(text, off, 24);
+        if (!log.contains(line)) {
+            return ::testing::AssertionFailure() << "no \"" << line << "\" logged\n" << log.dump();
+        }
+        return ::testing::AssertionSuccess();
+    }
+
     void expectBool(bool expected) {
         IC::PropertyValue const value = property();
         EXPECT_EQ(value.getKind(), IC::PropertyValue::NUMBER);
@@ -291,8 +305,7 @@ TEST_F(ReaderWriter, PropBool64ReadsOnlyTheByteAtTheOffset) {
 TEST_F(ReaderWriter, PropBool64FailsWhenTheFieldPassesTheLength) {
     LogCapture log;
     mi.propBool64(&t, 17, 0x01, ID, &node);
-    EXPECT_FALSE(isSet());
-    EXPECT_TRUE(log.contains(failText("propBool64 offset=", 17, 24))) << log.dump();
+    EXPECT_TRUE(refused(log, "propBool64 offset=", 17));
 }
 
 TEST_F(ReaderWriter, PropBool32SetsBoolFromTheByteAtTheOffset) {
@@ -316,8 +329,7 @@ TEST_F(ReaderWriter, PropBool32WithMask0x100AlwaysSetsFalse) {
 TEST_F(ReaderWriter, PropBool32FailsWhenTheFieldPassesTheLength) {
     LogCapture log;
     mi.propBool32(&t, 21, 0x01, ID, &node);
-    EXPECT_FALSE(isSet());
-    EXPECT_TRUE(log.contains(failText("propBool32 offset=", 21, 24))) << log.dump();
+    EXPECT_TRUE(refused(log, "propBool32 offset=", 21));
 }
 
 TEST_F(ReaderWriter, PropBool16SetsBoolFromTheByteAtTheOffset) {
@@ -332,8 +344,7 @@ TEST_F(ReaderWriter, PropBool16SetsBoolFromTheByteAtTheOffset) {
 TEST_F(ReaderWriter, PropBool16FailsWhenTheWordPassesTheLength) {
     LogCapture log;
     mi.propBool16(&t, 23, 0x01, ID, &node);
-    EXPECT_FALSE(isSet());
-    EXPECT_TRUE(log.contains(failText("propBool16 offset=", 23, 24))) << log.dump();
+    EXPECT_TRUE(refused(log, "propBool16 offset=", 23));
 }
 
 TEST_F(ReaderWriter, PropBool8SetsBoolFromTheByte) {
@@ -346,8 +357,7 @@ TEST_F(ReaderWriter, PropBool8SetsBoolFromTheByte) {
 TEST_F(ReaderWriter, PropBool8FailsAtTheLength) {
     LogCapture log;
     mi.propBool8(&t, 24, 0x01, ID, &node);
-    EXPECT_FALSE(isSet());
-    EXPECT_TRUE(log.contains(failText("propBool8 offset=", 24, 24))) << log.dump();
+    EXPECT_TRUE(refused(log, "propBool8 offset=", 24));
 }
 
 // ---------------------------------------------------------------------------
@@ -382,8 +392,7 @@ TEST_F(ReaderWriter, PropNumber8SetsTheByteAsUnsigned) {
 TEST_F(ReaderWriter, PropNumber8FailsAtTheLength) {
     LogCapture log;
     mi.propNumber8(&t, 24, ID, &node);
-    EXPECT_FALSE(isSet());
-    EXPECT_TRUE(log.contains(failText("propNumber8 offset=", 24, 24))) << log.dump();
+    EXPECT_TRUE(refused(log, "propNumber8 offset=", 24));
 }
 
 TEST_F(ReaderWriter, PropEnumValue16SetsAWidthTwoEnum) {
@@ -396,8 +405,7 @@ TEST_F(ReaderWriter, PropEnumValue16SetsAWidthTwoEnum) {
 TEST_F(ReaderWriter, PropEnumValue16FailsWhenTheWordPassesTheLength) {
     LogCapture log;
     mi.propEnumValue16(&t, 23, 0xFFFF, 0, ID, &node);
-    EXPECT_FALSE(isSet());
-    EXPECT_TRUE(log.contains(failText("propEnumValue16 offset=", 23, 24))) << log.dump();
+    EXPECT_TRUE(refused(log, "propEnumValue16 offset=", 23));
 }
 
 TEST_F(ReaderWriter, PropEnumValueWithMaskSetsAWidthOneEnum) {
@@ -410,8 +418,7 @@ TEST_F(ReaderWriter, PropEnumValueWithMaskSetsAWidthOneEnum) {
 TEST_F(ReaderWriter, PropEnumValueWithMaskFailsAtTheLength) {
     LogCapture log;
     mi.propEnumValue(&t, 24, static_cast<unsigned char>(0xFF), ID, &node);
-    EXPECT_FALSE(isSet());
-    EXPECT_TRUE(log.contains(failText("propEnumValue offset=", 24, 24))) << log.dump();
+    EXPECT_TRUE(refused(log, "propEnumValue offset=", 24));
 }
 
 TEST_F(ReaderWriter, PropEnumValueWithoutMaskSetsTheByte) {
@@ -424,8 +431,7 @@ TEST_F(ReaderWriter, PropEnumValueWithoutMaskSetsTheByte) {
 TEST_F(ReaderWriter, PropEnumValueWithoutMaskFailsAtTheLength) {
     LogCapture log;
     mi.propEnumValue(&t, 24, ID, &node);
-    EXPECT_FALSE(isSet());
-    EXPECT_TRUE(log.contains(failText("propEnumValue offset=", 24, 24))) << log.dump();
+    EXPECT_TRUE(refused(log, "propEnumValue offset=", 24));
 }
 
 // ---------------------------------------------------------------------------
@@ -453,8 +459,7 @@ TEST_F(ReaderWriter, PropStringOnANumberBeyondTheStringsSetsEmpty) {
 TEST_F(ReaderWriter, PropStringFailsAtTheLength) {
     LogCapture log;
     mi.propString(&t, 24, ID, &node);
-    EXPECT_FALSE(isSet());
-    EXPECT_TRUE(log.contains(failText("propString offset=", 24, 24))) << log.dump();
+    EXPECT_TRUE(refused(log, "propString offset=", 24));
 }
 
 TEST_F(ReaderWriter, PropBufferStoresTheBytesReversedAndGetBufferDoesNot) {
@@ -471,8 +476,7 @@ TEST_F(ReaderWriter, PropBufferReachesTheLastByteOfTheFormattedArea) {
 TEST_F(ReaderWriter, PropBufferFailsPastTheLength) {
     LogCapture log;
     mi.propBuffer(&t, 21, 4, ID, &node);
-    EXPECT_FALSE(isSet());
-    EXPECT_TRUE(log.contains(failText("propBuffer offset=", 21, 24))) << log.dump();
+    EXPECT_TRUE(refused(log, "propBuffer offset=", 21));
 }
 
 // ---------------------------------------------------------------------------

@@ -5,9 +5,7 @@
 
 #include <unistd.h>
 
-#include <cstdint>
 #include <string>
-#include <vector>
 
 #include "TestSupport.h"
 
@@ -22,12 +20,6 @@ inline std::string besideTestProgram(std::string const& name) {
     }
     std::string const program(self, static_cast<size_t>(length));
     return program.substr(0, program.rfind('/') + 1) + name;
-}
-
-// The whole file as text; throws std::runtime_error when it cannot be read.
-inline std::string fileText(std::string const& path) {
-    std::vector<uint8_t> const bytes = smbiostest::fileBytes(path);
-    return std::string(bytes.begin(), bytes.end());
 }
 
 }  // namespace platform_test

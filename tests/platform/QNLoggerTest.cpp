@@ -1,27 +1,24 @@
 // QNLog::QNLogger: thresholds, line format, file output, capture and the
 // set-up from the environment.
-#include <fcntl.h>
 #include <gtest/gtest.h>
-#include <spawn.h>
-#include <sys/wait.h>
-#include <unistd.h>
 
 #include <climits>
-#include <cstring>
+#include <map>
 #include <regex>
 #include <thread>
 #include <vector>
 
+#include "HostRunner.h"
 #include "PlatformTestHelpers.h"
 #include "QNLog/QNLogger.h"
 
 extern char** environ;
 
-using platform_test::fileText;
 using QNLog::LEVEL_OFF;
 using QNLog::QNLogger;
 using QNLog::QNLogRecord;
 using QNLog::QNMessageBuffer;
+using smbiostest::fileText;
 
 namespace {
 
@@ -283,59 +280,29 @@ TEST_F(QNLoggerTest, ConcurrentMessagesStayWholeLines) {
 namespace {
 
 // Runs the probe program beside this test program with the QNLOG_ variables
-// replaced by the given ones; its standard output and error go to files.
-struct ProbeRun {
-    int status = -1;
-    std::string out;
-    std::string err;
-};
-
-ProbeRun runProbe(std::vector<std::string> const& settings) {
-    ProbeRun run;
-    std::string probe = platform_test::besideTestProgram("qnlog_env_probe");
-
-    std::vector<std::string> environment;
+// replaced by the given ones.
+hosttest::RunResult runProbe(std::map<std::string, std::string> const& settings) {
+    hosttest::Environment environment;
+    environment.set = settings;
     for (char** entry = environ; *entry != nullptr; ++entry) {
-        if (std::strncmp(*entry, "QNLOG_", 6) != 0) {
-            environment.push_back(*entry);
+        std::string const variable = *entry;
+        if (variable.compare(0, 6, "QNLOG_") == 0) {
+            environment.unset.push_back(variable.substr(0, variable.find('=')));
         }
     }
-    environment.insert(environment.end(), settings.begin(), settings.end());
-    std::vector<char*> envp;
-    for (std::string& entry : environment) {
-        envp.push_back(&entry[0]);
+    hosttest::RunResult const run =
+        hosttest::runProgram(platform_test::besideTestProgram("qnlog_env_probe"), {}, environment);
+    if (!run.startError.empty()) {
+        ADD_FAILURE() << run.startError;
     }
-    envp.push_back(nullptr);
-
-    smbiostest::TempDir scratch;
-    std::string const out = scratch.file("probe.out");
-    std::string const err = scratch.file("probe.err");
-    posix_spawn_file_actions_t actions;
-    posix_spawn_file_actions_init(&actions);
-    posix_spawn_file_actions_addopen(&actions, 1, out.c_str(), O_WRONLY | O_CREAT | O_TRUNC, 0600);
-    posix_spawn_file_actions_addopen(&actions, 2, err.c_str(), O_WRONLY | O_CREAT | O_TRUNC, 0600);
-    char* argv[] = {&probe[0], nullptr};
-    pid_t pid = 0;
-    int const spawned = posix_spawn(&pid, probe.c_str(), &actions, nullptr, argv, envp.data());
-    posix_spawn_file_actions_destroy(&actions);
-    if (spawned != 0) {
-        ADD_FAILURE() << "cannot start " << probe << ": " << std::strerror(spawned);
-        return run;
-    }
-    int status = 0;
-    if (waitpid(pid, &status, 0) == pid && WIFEXITED(status)) {
-        run.status = WEXITSTATUS(status);
-    }
-    run.out = fileText(out);
-    run.err = fileText(err);
     return run;
 }
 
 }  // namespace
 
 TEST(QNLoggerEnvironment, DefaultsLogFrom5000ToStandardErrorAndTraceOff) {
-    ProbeRun const run = runProbe({});
-    ASSERT_EQ(0, run.status);
+    hosttest::RunResult const run = runProbe({});
+    ASSERT_EQ(0, run.exitStatus);
     EXPECT_EQ("log=5000 trace=" + std::to_string(LEVEL_OFF) + "\n", run.out);
     EXPECT_TRUE(contains(run.err, " log 6000 EnvProbe writeMessages ")) << run.err;
     EXPECT_TRUE(contains(run.err, "probe-log-high")) << run.err;
@@ -346,9 +313,9 @@ TEST(QNLoggerEnvironment, DefaultsLogFrom5000ToStandardErrorAndTraceOff) {
 TEST(QNLoggerEnvironment, LevelsAndFileComeFromEnvironment) {
     smbiostest::TempDir scratch;
     std::string const logFile = scratch.file("env.log");
-    ProbeRun const run =
-        runProbe({"QNLOG_LEVEL=50", "QNLOG_TRACE_LEVEL=5000", "QNLOG_FILE=" + logFile});
-    ASSERT_EQ(0, run.status);
+    hosttest::RunResult const run =
+        runProbe({{"QNLOG_LEVEL", "50"}, {"QNLOG_TRACE_LEVEL", "5000"}, {"QNLOG_FILE", logFile}});
+    ASSERT_EQ(0, run.exitStatus);
     EXPECT_EQ("log=50 trace=5000\n", run.out);
     EXPECT_EQ("", run.err);
     std::string const text = fileText(logFile);
@@ -363,23 +330,24 @@ TEST(QNLoggerEnvironment, LevelsAndFileComeFromEnvironment) {
 TEST(QNLoggerEnvironment, OffTurnsOutputOff) {
     smbiostest::TempDir scratch;
     std::string const logFile = scratch.file("off.log");
-    ProbeRun const run =
-        runProbe({"QNLOG_LEVEL=Off", "QNLOG_TRACE_LEVEL=off", "QNLOG_FILE=" + logFile});
-    ASSERT_EQ(0, run.status);
+    hosttest::RunResult const run =
+        runProbe({{"QNLOG_LEVEL", "Off"}, {"QNLOG_TRACE_LEVEL", "off"}, {"QNLOG_FILE", logFile}});
+    ASSERT_EQ(0, run.exitStatus);
     EXPECT_EQ("log=" + std::to_string(LEVEL_OFF) + " trace=" + std::to_string(LEVEL_OFF) + "\n",
               run.out);
     EXPECT_EQ("", fileText(logFile));
 }
 
 TEST(QNLoggerEnvironment, InvalidValuesKeepDefaults) {
-    ProbeRun const run = runProbe({"QNLOG_LEVEL=loud", "QNLOG_TRACE_LEVEL=12abc"});
-    ASSERT_EQ(0, run.status);
+    hosttest::RunResult const run =
+        runProbe({{"QNLOG_LEVEL", "loud"}, {"QNLOG_TRACE_LEVEL", "12abc"}});
+    ASSERT_EQ(0, run.exitStatus);
     EXPECT_EQ("log=5000 trace=" + std::to_string(LEVEL_OFF) + "\n", run.out);
 }
 
 TEST(QNLoggerEnvironment, NegativeLevelTakesEveryMessage) {
-    ProbeRun const run = runProbe({"QNLOG_LEVEL=-3"});
-    ASSERT_EQ(0, run.status);
+    hosttest::RunResult const run = runProbe({{"QNLOG_LEVEL", "-3"}});
+    ASSERT_EQ(0, run.exitStatus);
     EXPECT_EQ("log=0 trace=" + std::to_string(LEVEL_OFF) + "\n", run.out);
     EXPECT_TRUE(contains(run.err, "probe-log-low")) << run.err;
 }

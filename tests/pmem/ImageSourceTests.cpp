@@ -13,6 +13,7 @@ using pmemtest::kAnchor;
 using pmemtest::kBiosArea;
 using pmemtest::kTableAddress;
 using pmemtest::PMemLibrary;
+using pmemtest::readsBytes;
 
 namespace {
 
@@ -51,8 +52,7 @@ TEST_F(ImageSource, SmEntryPointInBiosAreaIsFoundAndItsTableIsReadElsewhere) {
     EXPECT_EQ(pmemtest::slice(read, 0, ep.size()), ep);
     ASSERT_EQ(pmemtest::dword(read, 0x18), kTableAddress);
     ASSERT_EQ(pmemtest::word(read, 0x16), table.size());
-    EXPECT_EQ(pm.bytes(kTableAddress, table.size(), status), table);
-    EXPECT_EQ(status, 0);
+    EXPECT_TRUE(readsBytes(pm, kTableAddress, table));
     EXPECT_NE(pm.close(), 0);
 }
 
@@ -83,15 +83,10 @@ TEST_F(ImageSource, ReadsSpanAdjacentFilesButFailOnAnyByteOfAHole) {
                           imageItem(file("c.bin", counting(16, 0x80)), 0x2000));
     PMemLibrary& pm = load();
     ASSERT_NE(pm.isInitialized(), 0);
-    int status = -2;
-    EXPECT_EQ(pm.bytes(0x1008, 16, status), counting(16, 0x08));
-    EXPECT_EQ(status, 0);
-    EXPECT_EQ(pm.bytes(0x1000, 32, status), counting(32, 0x00));
-    EXPECT_EQ(status, 0);
-    EXPECT_EQ(pm.bytes(0x1018, 8, status), counting(8, 0x18));
-    EXPECT_EQ(status, 0);
-    EXPECT_EQ(pm.bytes(0x2000, 16, status), counting(16, 0x80));
-    EXPECT_EQ(status, 0);
+    EXPECT_TRUE(readsBytes(pm, 0x1008, counting(16, 0x08)));
+    EXPECT_TRUE(readsBytes(pm, 0x1000, counting(32, 0x00)));
+    EXPECT_TRUE(readsBytes(pm, 0x1018, counting(8, 0x18)));
+    EXPECT_TRUE(readsBytes(pm, 0x2000, counting(16, 0x80)));
 
     // One byte past the second file, one before the first, the hole itself,
     // and a range from the second file across the hole into the third.
@@ -167,11 +162,8 @@ TEST_F(ImageSource, TopOfTheAddressSpaceIsServedWithoutWrapping) {
     env("PMEM_IMAGE", imageItem(file("top.bin", with(16, 12, "_SM_")), top));
     PMemLibrary& pm = load();
     ASSERT_NE(pm.isInitialized(), 0);
-    int status = -2;
-    EXPECT_EQ(pm.bytes(ULONG_MAX, 1, status), std::vector<uint8_t>{'_'});
-    EXPECT_EQ(status, 0);
-    EXPECT_EQ(pm.bytes(ULONG_MAX - 3, 4, status), (std::vector<uint8_t>{'_', 'S', 'M', '_'}));
-    EXPECT_EQ(status, 0);
+    EXPECT_TRUE(readsBytes(pm, ULONG_MAX, std::vector<uint8_t>{'_'}));
+    EXPECT_TRUE(readsBytes(pm, ULONG_MAX - 3, std::vector<uint8_t>{'_', 'S', 'M', '_'}));
     unsigned char buffer[8] = {};
     EXPECT_NE(pm.read(buffer, ULONG_MAX, 2), 0);
     EXPECT_NE(pm.read(buffer, ULONG_MAX - 3, 8), 0);
@@ -192,22 +184,16 @@ TEST_F(ImageSource, BaseIsHexadecimalWithOrWithoutPrefixInEitherCase) {
     env("PMEM_IMAGE", a + "@0XaBcD0," + b + "@abce0," + c + "@00000000000000ABCF0");
     PMemLibrary& pm = load();
     ASSERT_NE(pm.isInitialized(), 0);
-    int status = -2;
-    EXPECT_EQ(pm.bytes(0xABCD0, 4, status), counting(4, 1));
-    EXPECT_EQ(status, 0);
-    EXPECT_EQ(pm.bytes(0xABCE0, 4, status), counting(4, 5));
-    EXPECT_EQ(status, 0);
-    EXPECT_EQ(pm.bytes(0xABCF0, 4, status), counting(4, 9));
-    EXPECT_EQ(status, 0);
+    EXPECT_TRUE(readsBytes(pm, 0xABCD0, counting(4, 1)));
+    EXPECT_TRUE(readsBytes(pm, 0xABCE0, counting(4, 5)));
+    EXPECT_TRUE(readsBytes(pm, 0xABCF0, counting(4, 9)));
 }
 
 TEST_F(ImageSource, FileNameMayHoldAnAtSign) {
     env("PMEM_IMAGE", imageItem(file("dump@host.bin", counting(8, 0x40)), 0x1000));
     PMemLibrary& pm = load();
     ASSERT_NE(pm.isInitialized(), 0);
-    int status = -2;
-    EXPECT_EQ(pm.bytes(0x1000, 8, status), counting(8, 0x40));
-    EXPECT_EQ(status, 0);
+    EXPECT_TRUE(readsBytes(pm, 0x1000, counting(8, 0x40)));
 }
 
 TEST_F(ImageSource, EmptyFilePresentsNothing) {

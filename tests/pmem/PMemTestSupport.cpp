@@ -67,6 +67,21 @@ std::vector<uint8_t> PMemLibrary::bytes(unsigned long address, size_t n, int& st
     return out;
 }
 
+::testing::AssertionResult readsBytes(PMemLibrary const& pm, unsigned long address,
+                                      std::vector<uint8_t> const& expected) {
+    int status = -2;
+    std::vector<uint8_t> const got = pm.bytes(address, expected.size(), status);
+    if (status != 0) {
+        return ::testing::AssertionFailure() << "PMemRead of " << expected.size() << " bytes at "
+                                             << hex(address) << " returned " << status;
+    }
+    if (got != expected) {
+        return ::testing::AssertionFailure()
+               << "the " << expected.size() << " bytes at " << hex(address) << " differ";
+    }
+    return ::testing::AssertionSuccess();
+}
+
 void PMemTest::env(std::string const& name, char const* value) {
     envs_.emplace_back(new smbiostest::ScopedEnv(name, value));
 }

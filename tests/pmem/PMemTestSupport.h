@@ -50,6 +50,11 @@ private:
     unsigned long (*search_)(char const*, unsigned long, unsigned long, long) = nullptr;
 };
 
+// PMemRead of expected.size() bytes at `address` succeeds and gives exactly
+// `expected`.
+::testing::AssertionResult readsBytes(PMemLibrary const& pm, unsigned long address,
+                                      std::vector<uint8_t> const& expected);
+
 // Every test starts with no PMEM_SOURCE and no PMEM_IMAGE, an empty folder
 // as the sysfs folder and a memory device that does not exist, so that this
 // machine's own tables never take part; it adds what it needs with env()

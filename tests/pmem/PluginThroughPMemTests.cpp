@@ -6,6 +6,7 @@
 
 #include <algorithm>
 #include <fstream>
+#include <map>
 #include <regex>
 
 #include "PMemTestSupport.h"
@@ -133,6 +134,34 @@ pmemtest::Acquired throughOverrideFile(std::vector<uint8_t> const& bin, std::str
                                      {"KESTREL_CODE_DIR", work.file("no-code-here") + "/"}});
 }
 
+// The acquisition through the built libpmem.so (in the code directory
+// SMBIOS_OUT_DIR) from the forced source PMEM_SOURCE=source, with the
+// source's own variable set, in a child process whose data directory holds
+// no override file.
+pmemtest::Acquired throughLibrary(std::string const& source,
+                                  std::pair<std::string, std::string> const& sourceVariable) {
+    smbiostest::TempDir noOverride;
+    return pmemtest::acquireInChild({{"KESTREL_DATA_DIR", noOverride.path() + "/"},
+                                     {"KESTREL_CODE_DIR", pmemtest::outDir() + "/"},
+                                     {"PMEM_SOURCE", source},
+                                     sourceVariable});
+}
+
+// The corpus's --dump-bin images, by dump name, that start with the
+// entry-point anchor `anchor` and hold at least the 0x20 bytes in front of
+// their table.
+std::map<std::string, std::vector<uint8_t>> corpusImagesStartingWith(std::string const& anchor) {
+    std::map<std::string, std::vector<uint8_t>> images;
+    for (std::string const& name : smbiostest::corpusNames()) {
+        std::vector<uint8_t> bin =
+            smbiostest::fileBytes(smbiostest::corpusDir() + "/" + name + ".bin");
+        if (bin.size() >= 0x20 && std::string(bin.begin(), bin.begin() + anchor.size()) == anchor) {
+            images[name] = std::move(bin);
+        }
+    }
+    return images;
+}
+
 #define REQUIRE_CORPUS()                                                            \
     do {                                                                            \
         if (smbiostest::corpusDir().empty()) {                                      \
@@ -153,22 +182,12 @@ pmemtest::Acquired throughOverrideFile(std::vector<uint8_t> const& bin, std::str
 TEST(PluginThroughPMemCorpus, Sm2DumpsServedAsAnImageAtZeroGiveTheOverrideFilesStructures) {
     REQUIRE_CORPUS();
     smbiostest::TempDir work;
-    smbiostest::TempDir noOverride;
-    size_t served = 0;
-    for (std::string const& name : smbiostest::corpusNames()) {
-        std::vector<uint8_t> const bin =
-            smbiostest::fileBytes(smbiostest::corpusDir() + "/" + name + ".bin");
-        if (bin.size() < 0x20 || std::string(bin.begin(), bin.begin() + 4) != "_SM_") {
-            continue;
-        }
-        ++served;
+    std::map<std::string, std::vector<uint8_t>> const images = corpusImagesStartingWith("_SM_");
+    for (auto const& [name, bin] : images) {
         pmemtest::Acquired const expected = throughOverrideFile(bin, name, work);
         ASSERT_EQ(expected.failure, "") << name;
-        pmemtest::Acquired const got = pmemtest::acquireInChild(
-            {{"KESTREL_DATA_DIR", noOverride.path() + "/"},
-             {"KESTREL_CODE_DIR", pmemtest::outDir() + "/"},
-             {"PMEM_SOURCE", "image"},
-             {"PMEM_IMAGE", smbiostest::corpusDir() + "/" + name + ".bin@0"}});
+        pmemtest::Acquired const got = throughLibrary(
+            "image", {"PMEM_IMAGE", smbiostest::corpusDir() + "/" + name + ".bin@0"});
         ASSERT_EQ(got.failure, "") << name;
         EXPECT_FALSE(got.structures.empty()) << name;
         EXPECT_EQ(got.structures, expected.structures) << name;
@@ -178,7 +197,7 @@ TEST(PluginThroughPMemCorpus, Sm2DumpsServedAsAnImageAtZeroGiveTheOverrideFilesS
         EXPECT_EQ(got.minor, static_cast<unsigned int>(bin[0x1E] & 0x0F)) << name;
         EXPECT_EQ(got.revision, 0u) << name;
     }
-    EXPECT_GT(served, 0u) << "the corpus holds no 2.x dump";
+    EXPECT_GT(images.size(), 0u) << "the corpus holds no 2.x dump";
 }
 
 // A 3.x dump served through a fake sysfs folder: its first 0x18 bytes are
@@ -189,15 +208,8 @@ TEST(PluginThroughPMemCorpus, Sm2DumpsServedAsAnImageAtZeroGiveTheOverrideFilesS
 TEST(PluginThroughPMemCorpus, Sm3DumpsServedThroughSysfsGiveTheirStructuresAndVersion) {
     REQUIRE_CORPUS();
     smbiostest::TempDir work;
-    smbiostest::TempDir noOverride;
-    size_t served = 0;
-    for (std::string const& name : smbiostest::corpusNames()) {
-        std::vector<uint8_t> const bin =
-            smbiostest::fileBytes(smbiostest::corpusDir() + "/" + name + ".bin");
-        if (bin.size() < 0x20 || std::string(bin.begin(), bin.begin() + 5) != "_SM3_") {
-            continue;
-        }
-        ++served;
+    std::map<std::string, std::vector<uint8_t>> const images = corpusImagesStartingWith("_SM3_");
+    for (auto const& [name, bin] : images) {
         std::vector<uint8_t> ep = pmemtest::slice(bin, 0, 0x18);
         pmemtest::putQword(ep, 0x10, kTableAddress);
         pmemtest::setChecksum(ep, 5, 0, 0x18);
@@ -210,11 +222,7 @@ TEST(PluginThroughPMemCorpus, Sm3DumpsServedThroughSysfsGiveTheirStructuresAndVe
 
         pmemtest::Acquired const expected = throughOverrideFile(bin, name, work);
         ASSERT_EQ(expected.failure, "") << name;
-        pmemtest::Acquired const got =
-            pmemtest::acquireInChild({{"KESTREL_DATA_DIR", noOverride.path() + "/"},
-                                      {"KESTREL_CODE_DIR", pmemtest::outDir() + "/"},
-                                      {"PMEM_SOURCE", "sysfs"},
-                                      {"PMEM_SYSFS_DIR", folder}});
+        pmemtest::Acquired const got = throughLibrary("sysfs", {"PMEM_SYSFS_DIR", folder});
         ASSERT_EQ(got.failure, "") << name;
         EXPECT_FALSE(got.structures.empty()) << name;
         EXPECT_EQ(got.structures, expected.structures) << name;
@@ -223,5 +231,5 @@ TEST(PluginThroughPMemCorpus, Sm3DumpsServedThroughSysfsGiveTheirStructuresAndVe
         EXPECT_EQ(got.minor, version.second) << name;
         EXPECT_EQ(got.revision, 0u) << name;
     }
-    EXPECT_GT(served, 0u) << "the corpus holds no 3.x dump";
+    EXPECT_GT(images.size(), 0u) << "the corpus holds no 3.x dump";
 }

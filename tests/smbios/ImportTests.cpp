@@ -68,6 +68,12 @@ Bytes sampleHeader() {
                                         64);
 }
 
+// The start of an override file: the <SHOWSMBIOS> tag and the entry
+// point's block, every line ended by "\n".
+std::string fileStart(Bytes const& header) {
+    return "<SHOWSMBIOS>\n<EPHEADER>\n" + hexUpper(header) + "\n</EPHEADER>\n";
+}
+
 // Writes the text into a fresh file and imports it.
 struct Imported {
     int result = -1;
@@ -83,8 +89,12 @@ Imported importText(TempDir const& dir, std::string const& text) {
     return imported;
 }
 
-// Reads every token of a file with the tokenizer, up to the end of the file.
-Tokens tokenize(std::string const& path) {
+// Writes the text into a fresh file and reads every token of it with the
+// tokenizer, up to the end of the file.
+Tokens tokenize(std::string const& text) {
+    TempDir dir;
+    std::string const path = dir.file("tokens.txt");
+    writeFile(path, text);
     SD::_FileHandle* file = nullptr;
     Tokens tokens;
     if (SD::PlatformUtilities::openFile(path.c_str(), &file, 0, 0) != 0) {
@@ -105,6 +115,34 @@ Tokens goodHead(Bytes const& header) {
     return Tokens{"<SHOWSMBIOS>", "<EPHEADER>", hexUpper(header), "</EPHEADER>"};
 }
 
+// The decoder (SD::readHead or SD::readTables) turns the tokens with code 0
+// into exactly `expected`.
+::testing::AssertionResult decodes(int (*decoder)(Bytes&, Tokens const&), Tokens const& tokens,
+                                   Bytes const& expected) {
+    Bytes bytes;
+    int const code = decoder(bytes, tokens);
+    if (code != 0) {
+        return ::testing::AssertionFailure() << "code " << code << ", expected 0";
+    }
+    if (bytes != expected) {
+        return ::testing::AssertionFailure()
+               << "decoded " << hexUpper(bytes) << ", expected " << hexUpper(expected);
+    }
+    return ::testing::AssertionSuccess();
+}
+
+// readHead refuses every one of the header token lists with `code`,
+// decodes no byte and logs `logged`.
+void expectHeadRefused(std::vector<Tokens> const& heads, int code, std::string const& logged) {
+    for (Tokens const& head : heads) {
+        LogCapture log;
+        Bytes bytes;
+        EXPECT_EQ(SD::readHead(bytes, head), code) << head.size() << " tokens";
+        EXPECT_TRUE(bytes.empty()) << head.size() << " tokens";
+        EXPECT_TRUE(log.contains(logged)) << log.dump();
+    }
+}
+
 }  // namespace
 
 // ---------------------------------------------------------------------------
@@ -114,8 +152,7 @@ TEST(SmBiosImport, WellFormedFileDecodesToHeaderAndTable) {
     TempDir dir;
     Bytes const header = sampleHeader();
     Bytes const table = sampleTable();
-    std::string const text = "<SHOWSMBIOS>\n<EPHEADER>\n" + hexUpper(header) +
-                             "\n</EPHEADER>\n<SIZE>\n" + std::to_string(table.size()) +
+    std::string const text = fileStart(header) + "<SIZE>\n" + std::to_string(table.size()) +
                              "\n</SIZE>\n" + hexUpper(table) + "\n</SHOWSMBIOS>\n";
     LogCapture log;
     Imported const imported = importText(dir, text);
@@ -123,12 +160,8 @@ TEST(SmBiosImport, WellFormedFileDecodesToHeaderAndTable) {
     EXPECT_EQ(imported.head, goodHead(header));
     EXPECT_EQ(imported.tables, (Tokens{"<SIZE>", std::to_string(table.size()), "</SIZE>",
                                        hexUpper(table), "</SHOWSMBIOS>"}));
-    Bytes headBytes;
-    EXPECT_EQ(SD::readHead(headBytes, imported.head), 0);
-    EXPECT_EQ(headBytes, header);
-    Bytes tableBytes;
-    EXPECT_EQ(SD::readTables(tableBytes, imported.tables), 0);
-    EXPECT_EQ(tableBytes, table);
+    EXPECT_TRUE(decodes(SD::readHead, imported.head, header));
+    EXPECT_TRUE(decodes(SD::readTables, imported.tables, table));
     EXPECT_TRUE(log.contains("importSmBios() checking for " + dir.file("smbios.txt")))
         << log.dump();
     EXPECT_TRUE(log.contains("importSmBios() header='<SHOWSMBIOS>'")) << log.dump();
@@ -147,12 +180,8 @@ TEST(SmBiosImport, LowerCaseTagAndBlanksInsideBracketsAreAccepted) {
     Imported const imported = importText(dir, text);
     ASSERT_EQ(imported.result, 0);
     EXPECT_EQ(imported.head, goodHead(header));
-    Bytes headBytes;
-    EXPECT_EQ(SD::readHead(headBytes, imported.head), 0);
-    EXPECT_EQ(headBytes, header);
-    Bytes tableBytes;
-    EXPECT_EQ(SD::readTables(tableBytes, imported.tables), 0);
-    EXPECT_EQ(tableBytes, table);
+    EXPECT_TRUE(decodes(SD::readHead, imported.head, header));
+    EXPECT_TRUE(decodes(SD::readTables, imported.tables, table));
 }
 
 TEST(SmBiosImport, HeaderDataRunSplitOverTwoLinesIsOneToken) {
@@ -166,9 +195,7 @@ TEST(SmBiosImport, HeaderDataRunSplitOverTwoLinesIsOneToken) {
     ASSERT_EQ(imported.result, 0);
     ASSERT_EQ(imported.head.size(), 4u);
     EXPECT_EQ(imported.head[2], digits);
-    Bytes headBytes;
-    EXPECT_EQ(SD::readHead(headBytes, imported.head), 0);
-    EXPECT_EQ(headBytes, header);
+    EXPECT_TRUE(decodes(SD::readHead, imported.head, header));
 }
 
 TEST(SmBiosImport, LowerCaseHexWithBlanksDecodesLikeUpperCaseWithout) {
@@ -176,32 +203,23 @@ TEST(SmBiosImport, LowerCaseHexWithBlanksDecodesLikeUpperCaseWithout) {
     Bytes const header = sampleHeader();
     Bytes const table = sampleTable();
     Imported const upper =
-        importText(dir, "<SHOWSMBIOS>\n<EPHEADER>\n" + hexUpper(header) + "\n</EPHEADER>\n" +
-                            hexUpper(table) + "\n</SHOWSMBIOS>\n");
+        importText(dir, fileStart(header) + hexUpper(table) + "\n</SHOWSMBIOS>\n");
     Imported const lower =
         importText(dir, "<SHOWSMBIOS>\n<EPHEADER>\n" + hexLowerSpaced(header) + "\n</EPHEADER>\n" +
                             hexLowerSpaced(table) + "\n</SHOWSMBIOS>\n");
     ASSERT_EQ(upper.result, 0);
     ASSERT_EQ(lower.result, 0);
-    Bytes upperHead;
-    Bytes lowerHead;
-    EXPECT_EQ(SD::readHead(upperHead, upper.head), 0);
-    EXPECT_EQ(SD::readHead(lowerHead, lower.head), 0);
-    EXPECT_EQ(lowerHead, upperHead);
-    EXPECT_EQ(lowerHead, header);
-    Bytes upperTable;
-    Bytes lowerTable;
-    EXPECT_EQ(SD::readTables(upperTable, upper.tables), 0);
-    EXPECT_EQ(SD::readTables(lowerTable, lower.tables), 0);
-    EXPECT_EQ(lowerTable, upperTable);
-    EXPECT_EQ(lowerTable, table);
+    EXPECT_TRUE(decodes(SD::readHead, upper.head, header));
+    EXPECT_TRUE(decodes(SD::readHead, lower.head, header));
+    EXPECT_TRUE(decodes(SD::readTables, upper.tables, table));
+    EXPECT_TRUE(decodes(SD::readTables, lower.tables, table));
 }
 
 TEST(SmBiosImport, TableDataRunSpanningLinesIsOneRun) {
     TempDir dir;
     Bytes const table = sampleTable();
     std::string const digits = hexUpper(table);
-    std::string text = "<SHOWSMBIOS>\n<EPHEADER>\n" + hexUpper(sampleHeader()) + "\n</EPHEADER>\n";
+    std::string text = fileStart(sampleHeader());
     for (size_t pos = 0; pos < digits.size(); pos += 10) {
         text += digits.substr(pos, 10) + "\n";
     }
@@ -209,15 +227,12 @@ TEST(SmBiosImport, TableDataRunSpanningLinesIsOneRun) {
     Imported const imported = importText(dir, text);
     ASSERT_EQ(imported.result, 0);
     EXPECT_EQ(imported.tables, (Tokens{digits, "</SHOWSMBIOS>"}));
-    Bytes tableBytes;
-    EXPECT_EQ(SD::readTables(tableBytes, imported.tables), 0);
-    EXPECT_EQ(tableBytes, table);
+    EXPECT_TRUE(decodes(SD::readTables, imported.tables, table));
 }
 
 TEST(SmBiosImport, LostFinalDataRunMakesReadTables55) {
     TempDir dir;
-    std::string const text = "<SHOWSMBIOS>\n<EPHEADER>\n" + hexUpper(sampleHeader()) +
-                             "\n</EPHEADER>\n0102\n<OTHER>\n0304\n";
+    std::string const text = fileStart(sampleHeader()) + "0102\n<OTHER>\n0304\n";
     LogCapture log;
     Imported const imported = importText(dir, text);
     ASSERT_EQ(imported.result, 0) << log.dump();
@@ -232,22 +247,19 @@ TEST(SmBiosImport, LostFinalDataRunMakesReadTables55) {
 
 TEST(SmBiosImport, SizeBlockBetweenTableRunsContributesNoBytes) {
     TempDir dir;
-    std::string const text = "<SHOWSMBIOS>\n<EPHEADER>\n" + hexUpper(sampleHeader()) +
-                             "\n</EPHEADER>\n0102\n<SIZE>\nAABB\n</SIZE>\n0304\n</SHOWSMBIOS>\n";
+    std::string const text =
+        fileStart(sampleHeader()) + "0102\n<SIZE>\nAABB\n</SIZE>\n0304\n</SHOWSMBIOS>\n";
     Imported const imported = importText(dir, text);
     ASSERT_EQ(imported.result, 0);
     EXPECT_EQ(imported.tables,
               (Tokens{"0102", "<SIZE>", "AABB", "</SIZE>", "0304", "</SHOWSMBIOS>"}));
-    Bytes tableBytes;
-    EXPECT_EQ(SD::readTables(tableBytes, imported.tables), 0);
-    EXPECT_EQ(tableBytes, (Bytes{0x01, 0x02, 0x03, 0x04}));
+    EXPECT_TRUE(decodes(SD::readTables, imported.tables, Bytes{0x01, 0x02, 0x03, 0x04}));
 }
 
 TEST(SmBiosImport, OnlyTheFourHeaderTokensMakeImport8) {
     TempDir dir;
     LogCapture log;
-    Imported const imported = importText(
-        dir, "<SHOWSMBIOS>\n<EPHEADER>\n" + hexUpper(sampleHeader()) + "\n</EPHEADER>\n");
+    Imported const imported = importText(dir, fileStart(sampleHeader()));
     EXPECT_EQ(imported.result, 8);
     EXPECT_EQ(imported.head.size(), 4u);
     EXPECT_TRUE(imported.tables.empty());
@@ -325,44 +337,34 @@ TEST(SmBiosImport, CrLfLineEndsAreHandled) {
     ASSERT_EQ(imported.result, 0);
     EXPECT_EQ(imported.head, goodHead(header));
     EXPECT_EQ(imported.tables, (Tokens{digits, "</SHOWSMBIOS>"}));
-    Bytes headBytes;
-    EXPECT_EQ(SD::readHead(headBytes, imported.head), 0);
-    EXPECT_EQ(headBytes, header);
-    Bytes tableBytes;
-    EXPECT_EQ(SD::readTables(tableBytes, imported.tables), 0);
-    EXPECT_EQ(tableBytes, table);
+    EXPECT_TRUE(decodes(SD::readHead, imported.head, header));
+    EXPECT_TRUE(decodes(SD::readTables, imported.tables, table));
 }
 
 TEST(SmBiosImport, TagsInTheMiddleOfTableDataAreIgnored) {
     TempDir dir;
-    std::string const text = "<SHOWSMBIOS>\n<EPHEADER>\n" + hexUpper(sampleHeader()) +
-                             "\n</EPHEADER>\n01 02<NOTE>03\n04<Comment >05 06\n</SHOWSMBIOS>\n";
+    std::string const text =
+        fileStart(sampleHeader()) + "01 02<NOTE>03\n04<Comment >05 06\n</SHOWSMBIOS>\n";
     Imported const imported = importText(dir, text);
     ASSERT_EQ(imported.result, 0);
     EXPECT_EQ(imported.tables,
               (Tokens{"0102", "<NOTE>", "0304", "<COMMENT>", "0506", "</SHOWSMBIOS>"}));
-    Bytes tableBytes;
-    EXPECT_EQ(SD::readTables(tableBytes, imported.tables), 0);
-    EXPECT_EQ(tableBytes, (Bytes{1, 2, 3, 4, 5, 6}));
+    EXPECT_TRUE(decodes(SD::readTables, imported.tables, Bytes{1, 2, 3, 4, 5, 6}));
 }
 
 TEST(SmBiosImport, NothingAfterTheEndTagIsDecoded) {
     TempDir dir;
-    std::string const text = "<SHOWSMBIOS>\n<EPHEADER>\n" + hexUpper(sampleHeader()) +
-                             "\n</EPHEADER>\n0A0B\n</SHOWSMBIOS>\nZZ not hex\n<X>\n";
+    std::string const text = fileStart(sampleHeader()) + "0A0B\n</SHOWSMBIOS>\nZZ not hex\n<X>\n";
     Imported const imported = importText(dir, text);
     ASSERT_EQ(imported.result, 0);
     LogCapture log;
-    Bytes tableBytes;
-    EXPECT_EQ(SD::readTables(tableBytes, imported.tables), 0);
-    EXPECT_EQ(tableBytes, (Bytes{0x0A, 0x0B}));
+    EXPECT_TRUE(decodes(SD::readTables, imported.tables, Bytes{0x0A, 0x0B}));
     EXPECT_FALSE(log.contains("byteHex: Invalid hexadecimal digit")) << log.dump();
 }
 
 TEST(SmBiosImport, TabsAreKeptAndFailAsHexDigits) {
     TempDir dir;
-    std::string const text = "<SHOWSMBIOS>\n<EPHEADER>\n" + hexUpper(sampleHeader()) +
-                             "\n</EPHEADER>\n01\t02\n</SHOWSMBIOS>\n";
+    std::string const text = fileStart(sampleHeader()) + "01\t02\n</SHOWSMBIOS>\n";
     Imported const imported = importText(dir, text);
     ASSERT_EQ(imported.result, 0);
     ASSERT_FALSE(imported.tables.empty());
@@ -378,31 +380,20 @@ TEST(SmBiosImport, TabsAreKeptAndFailAsHexDigits) {
 // The tokenizer
 
 TEST(SmBiosTokenizer, DeliversTagsAndDataRunsAndEightAtTheEnd) {
-    TempDir dir;
-    std::string const path = dir.file("tokens.txt");
-    writeFile(path, "  <a b>01 02<C>\n\n   \n0 3\n04\n<D>\n");
-    EXPECT_EQ(tokenize(path), (Tokens{"<AB>", "0102", "<C>", "0304", "<D>"}));
+    EXPECT_EQ(tokenize("  <a b>01 02<C>\n\n   \n0 3\n04\n<D>\n"),
+              (Tokens{"<AB>", "0102", "<C>", "0304", "<D>"}));
 }
 
 TEST(SmBiosTokenizer, TagSpanningLinesIsOneToken) {
-    TempDir dir;
-    std::string const path = dir.file("tokens.txt");
-    writeFile(path, "<SHOW\nSMBIOS>\n");
-    EXPECT_EQ(tokenize(path), (Tokens{"<SHOWSMBIOS>"}));
+    EXPECT_EQ(tokenize("<SHOW\nSMBIOS>\n"), (Tokens{"<SHOWSMBIOS>"}));
 }
 
 TEST(SmBiosTokenizer, UnfinishedDataRunAtTheEndIsNotDelivered) {
-    TempDir dir;
-    std::string const path = dir.file("tokens.txt");
-    writeFile(path, "<A>\n0102\n0304");
-    EXPECT_EQ(tokenize(path), (Tokens{"<A>"}));
+    EXPECT_EQ(tokenize("<A>\n0102\n0304"), (Tokens{"<A>"}));
 }
 
 TEST(SmBiosTokenizer, FileWithoutLineEndAtTheEndDeliversItsLastTag) {
-    TempDir dir;
-    std::string const path = dir.file("tokens.txt");
-    writeFile(path, "<A>0102<B>");
-    EXPECT_EQ(tokenize(path), (Tokens{"<A>", "0102", "<B>"}));
+    EXPECT_EQ(tokenize("<A>0102<B>"), (Tokens{"<A>", "0102", "<B>"}));
 }
 
 // ---------------------------------------------------------------------------
@@ -420,47 +411,29 @@ TEST(SmBiosReadHead, DecodesTheEntryPointAndIgnoresLaterTokens) {
 }
 
 TEST(SmBiosReadHead, MissingOrWrongFirstTokenIs4) {
-    for (Tokens const& head : {Tokens{}, Tokens{"<EPHEADER>", "<EPHEADER>", "00", "</EPHEADER>"},
-                               Tokens{"<SHOWSMBIOS >", "<EPHEADER>", "00", "</EPHEADER>"}}) {
-        LogCapture log;
-        Bytes bytes;
-        EXPECT_EQ(SD::readHead(bytes, head), 4) << head.size() << " tokens";
-        EXPECT_TRUE(bytes.empty());
-        EXPECT_TRUE(log.contains("readHead() first line '<SHOWSMBIOS>' missing ")) << log.dump();
-    }
+    expectHeadRefused({Tokens{}, Tokens{"<EPHEADER>", "<EPHEADER>", "00", "</EPHEADER>"},
+                       Tokens{"<SHOWSMBIOS >", "<EPHEADER>", "00", "</EPHEADER>"}},
+                      4, "readHead() first line '<SHOWSMBIOS>' missing ");
 }
 
 TEST(SmBiosReadHead, MissingOrWrongSecondTokenIs8) {
-    for (Tokens const& head :
-         {Tokens{"<SHOWSMBIOS>"}, Tokens{"<SHOWSMBIOS>", "<SIZE>", "00", "</EPHEADER>"}}) {
-        LogCapture log;
-        Bytes bytes;
-        EXPECT_EQ(SD::readHead(bytes, head), 8) << head.size() << " tokens";
-        EXPECT_TRUE(bytes.empty());
-        EXPECT_TRUE(log.contains("readHead() second line '<EPHEADER>' missing ")) << log.dump();
-    }
+    expectHeadRefused(
+        {Tokens{"<SHOWSMBIOS>"}, Tokens{"<SHOWSMBIOS>", "<SIZE>", "00", "</EPHEADER>"}}, 8,
+        "readHead() second line '<EPHEADER>' missing ");
 }
 
 TEST(SmBiosReadHead, MissingOrWrongFourthTokenIs12) {
-    for (Tokens const& head :
-         {Tokens{"<SHOWSMBIOS>", "<EPHEADER>"}, Tokens{"<SHOWSMBIOS>", "<EPHEADER>", "0102"},
-          Tokens{"<SHOWSMBIOS>", "<EPHEADER>", "0102", "<SIZE>"}}) {
-        LogCapture log;
-        Bytes bytes;
-        EXPECT_EQ(SD::readHead(bytes, head), 12) << head.size() << " tokens";
-        EXPECT_TRUE(bytes.empty());
-        EXPECT_TRUE(log.contains("readHead() fourth line '</EPHEADER>' missing ")) << log.dump();
-    }
+    expectHeadRefused(
+        {Tokens{"<SHOWSMBIOS>", "<EPHEADER>"}, Tokens{"<SHOWSMBIOS>", "<EPHEADER>", "0102"},
+         Tokens{"<SHOWSMBIOS>", "<EPHEADER>", "0102", "<SIZE>"}},
+        12, "readHead() fourth line '</EPHEADER>' missing ");
 }
 
 TEST(SmBiosReadHead, ThirtyOneHexDigitsAre16) {
     std::string const digits = hexUpper(sampleHeader()).substr(0, 31);
     ASSERT_EQ(digits.size(), 31u);
-    LogCapture log;
-    Bytes bytes;
-    EXPECT_EQ(SD::readHead(bytes, Tokens{"<SHOWSMBIOS>", "<EPHEADER>", digits, "</EPHEADER>"}), 16);
-    EXPECT_TRUE(bytes.empty());
-    EXPECT_TRUE(log.contains("readHead() third line odd number of hex digits ")) << log.dump();
+    expectHeadRefused({Tokens{"<SHOWSMBIOS>", "<EPHEADER>", digits, "</EPHEADER>"}}, 16,
+                      "readHead() third line odd number of hex digits ");
 }
 
 TEST(SmBiosReadHead, BadHexDigitIs32) {

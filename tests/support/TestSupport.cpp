@@ -59,6 +59,11 @@ std::vector<uint8_t> fileBytes(std::string const& path) {
     return bytes;
 }
 
+std::string fileText(std::string const& path) {
+    std::vector<uint8_t> const bytes = fileBytes(path);
+    return std::string(bytes.begin(), bytes.end());
+}
+
 void writeFile(std::string const& path, std::vector<uint8_t> const& bytes) {
     writeData(path, reinterpret_cast<char const*>(bytes.data()), bytes.size());
 }

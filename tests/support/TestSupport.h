@@ -15,6 +15,8 @@ namespace smbiostest {
 
 // The whole file. Throws std::runtime_error when it cannot be read.
 std::vector<uint8_t> fileBytes(std::string const& path);
+// The whole file as text. Throws std::runtime_error when it cannot be read.
+std::string fileText(std::string const& path);
 // Creates or replaces the file. Throws std::runtime_error on failure.
 void writeFile(std::string const& path, std::vector<uint8_t> const& bytes);
 void writeFile(std::string const& path, std::string const& text);

@@ -73,13 +73,16 @@ TEST(Files, WrittenTextReadsBackAsItsBytes) {
     smbiostest::TempDir dir;
     smbiostest::writeFile(dir.file("a.txt"), std::string("A\nB"));
     EXPECT_EQ(smbiostest::fileBytes(dir.file("a.txt")), (std::vector<uint8_t>{'A', '\n', 'B'}));
+    EXPECT_EQ(smbiostest::fileText(dir.file("a.txt")), "A\nB");
     smbiostest::writeFile(dir.file("b.txt"), "");
     EXPECT_TRUE(smbiostest::fileBytes(dir.file("b.txt")).empty());
+    EXPECT_EQ(smbiostest::fileText(dir.file("b.txt")), "");
 }
 
 TEST(Files, MissingFileOrFolderThrows) {
     smbiostest::TempDir dir;
     EXPECT_THROW(smbiostest::fileBytes(dir.file("absent")), std::runtime_error);
+    EXPECT_THROW(smbiostest::fileText(dir.file("absent")), std::runtime_error);
     EXPECT_THROW(smbiostest::writeFile(dir.file("no/such/folder.txt"), "x"), std::runtime_error);
 }
 

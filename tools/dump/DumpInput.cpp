@@ -1,13 +1,13 @@
 #include "DumpInput.h"
 
 #include <dlfcn.h>
-#include <unistd.h>
 
 #include <cerrno>
 #include <cstdio>
 #include <cstring>
 
 #include "DumpFormat.h"
+#include "ToolSupport.h"
 
 namespace smbiosdump {
 
@@ -273,11 +273,7 @@ bool captureFromMachine(std::string const& libraryPath, Capture& out, std::strin
 }
 
 std::string defaultPMemPath(std::string const& programFolder) {
-    std::string const beside = programFolder + "/libpmem.so";
-    if (access(beside.c_str(), F_OK) == 0) {
-        return beside;
-    }
-    return programFolder + "/../lib/libpmem.so";
+    return smbiostool::installedLibrary(programFolder, "libpmem.so");
 }
 
 }  // namespace smbiosdump
