@@ -3,10 +3,9 @@
 // physical-memory library.
 #include <gtest/gtest.h>
 
-#include <fstream>
 #include <nlohmann/json.hpp>
-#include <regex>
 #include <string>
+#include <utility>
 
 #include "DumpFormat.h"
 #include "HostRunner.h"
@@ -30,18 +29,10 @@ std::string overrideFromCorpus(std::string const& name, smbiostest::TempDir cons
 
 // The version dmidecode reports: "SMBIOS 2.7 present." gives {2, 7}.
 std::pair<unsigned int, unsigned int> dmidecodeVersion(std::string const& name) {
-    std::ifstream in(smbiostest::corpusDir() + "/" + name + ".orig.txt");
-    std::string line;
-    std::regex const present(R"(^SMBIOS (\d+)\.(\d+)(\.\d+)? present\.)");
-    while (std::getline(in, line)) {
-        std::smatch m;
-        if (std::regex_search(line, m, present)) {
-            return {static_cast<unsigned int>(std::stoul(m[1])),
-                    static_cast<unsigned int>(std::stoul(m[2]))};
-        }
-    }
-    ADD_FAILURE() << "no version line in " << name << ".orig.txt";
-    return {0, 0};
+    std::pair<unsigned int, unsigned int> version(0, 0);
+    EXPECT_TRUE(smbiostest::dmidecodeVersion(name, version.first, version.second))
+        << "no version line in " << name << ".orig.txt";
+    return version;
 }
 
 json runJson(std::vector<std::string> const& args, hosttest::Environment const& env,

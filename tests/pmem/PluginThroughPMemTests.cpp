@@ -5,9 +5,7 @@
 #include <sys/stat.h>
 
 #include <algorithm>
-#include <fstream>
 #include <map>
-#include <regex>
 
 #include "PMemTestSupport.h"
 #include "smbios/SmBios.h"
@@ -106,18 +104,10 @@ namespace {
 
 // The version dmidecode printed for a dump: "SMBIOS 3.1.1 present." gives 3.1.
 std::pair<unsigned int, unsigned int> dmidecodeVersion(std::string const& name) {
-    std::ifstream in(smbiostest::corpusDir() + "/" + name + ".orig.txt");
-    std::regex const present(R"(^SMBIOS (\d+)\.(\d+)(\.\d+)? present\.)");
-    std::string line;
-    while (std::getline(in, line)) {
-        std::smatch m;
-        if (std::regex_search(line, m, present)) {
-            return {static_cast<unsigned int>(std::stoul(m[1])),
-                    static_cast<unsigned int>(std::stoul(m[2]))};
-        }
-    }
-    ADD_FAILURE() << "no version line in " << name << ".orig.txt";
-    return {0, 0};
+    std::pair<unsigned int, unsigned int> version(0, 0);
+    EXPECT_TRUE(smbiostest::dmidecodeVersion(name, version.first, version.second))
+        << "no version line in " << name << ".orig.txt";
+    return version;
 }
 
 // The acquisition from an override file made of a dump (the entry point

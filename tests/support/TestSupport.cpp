@@ -10,6 +10,7 @@
 #include <filesystem>
 #include <fstream>
 #include <iterator>
+#include <regex>
 #include <sstream>
 #include <stdexcept>
 #include <system_error>
@@ -188,6 +189,21 @@ void writeOverrideDir(std::string const& dataDir, std::vector<uint8_t> const& he
         throw std::runtime_error("cannot create " + dir + ": " + error.message());
     }
     writeFile(dir + "/smbios.txt", smbiosdump::formatOverride(header, table));
+}
+
+bool dmidecodeVersion(std::string const& name, unsigned int& major, unsigned int& minor) {
+    std::ifstream in(corpusDir() + "/" + name + ".orig.txt");
+    std::regex const present(R"(^SMBIOS (\d+)\.(\d+)(\.\d+)? present\.)");
+    std::string line;
+    while (std::getline(in, line)) {
+        std::smatch m;
+        if (std::regex_search(line, m, present)) {
+            major = static_cast<unsigned int>(std::stoul(m[1]));
+            minor = static_cast<unsigned int>(std::stoul(m[2]));
+            return true;
+        }
+    }
+    return false;
 }
 
 }  // namespace smbiostest

@@ -80,6 +80,10 @@ std::string corpusDir();
 // Asus-UX307LA.bin (whose dmidecode decoding is Asus-UX307LA.orig.txt).
 // Empty when there is no corpus.
 std::vector<std::string> corpusNames();
+// The SMBIOS version dmidecode printed for a corpus dump, from the line
+// "SMBIOS 2.7 present." ("SMBIOS 3.1.1 present." gives 3.1) of NAME.orig.txt;
+// false when the file has no such line.
+bool dmidecodeVersion(std::string const& name, unsigned int& major, unsigned int& minor);
 
 // Writes dataDir/SmBiosOverride/smbios.txt (creating the folder) with the
 // override text of the entry point and table. dataDir may end with '/'.
