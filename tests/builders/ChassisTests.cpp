@@ -106,6 +106,18 @@ Structure chassis(uint16_t handle, ChassisFields const& fields) {
     return structure;
 }
 
+// A table of a System Information structure (handle 0x0100) and one System
+// Enclosure structure per fields, in order, with handles from 0x0300 on.
+TableBuilder systemAndChassis(std::vector<ChassisFields> const& enclosures) {
+    TableBuilder table;
+    table.add(systemInformation(0x0100));
+    uint16_t handle = 0x0300;
+    for (ChassisFields const& fields : enclosures) {
+        table.add(chassis(handle++, fields));
+    }
+    return table;
+}
+
 // A baseboard (type 2) with a product and a location.
 Structure baseboard(uint16_t handle) {
     return Structure(2, handle)
@@ -249,10 +261,7 @@ TEST(ChassisBuilder, FullStructureGivesOneChassisNodeWithEveryProperty) {
 }
 
 TEST(ChassisBuilder, LockBitClearSetsProperty10False) {
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.add(chassis(0x0300, ofType(TOWER)));
-    ChassisRun run(table);
+    ChassisRun run(systemAndChassis({ofType(TOWER)}));
     std::vector<IC::Node*> const nodes = run.chassisNodes();
     ASSERT_EQ(1u, nodes.size());
     EXPECT_TRUE(buildertest::hasBool(nodes[0], 10, false));
@@ -329,11 +338,7 @@ TEST(ChassisType, EveryChassisTypeMapsAsTheTableSays) {
         SCOPED_TRACE("chassis type " + std::to_string(type));
         // A Desktop first, the type under test second: a main chassis takes
         // the planar from the Desktop.
-        TableBuilder table;
-        table.add(systemInformation(0x0100));
-        table.add(chassis(0x0300, ofType(DESKTOP)));
-        table.add(chassis(0x0301, ofType(static_cast<uint8_t>(type))));
-        ChassisRun run(table);
+        ChassisRun run(systemAndChassis({ofType(DESKTOP), ofType(static_cast<uint8_t>(type))}));
         std::vector<IC::Node*> const nodes = run.chassisNodes();
         if (type == EXPANSION) {
             ASSERT_EQ(1u, nodes.size());
@@ -355,10 +360,7 @@ TEST(ChassisType, EveryChassisTypeMapsAsTheTableSays) {
 }
 
 TEST(ChassisType, LockBitIsMaskedOffTheChassisType) {
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.add(chassis(0x0300, ofType(0x80 | BLADE_ENCLOSURE)));
-    ChassisRun run(table);
+    ChassisRun run(systemAndChassis({ofType(0x80 | BLADE_ENCLOSURE)}));
     std::vector<IC::Node*> const nodes = run.chassisNodes();
     ASSERT_EQ(1u, nodes.size());
     EXPECT_TRUE(buildertest::hasBool(nodes[0], 10, true));
@@ -367,11 +369,7 @@ TEST(ChassisType, LockBitIsMaskedOffTheChassisType) {
 }
 
 TEST(ChassisType, RackMountChassisGetsPackageType17AndItsName) {
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.add(chassis(0x0300, ofType(DESKTOP)));
-    table.add(chassis(0x0301, ofType(RACK_MOUNT)));
-    ChassisRun run(table);
+    ChassisRun run(systemAndChassis({ofType(DESKTOP), ofType(RACK_MOUNT)}));
     std::vector<IC::Node*> const nodes = run.chassisNodes();
     ASSERT_EQ(2u, nodes.size());
     EXPECT_TRUE(hasEnum(nodes[1], 11, 4, 17));
@@ -382,11 +380,7 @@ TEST(ChassisType, RackMountChassisGetsPackageType17AndItsName) {
 }
 
 TEST(ChassisType, BladeGetsPackageType17AndEnclosureKind16) {
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.add(chassis(0x0300, ofType(DESKTOP)));
-    table.add(chassis(0x0301, ofType(BLADE)));
-    ChassisRun run(table);
+    ChassisRun run(systemAndChassis({ofType(DESKTOP), ofType(BLADE)}));
     std::vector<IC::Node*> const nodes = run.chassisNodes();
     ASSERT_EQ(2u, nodes.size());
     EXPECT_TRUE(hasEnum(nodes[1], 11, 4, 0x11));
@@ -396,11 +390,7 @@ TEST(ChassisType, BladeGetsPackageType17AndEnclosureKind16) {
 }
 
 TEST(ChassisType, BladeEnclosureGetsPackageType0x1CAndEnclosureKind17AndIsNotMain) {
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.add(chassis(0x0300, ofType(DESKTOP)));
-    table.add(chassis(0x0301, ofType(BLADE_ENCLOSURE)));
-    ChassisRun run(table);
+    ChassisRun run(systemAndChassis({ofType(DESKTOP), ofType(BLADE_ENCLOSURE)}));
     std::vector<IC::Node*> const nodes = run.chassisNodes();
     ASSERT_EQ(2u, nodes.size());
     EXPECT_TRUE(hasEnum(nodes[1], 11, 4, 0x1C));
@@ -411,11 +401,7 @@ TEST(ChassisType, BladeEnclosureGetsPackageType0x1CAndEnclosureKind17AndIsNotMai
 }
 
 TEST(ChassisType, MultiSystemChassisGetsPackageType1AndIsMain) {
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.add(chassis(0x0300, ofType(DESKTOP)));
-    table.add(chassis(0x0301, ofType(0x19)));
-    ChassisRun run(table);
+    ChassisRun run(systemAndChassis({ofType(DESKTOP), ofType(0x19)}));
     std::vector<IC::Node*> const nodes = run.chassisNodes();
     ASSERT_EQ(2u, nodes.size());
     EXPECT_TRUE(hasEnum(nodes[1], 11, 4, 1));
@@ -425,12 +411,7 @@ TEST(ChassisType, MultiSystemChassisGetsPackageType1AndIsMain) {
 
 TEST(ChassisType, ExpansionChassisGetsNoNodeButKeepsItsIndexPosition) {
     smbiostest::LogCapture log;
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.add(chassis(0x0300, ofType(TOWER)));
-    table.add(chassis(0x0301, ofType(EXPANSION)));
-    table.add(chassis(0x0302, ofType(DESKTOP)));
-    ChassisRun run(table);
+    ChassisRun run(systemAndChassis({ofType(TOWER), ofType(EXPANSION), ofType(DESKTOP)}));
 
     std::vector<IC::Node*> const nodes = run.chassisNodes();
     ASSERT_EQ(2u, nodes.size()) << log.dump();
@@ -491,10 +472,7 @@ TEST(ChassisFallback, ManufacturerFallsBackOnEmptyBlankAndLowerCaseNoneOnly) {
         SCOPED_TRACE("chassis manufacturer \"" + c.manufacturer + "\"");
         ChassisFields fields = ofType(TOWER);
         fields.manufacturer = c.manufacturer;
-        TableBuilder table;
-        table.add(systemInformation(0x0100));
-        table.add(chassis(0x0300, fields));
-        ChassisRun run(table);
+        ChassisRun run(systemAndChassis({fields}));
         std::vector<IC::Node*> const nodes = run.chassisNodes();
         ASSERT_EQ(1u, nodes.size());
         EXPECT_TRUE(hasString(nodes[0], 36, c.expected));
@@ -513,10 +491,7 @@ TEST(ChassisFallback, SerialFallsBackOnEmptyBlankAndNoneInAnyCase) {
         SCOPED_TRACE("chassis serial \"" + c.serial + "\"");
         ChassisFields fields = ofType(TOWER);
         fields.serial = c.serial;
-        TableBuilder table;
-        table.add(systemInformation(0x0100));
-        table.add(chassis(0x0300, fields));
-        ChassisRun run(table);
+        ChassisRun run(systemAndChassis({fields}));
         std::vector<IC::Node*> const nodes = run.chassisNodes();
         ASSERT_EQ(1u, nodes.size());
         EXPECT_TRUE(hasString(nodes[0], 50, c.expected));
@@ -553,67 +528,44 @@ TEST(ChassisFallback, ProductWithoutPartNumberSetsNoProperty45) {
 // The chassis the planar hangs under
 
 TEST(ChassisPlanarHome, SingleChassisThatIsNotMainHoldsThePlanar) {
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.add(chassis(0x0300, ofType(DESKTOP)));
-    ChassisRun run(table);
+    ChassisRun run(systemAndChassis({ofType(DESKTOP)}));
     std::vector<IC::Node*> const nodes = run.chassisNodes();
     ASSERT_EQ(1u, nodes.size());
     EXPECT_EQ(nodes[0]->getNodeId(), run.planarParent());
 }
 
 TEST(ChassisPlanarHome, SecondChassisBeingMainServerHoldsThePlanar) {
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.add(chassis(0x0300, ofType(DESKTOP)));
-    table.add(chassis(0x0301, ofType(MAIN_SERVER)));
-    ChassisRun run(table);
+    ChassisRun run(systemAndChassis({ofType(DESKTOP), ofType(MAIN_SERVER)}));
     std::vector<IC::Node*> const nodes = run.chassisNodes();
     ASSERT_EQ(2u, nodes.size());
     EXPECT_EQ(nodes[1]->getNodeId(), run.planarParent());
 }
 
 TEST(ChassisPlanarHome, FirstMainChassisWinsOverALaterOne) {
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.add(chassis(0x0300, ofType(DESKTOP)));
-    table.add(chassis(0x0301, ofType(TOWER)));
-    table.add(chassis(0x0302, ofType(RACK_MOUNT)));
-    ChassisRun run(table);
+    ChassisRun run(systemAndChassis({ofType(DESKTOP), ofType(TOWER), ofType(RACK_MOUNT)}));
     std::vector<IC::Node*> const nodes = run.chassisNodes();
     ASSERT_EQ(3u, nodes.size());
     EXPECT_EQ(nodes[1]->getNodeId(), run.planarParent());
 }
 
 TEST(ChassisPlanarHome, MotherboardElementInTheFirstWinsOverALaterMainChassis) {
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.add(chassis(0x0300, ofType(DESKTOP, {MOTHERBOARD_ELEMENT})));
-    table.add(chassis(0x0301, ofType(MAIN_SERVER)));
-    ChassisRun run(table);
+    ChassisRun run(systemAndChassis({ofType(DESKTOP, {MOTHERBOARD_ELEMENT}), ofType(MAIN_SERVER)}));
     std::vector<IC::Node*> const nodes = run.chassisNodes();
     ASSERT_EQ(2u, nodes.size());
     EXPECT_EQ(nodes[0]->getNodeId(), run.planarParent());
 }
 
 TEST(ChassisPlanarHome, LaterChassisWithABaseboardElementWinsOverAnEarlierOne) {
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.add(chassis(0x0300, ofType(DESKTOP, {MOTHERBOARD_ELEMENT})));
-    table.add(chassis(0x0301, ofType(MAIN_SERVER)));
-    table.add(chassis(0x0302, ofType(DESKTOP, {DAUGHTER_BOARD_ELEMENT})));
-    ChassisRun run(table);
+    ChassisRun run(systemAndChassis({ofType(DESKTOP, {MOTHERBOARD_ELEMENT}), ofType(MAIN_SERVER),
+                                     ofType(DESKTOP, {DAUGHTER_BOARD_ELEMENT})}));
     std::vector<IC::Node*> const nodes = run.chassisNodes();
     ASSERT_EQ(3u, nodes.size());
     EXPECT_EQ(nodes[2]->getNodeId(), run.planarParent());
 }
 
 TEST(ChassisPlanarHome, ServerBladeElementWinsOverAnEarlierMainChassis) {
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.add(chassis(0x0300, ofType(MAIN_SERVER)));
-    table.add(chassis(0x0301, ofType(BLADE_ENCLOSURE, {0x83, SERVER_BLADE_ELEMENT})));
-    ChassisRun run(table);
+    ChassisRun run(systemAndChassis(
+        {ofType(MAIN_SERVER), ofType(BLADE_ENCLOSURE, {0x83, SERVER_BLADE_ELEMENT})}));
     std::vector<IC::Node*> const nodes = run.chassisNodes();
     ASSERT_EQ(2u, nodes.size());
     EXPECT_EQ(nodes[1]->getNodeId(), run.planarParent());
@@ -622,23 +574,15 @@ TEST(ChassisPlanarHome, ServerBladeElementWinsOverAnEarlierMainChassis) {
 TEST(ChassisPlanarHome, OtherElementsAndStructureTypesDoNotMakeAHome) {
     // 0x04 is a connectivity switch; 0x83, 0x89 and 0x8A name SMBIOS
     // structure types 3, 9 and 10, not baseboards.
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.add(chassis(0x0300, ofType(DESKTOP)));
-    table.add(chassis(0x0301, ofType(DESKTOP, {0x04, 0x83, 0x89, 0x8A, 0x01, 0x02})));
-    ChassisRun run(table);
+    ChassisRun run(
+        systemAndChassis({ofType(DESKTOP), ofType(DESKTOP, {0x04, 0x83, 0x89, 0x8A, 0x01, 0x02})}));
     std::vector<IC::Node*> const nodes = run.chassisNodes();
     ASSERT_EQ(2u, nodes.size());
     EXPECT_EQ(nodes[0]->getNodeId(), run.planarParent());
 }
 
 TEST(ChassisPlanarHome, NoMainChassisAndNoElementLeavesTheFirstChassis) {
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.add(chassis(0x0300, ofType(0x01)));
-    table.add(chassis(0x0301, ofType(DESKTOP)));
-    table.add(chassis(0x0302, ofType(BLADE_ENCLOSURE)));
-    ChassisRun run(table);
+    ChassisRun run(systemAndChassis({ofType(0x01), ofType(DESKTOP), ofType(BLADE_ENCLOSURE)}));
     std::vector<IC::Node*> const nodes = run.chassisNodes();
     ASSERT_EQ(3u, nodes.size());
     EXPECT_EQ(nodes[0]->getNodeId(), run.planarParent());
@@ -646,11 +590,7 @@ TEST(ChassisPlanarHome, NoMainChassisAndNoElementLeavesTheFirstChassis) {
 
 TEST(ChassisPlanarHome, ExpansionChassisFirstLeavesTheHomeAtZeroAndThePlanarFindsNoParent) {
     smbiostest::LogCapture log;
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.add(chassis(0x0300, ofType(EXPANSION)));
-    table.add(chassis(0x0301, ofType(DESKTOP)));
-    ChassisRun run(table);
+    ChassisRun run(systemAndChassis({ofType(EXPANSION), ofType(DESKTOP)}));
 
     std::vector<IC::Node*> const nodes = run.chassisNodes();
     ASSERT_EQ(1u, nodes.size());
@@ -662,22 +602,14 @@ TEST(ChassisPlanarHome, ExpansionChassisFirstLeavesTheHomeAtZeroAndThePlanarFind
 }
 
 TEST(ChassisPlanarHome, ExpansionChassisFirstThenMainChassisHoldsThePlanar) {
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.add(chassis(0x0300, ofType(EXPANSION)));
-    table.add(chassis(0x0301, ofType(TOWER)));
-    ChassisRun run(table);
+    ChassisRun run(systemAndChassis({ofType(EXPANSION), ofType(TOWER)}));
     std::vector<IC::Node*> const nodes = run.chassisNodes();
     ASSERT_EQ(1u, nodes.size());
     EXPECT_EQ(nodes[0]->getNodeId(), run.planarParent());
 }
 
 TEST(ChassisPlanarHome, ExpansionChassisFirstThenBaseboardElementHoldsThePlanar) {
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.add(chassis(0x0300, ofType(EXPANSION)));
-    table.add(chassis(0x0301, ofType(DESKTOP, {MOTHERBOARD_ELEMENT})));
-    ChassisRun run(table);
+    ChassisRun run(systemAndChassis({ofType(EXPANSION), ofType(DESKTOP, {MOTHERBOARD_ELEMENT})}));
     std::vector<IC::Node*> const nodes = run.chassisNodes();
     ASSERT_EQ(1u, nodes.size());
     EXPECT_EQ(nodes[0]->getNodeId(), run.planarParent());
@@ -685,11 +617,7 @@ TEST(ChassisPlanarHome, ExpansionChassisFirstThenBaseboardElementHoldsThePlanar)
 
 TEST(ChassisPlanarHome, EveryChassisAnExpansionChassisCallsThePlanarBuilderWithParentZero) {
     smbiostest::LogCapture log;
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.add(chassis(0x0300, ofType(EXPANSION)));
-    table.add(chassis(0x0301, ofType(0x80 | EXPANSION)));
-    ChassisRun run(table);
+    ChassisRun run(systemAndChassis({ofType(EXPANSION), ofType(0x80 | EXPANSION)}));
 
     EXPECT_TRUE(run.chassisNodes().empty());
     EXPECT_EQ(1u, run.mi.nodeList.size());
@@ -703,10 +631,7 @@ TEST(ChassisPlanarHome, EveryChassisAnExpansionChassisCallsThePlanarBuilderWithP
 
 TEST(ChassisContainedElements, StructureTypesAreLoggedAsTheirLowSevenBits) {
     smbiostest::LogCapture log;
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.add(chassis(0x0300, ofType(TOWER, {0x83, 0x0A, 0x91, 0x04, 0xFF})));
-    ChassisRun run(table);
+    ChassisRun run(systemAndChassis({ofType(TOWER, {0x83, 0x0A, 0x91, 0x04, 0xFF})}));
 
     EXPECT_EQ(2u, log.count("Contained Element Record count=5")) << log.dump();
     EXPECT_EQ(2u, log.count("Contained Element Record Length=3")) << log.dump();
@@ -716,10 +641,7 @@ TEST(ChassisContainedElements, StructureTypesAreLoggedAsTheirLowSevenBits) {
 
 TEST(ChassisContainedElements, NoRecordsLogNone) {
     smbiostest::LogCapture log;
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.add(chassis(0x0300, ofType(TOWER)));
-    ChassisRun run(table);
+    ChassisRun run(systemAndChassis({ofType(TOWER)}));
     EXPECT_EQ(2u, log.count("Contained Element Record count=0")) << log.dump();
     EXPECT_EQ(2u, log.count(" < NONE > ")) << log.dump();
     EXPECT_EQ(0u, log.count("Contained Elements=")) << log.dump();
@@ -727,13 +649,9 @@ TEST(ChassisContainedElements, NoRecordsLogNone) {
 
 TEST(ChassisContainedElements, RecordCountWithoutRecordLengthLogsNone) {
     smbiostest::LogCapture log;
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
     ChassisFields fields = ofType(DESKTOP, {MOTHERBOARD_ELEMENT, MOTHERBOARD_ELEMENT});
     fields.recordLength = 0;
-    table.add(chassis(0x0300, fields));
-    table.add(chassis(0x0301, ofType(TOWER)));
-    ChassisRun run(table);
+    ChassisRun run(systemAndChassis({fields, ofType(TOWER)}));
 
     EXPECT_EQ(2u, log.count("Contained Element Record count=2")) << log.dump();
     // Both chassis log a record length of 0 and no records.

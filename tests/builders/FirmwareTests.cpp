@@ -131,6 +131,31 @@ Structure eventLog(uint16_t handle) {
 // The firmware nodes (type 3) in node-list order.
 std::vector<IC::Node*> firmwareNodes(TestMI const& mi) { return nodesOfType(mi, 3); }
 
+// The firmware builder run on mi over a table of the structures, in that
+// order, under a planar node (so the first firmware node gets id 3). The log
+// is captured from the run on; firmware holds the firmware nodes made.
+struct FirmwareRun {
+    FirmwareRun(TestMI& mi, std::vector<Structure> const& structures)
+        : parsed(tableOf(structures).build()), lists(parsed) {
+        IC::MutableNode* planar = buildertest::addParent(mi);
+        mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+        firmware = firmwareNodes(mi);
+    }
+
+    static TableBuilder tableOf(std::vector<Structure> const& structures) {
+        TableBuilder table;
+        for (Structure const& structure : structures) {
+            table.add(structure);
+        }
+        return table;
+    }
+
+    SD::SmBios parsed;
+    StructureLists lists;
+    LogCapture log;
+    std::vector<IC::Node*> firmware;
+};
+
 size_t loggedCount(std::string const& text) {
     size_t count = 0;
     for (std::string const& logged : frametest::loggedTexts()) {
@@ -220,18 +245,11 @@ TEST(FirmwareFindFirstNumber, ReadsTheDecimalNumberFromTheFirstDigit) {
 
 TEST(FirmwareOemNodes, DiagnosticsStringWithDashInBracketsSetsEveryField) {
     TestMI mi;
-    TableBuilder builder;
-    builder.add(oemStrings(0x0B00, {"Corvane Diagnostics -[ABCD12X-2.10]-"}));
-    builder.add(eventLog(0x0F00));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    LogCapture log;
-    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+    FirmwareRun const run(
+        mi, {oemStrings(0x0B00, {"Corvane Diagnostics -[ABCD12X-2.10]-"}), eventLog(0x0F00)});
 
-    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
-    ASSERT_EQ(1u, firmware.size()) << log.dump();
-    IC::Node const* node = firmware[0];
+    ASSERT_EQ(1u, run.firmware.size()) << run.log.dump();
+    IC::Node const* node = run.firmware[0];
     EXPECT_TRUE(isNode(node, 3, 2, 3, 1, 1, "Diagnostics"));
     EXPECT_EQ(std::vector<unsigned int>{1}, node->getMIIds());
     EXPECT_EQ((Ids{36, 70, 104, 107, 108, 134, 307}), propertyIds(node));
@@ -243,183 +261,128 @@ TEST(FirmwareOemNodes, DiagnosticsStringWithDashInBracketsSetsEveryField) {
     EXPECT_TRUE(hasUnsigned(node, 104, 2));
     EXPECT_TRUE(hasUnsigned(node, 107, 10));
     // The node is recorded in its structure's entry.
-    EXPECT_EQ(node, lists.storage[11][0].node);
+    EXPECT_EQ(node, run.lists.storage[11][0].node);
 
     EXPECT_TRUE(hasEventLogChild(mi, node, 4));
     EXPECT_EQ(3u, mi.nodeList.size());
-    EXPECT_EQ(1u, loggedCount("makeFirmwareNodes entry")) << log.dump();
-    EXPECT_EQ(1u, loggedCount("makeFirmwareNodes exit")) << log.dump();
+    EXPECT_EQ(1u, loggedCount("makeFirmwareNodes entry")) << run.log.dump();
+    EXPECT_EQ(1u, loggedCount("makeFirmwareNodes exit")) << run.log.dump();
 }
 
 TEST(FirmwareOemNodes, OstrelStringIsNamedOTL) {
     TestMI mi;
-    TableBuilder builder;
-    builder.add(oemStrings(0x0B00, {"Corvane Ostrel -[SP77-1.3]-"}));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+    FirmwareRun const run(mi, {oemStrings(0x0B00, {"Corvane Ostrel -[SP77-1.3]-"})});
 
-    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
-    ASSERT_EQ(1u, firmware.size());
-    EXPECT_TRUE(isNode(firmware[0], 3, 2, 3, 1, 1, "OTL"));
-    EXPECT_TRUE(hasString(firmware[0], 108, "OTL"));
-    EXPECT_TRUE(hasString(firmware[0], 36, "Corvane"));
-    EXPECT_TRUE(hasString(firmware[0], 70, "SP77"));
-    EXPECT_TRUE(hasString(firmware[0], 134, "1.3"));
-    EXPECT_TRUE(hasUnsigned(firmware[0], 104, 1));
-    EXPECT_TRUE(hasUnsigned(firmware[0], 107, 3));
+    ASSERT_EQ(1u, run.firmware.size());
+    EXPECT_TRUE(isNode(run.firmware[0], 3, 2, 3, 1, 1, "OTL"));
+    EXPECT_TRUE(hasString(run.firmware[0], 108, "OTL"));
+    EXPECT_TRUE(hasString(run.firmware[0], 36, "Corvane"));
+    EXPECT_TRUE(hasString(run.firmware[0], 70, "SP77"));
+    EXPECT_TRUE(hasString(run.firmware[0], 134, "1.3"));
+    EXPECT_TRUE(hasUnsigned(run.firmware[0], 104, 1));
+    EXPECT_TRUE(hasUnsigned(run.firmware[0], 107, 3));
 }
 
 TEST(FirmwareOemNodes, StringsWithoutAKnownNameMakeNoNode) {
     TestMI mi;
-    TableBuilder builder;
     // Case-sensitive: "diagnostics" and "uefi" are not recognised.
-    builder.add(oemStrings(0x0B00, {"Corvane Systems", "diagnostics -[A-1.0]-", "uefi"}));
-    builder.add(biosInformation(0x0000, "Corvane", "1.05", "03/14/2021"));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+    FirmwareRun const run(mi,
+                          {oemStrings(0x0B00, {"Corvane Systems", "diagnostics -[A-1.0]-", "uefi"}),
+                           biosInformation(0x0000, "Corvane", "1.05", "03/14/2021")});
 
-    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
-    ASSERT_EQ(1u, firmware.size());
-    EXPECT_TRUE(isNode(firmware[0], 3, 2, 3, 1, 1, "BIOS"));
-    EXPECT_EQ(nullptr, lists.storage[11][0].node);
+    ASSERT_EQ(1u, run.firmware.size());
+    EXPECT_TRUE(isNode(run.firmware[0], 3, 2, 3, 1, 1, "BIOS"));
+    EXPECT_EQ(nullptr, run.lists.storage[11][0].node);
 }
 
 TEST(FirmwareOemNodes, DiagnosticsAndUefiInOneStringMakeADiagnosticsNodeAndBiosStaysBios) {
     TestMI mi;
-    TableBuilder builder;
-    builder.add(oemStrings(0x0B00, {"Corvane UEFI Diagnostics -[D1-4.0]-"}));
-    builder.add(biosInformation(0x0000, "Corvane", "C1 [B9-1.2]", "03/14/2021"));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+    FirmwareRun const run(mi, {oemStrings(0x0B00, {"Corvane UEFI Diagnostics -[D1-4.0]-"}),
+                               biosInformation(0x0000, "Corvane", "C1 [B9-1.2]", "03/14/2021")});
 
-    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
-    ASSERT_EQ(2u, firmware.size());
-    EXPECT_TRUE(isNode(firmware[0], 3, 2, 3, 1, 1, "Diagnostics"));
-    EXPECT_TRUE(hasString(firmware[0], 108, "Diagnostics"));
-    EXPECT_TRUE(isNode(firmware[1], 4, 2, 3, 2, 1, "BIOS"));
-    EXPECT_TRUE(hasString(firmware[1], 108, "BIOS"));
+    ASSERT_EQ(2u, run.firmware.size());
+    EXPECT_TRUE(isNode(run.firmware[0], 3, 2, 3, 1, 1, "Diagnostics"));
+    EXPECT_TRUE(hasString(run.firmware[0], 108, "Diagnostics"));
+    EXPECT_TRUE(isNode(run.firmware[1], 4, 2, 3, 2, 1, "BIOS"));
+    EXPECT_TRUE(hasString(run.firmware[1], 108, "BIOS"));
 }
 
 TEST(FirmwareOemNodes, UefiStringAloneMakesNoNodeAndNamesTheBiosNodesUefi) {
     TestMI mi;
-    TableBuilder builder;
-    builder.add(oemStrings(0x0B00, {"Corvane Systems"}));
-    // The flag set by a later structure still names every BIOS node.
-    builder.add(oemStrings(0x0B01, {"Boot mode UEFI"}));
-    builder.add(biosInformation(0x0000, "Corvane", "C1 [B9-1.2]", "03/14/2021"));
-    builder.add(biosInformation(0x0001, "Corvane", "C2 [B9-1.3]", "04/14/2021"));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+    FirmwareRun const run(mi, {oemStrings(0x0B00, {"Corvane Systems"}),
+                               // The flag set by a later structure still names every BIOS node.
+                               oemStrings(0x0B01, {"Boot mode UEFI"}),
+                               biosInformation(0x0000, "Corvane", "C1 [B9-1.2]", "03/14/2021"),
+                               biosInformation(0x0001, "Corvane", "C2 [B9-1.3]", "04/14/2021")});
 
-    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
-    ASSERT_EQ(2u, firmware.size());
-    EXPECT_TRUE(isNode(firmware[0], 3, 2, 3, 1, 1, "UEFI"));
-    EXPECT_TRUE(hasString(firmware[0], 108, "UEFI"));
-    EXPECT_TRUE(isNode(firmware[1], 4, 2, 3, 2, 1, "UEFI"));
-    EXPECT_TRUE(hasString(firmware[1], 108, "UEFI"));
-    EXPECT_EQ(nullptr, lists.storage[11][1].node);
+    ASSERT_EQ(2u, run.firmware.size());
+    EXPECT_TRUE(isNode(run.firmware[0], 3, 2, 3, 1, 1, "UEFI"));
+    EXPECT_TRUE(hasString(run.firmware[0], 108, "UEFI"));
+    EXPECT_TRUE(isNode(run.firmware[1], 4, 2, 3, 2, 1, "UEFI"));
+    EXPECT_TRUE(hasString(run.firmware[1], 108, "UEFI"));
+    EXPECT_EQ(nullptr, run.lists.storage[11][1].node);
 }
 
 TEST(FirmwareOemNodes, UefiTakesPrecedenceOverOstrelInOneString) {
     TestMI mi;
-    TableBuilder builder;
-    builder.add(oemStrings(0x0B00, {"Ostrel UEFI -[SP-1.0]-"}));
-    builder.add(biosInformation(0x0000, "Corvane", "C1 [B9-1.2]", "03/14/2021"));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+    FirmwareRun const run(mi, {oemStrings(0x0B00, {"Ostrel UEFI -[SP-1.0]-"}),
+                               biosInformation(0x0000, "Corvane", "C1 [B9-1.2]", "03/14/2021")});
 
-    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
-    ASSERT_EQ(1u, firmware.size());
-    EXPECT_TRUE(isNode(firmware[0], 3, 2, 3, 1, 1, "UEFI"));
+    ASSERT_EQ(1u, run.firmware.size());
+    EXPECT_TRUE(isNode(run.firmware[0], 3, 2, 3, 1, 1, "UEFI"));
 }
 
 TEST(FirmwareOemNodes, EmptyStringInPosition2Of5EndsTheStructure) {
     TestMI mi;
-    TableBuilder builder;
     // Count 5 but one string: string 2 is empty (names no string), so 3 to 5
     // are never read.
     Structure first(11, 0x0B00);
     first.byte(5).addString("Corvane Ostrel -[SP1-1.0]-");
-    builder.add(first);
-    builder.add(oemStrings(0x0B01, {"Corvane Diagnostics -[D2-2.0]-"}));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    LogCapture log;
-    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+    FirmwareRun const run(mi, {first, oemStrings(0x0B01, {"Corvane Diagnostics -[D2-2.0]-"})});
 
-    EXPECT_EQ(1u, loggedCount("OEM string is NULL")) << log.dump();
-    EXPECT_TRUE(log.contains("Table::getString index 2 ")) << log.dump();
-    EXPECT_FALSE(log.contains("Table::getString index 3 ")) << log.dump();
-    EXPECT_FALSE(log.contains("Table::getString index 5 ")) << log.dump();
+    EXPECT_EQ(1u, loggedCount("OEM string is NULL")) << run.log.dump();
+    EXPECT_TRUE(run.log.contains("Table::getString index 2 ")) << run.log.dump();
+    EXPECT_FALSE(run.log.contains("Table::getString index 3 ")) << run.log.dump();
+    EXPECT_FALSE(run.log.contains("Table::getString index 5 ")) << run.log.dump();
     // The next structure is examined all the same.
-    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
-    ASSERT_EQ(2u, firmware.size());
-    EXPECT_TRUE(isNode(firmware[0], 3, 2, 3, 1, 1, "OTL"));
-    EXPECT_TRUE(isNode(firmware[1], 4, 2, 3, 2, 1, "Diagnostics"));
+    ASSERT_EQ(2u, run.firmware.size());
+    EXPECT_TRUE(isNode(run.firmware[0], 3, 2, 3, 1, 1, "OTL"));
+    EXPECT_TRUE(isNode(run.firmware[1], 4, 2, 3, 2, 1, "Diagnostics"));
 }
 
 TEST(FirmwareOemNodes, EmptyFirstStringSkipsTheStringsAfterIt) {
     TestMI mi;
-    TableBuilder builder;
     // A set that starts with an empty string followed by a real one.
     Structure structure(11, 0x0B00);
     structure.byte(2).addString("").addString("Corvane Diagnostics -[D2-2.0]-");
-    builder.add(structure);
-    SD::SmBios parsed(builder.build());
-    ASSERT_EQ(1u, parsed.getTables().size());
-    ASSERT_STREQ("", parsed.getTables()[0].getString(1));
-    ASSERT_STREQ("Corvane Diagnostics -[D2-2.0]-", parsed.getTables()[0].getString(2));
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    LogCapture log;
-    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+    FirmwareRun const run(mi, {structure});
+    ASSERT_EQ(1u, run.parsed.getTables().size());
+    ASSERT_STREQ("", run.parsed.getTables()[0].getString(1));
+    ASSERT_STREQ("Corvane Diagnostics -[D2-2.0]-", run.parsed.getTables()[0].getString(2));
 
-    EXPECT_EQ(1u, loggedCount("OEM string is NULL")) << log.dump();
-    EXPECT_TRUE(firmwareNodes(mi).empty());
+    EXPECT_EQ(1u, loggedCount("OEM string is NULL")) << run.log.dump();
+    EXPECT_TRUE(run.firmware.empty());
 }
 
 TEST(FirmwareOemNodes, CountZeroReadsNoString) {
     TestMI mi;
-    TableBuilder builder;
     Structure structure(11, 0x0B00);
     structure.byte(0).addString("Corvane Diagnostics -[D2-2.0]-");
-    builder.add(structure);
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    LogCapture log;
-    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+    FirmwareRun const run(mi, {structure});
 
-    EXPECT_TRUE(firmwareNodes(mi).empty());
-    EXPECT_FALSE(log.contains("OEM string is NULL")) << log.dump();
-    EXPECT_FALSE(log.contains("Table::getString")) << log.dump();
+    EXPECT_TRUE(run.firmware.empty());
+    EXPECT_FALSE(run.log.contains("OEM string is NULL")) << run.log.dump();
+    EXPECT_FALSE(run.log.contains("Table::getString")) << run.log.dump();
 }
 
 TEST(FirmwareOemNodes, BracketsWithoutDashAndCloseParenBeforeDashRebuild307) {
     TestMI mi;
-    TableBuilder builder;
     // ") " at r, the first "-" at e: the version is s.substr(r + 2, e - r - 3).
-    builder.add(oemStrings(0x0B00, {"Corvane Ostrel (OTL) 1.25 -[XYZ99]-"}));
-    builder.add(eventLog(0x0F00));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+    FirmwareRun const run(
+        mi, {oemStrings(0x0B00, {"Corvane Ostrel (OTL) 1.25 -[XYZ99]-"}), eventLog(0x0F00)});
 
-    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
-    ASSERT_EQ(1u, firmware.size());
-    IC::Node const* node = firmware[0];
+    ASSERT_EQ(1u, run.firmware.size());
+    IC::Node const* node = run.firmware[0];
     EXPECT_TRUE(isNode(node, 3, 2, 3, 1, 1, "OTL"));
     EXPECT_EQ((Ids{36, 70, 104, 107, 108, 134, 307}), propertyIds(node));
     EXPECT_TRUE(hasString(node, 307, "-[XYZ99-1.25]-"));
@@ -432,35 +395,23 @@ TEST(FirmwareOemNodes, BracketsWithoutDashAndCloseParenBeforeDashRebuild307) {
 
 TEST(FirmwareOemNodes, CloseParenWithoutBlankAfterItTakesTheVersionFromTwoPastIt) {
     TestMI mi;
-    TableBuilder builder;
     // r + 2 skips one character after ")", whatever it is; the length stops
     // two characters before the first "-".
-    builder.add(oemStrings(0x0B00, {"Corvane Diagnostics (D)v3.4  -[Q1]-"}));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+    FirmwareRun const run(mi, {oemStrings(0x0B00, {"Corvane Diagnostics (D)v3.4  -[Q1]-"})});
 
-    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
-    ASSERT_EQ(1u, firmware.size());
-    EXPECT_TRUE(hasString(firmware[0], 134, "3.4 "));
-    EXPECT_TRUE(hasString(firmware[0], 307, "-[Q1-3.4 ]-"));
-    EXPECT_TRUE(hasUnsigned(firmware[0], 104, 3));
-    EXPECT_TRUE(hasUnsigned(firmware[0], 107, 4));
+    ASSERT_EQ(1u, run.firmware.size());
+    EXPECT_TRUE(hasString(run.firmware[0], 134, "3.4 "));
+    EXPECT_TRUE(hasString(run.firmware[0], 307, "-[Q1-3.4 ]-"));
+    EXPECT_TRUE(hasUnsigned(run.firmware[0], 104, 3));
+    EXPECT_TRUE(hasUnsigned(run.firmware[0], 107, 4));
 }
 
 TEST(FirmwareOemNodes, BracketsWithoutDashAndWithoutCloseParenSetAnEmptyVersion) {
     TestMI mi;
-    TableBuilder builder;
-    builder.add(oemStrings(0x0B00, {"Corvane Ostrel -[XYZ99]-"}));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+    FirmwareRun const run(mi, {oemStrings(0x0B00, {"Corvane Ostrel -[XYZ99]-"})});
 
-    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
-    ASSERT_EQ(1u, firmware.size());
-    IC::Node const* node = firmware[0];
+    ASSERT_EQ(1u, run.firmware.size());
+    IC::Node const* node = run.firmware[0];
     EXPECT_EQ((Ids{36, 70, 108, 134, 307}), propertyIds(node));
     EXPECT_TRUE(hasString(node, 307, "-[XYZ99]-"));
     EXPECT_TRUE(hasString(node, 70, "XYZ99"));
@@ -469,17 +420,11 @@ TEST(FirmwareOemNodes, BracketsWithoutDashAndWithoutCloseParenSetAnEmptyVersion)
 
 TEST(FirmwareOemNodes, BracketsWithoutAnyDashAndWithCloseParenSetAnEmptyVersion) {
     TestMI mi;
-    TableBuilder builder;
     // ")" but no "-" anywhere: neither 307 nor a rebuilt one.
-    builder.add(oemStrings(0x0B00, {"Corvane Diagnostics (D) 2.0 [ XYZ ]"}));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+    FirmwareRun const run(mi, {oemStrings(0x0B00, {"Corvane Diagnostics (D) 2.0 [ XYZ ]"})});
 
-    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
-    ASSERT_EQ(1u, firmware.size());
-    IC::Node const* node = firmware[0];
+    ASSERT_EQ(1u, run.firmware.size());
+    IC::Node const* node = run.firmware[0];
     EXPECT_EQ((Ids{36, 70, 108, 134}), propertyIds(node));
     // The inner text is trimmed: " XYZ " keeps its one leading blank (start
     // 0) and loses the trailing one.
@@ -489,188 +434,137 @@ TEST(FirmwareOemNodes, BracketsWithoutAnyDashAndWithCloseParenSetAnEmptyVersion)
 
 TEST(FirmwareOemNodes, WithoutBracketsOnlyNameVendorAndIdentificationAreSet) {
     TestMI mi;
-    TableBuilder builder;
-    builder.add(oemStrings(0x0B00, {"Corvane Diagnostics - build 7", "Corvane Ostrel"}));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+    FirmwareRun const run(
+        mi, {oemStrings(0x0B00, {"Corvane Diagnostics - build 7", "Corvane Ostrel"})});
 
-    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
-    ASSERT_EQ(2u, firmware.size());
-    EXPECT_EQ((Ids{36, 108, 307}), propertyIds(firmware[0]));
-    EXPECT_TRUE(hasString(firmware[0], 307, "- build 7"));
-    EXPECT_EQ((Ids{36, 108}), propertyIds(firmware[1]));
-    EXPECT_TRUE(hasString(firmware[1], 108, "OTL"));
+    ASSERT_EQ(2u, run.firmware.size());
+    EXPECT_EQ((Ids{36, 108, 307}), propertyIds(run.firmware[0]));
+    EXPECT_TRUE(hasString(run.firmware[0], 307, "- build 7"));
+    EXPECT_EQ((Ids{36, 108}), propertyIds(run.firmware[1]));
+    EXPECT_TRUE(hasString(run.firmware[1], 108, "OTL"));
 }
 
 TEST(FirmwareOemNodes, DashPositionFromTheUntrimmedTextIsAppliedToTheTrimmedText) {
     TestMI mi;
-    TableBuilder builder;
     // "[  AB-1.2]": d = 4 in "  AB-1.2"; trimmed " AB-1.2"; 70 = substr(0, 4),
     // 134 = substr(5).
-    builder.add(oemStrings(0x0B00, {"Corvane Diagnostics [  AB-1.2]"}));
-    // "[ AB-1.2]": d = 3 in " AB-1.2", which trimming leaves as it is.
-    builder.add(oemStrings(0x0B01, {"Corvane Ostrel [ AB-1.2]"}));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+    FirmwareRun const run(mi, {oemStrings(0x0B00, {"Corvane Diagnostics [  AB-1.2]"}),
+                               // "[ AB-1.2]": d = 3 in " AB-1.2", which trimming leaves as it is.
+                               oemStrings(0x0B01, {"Corvane Ostrel [ AB-1.2]"})});
 
-    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
-    ASSERT_EQ(2u, firmware.size());
-    EXPECT_TRUE(hasString(firmware[0], 307, "-1.2]"));
-    EXPECT_TRUE(hasString(firmware[0], 70, " AB-"));
-    EXPECT_TRUE(hasString(firmware[0], 134, ".2"));
-    EXPECT_TRUE(hasUnsigned(firmware[0], 104, 0));
-    EXPECT_TRUE(hasUnsigned(firmware[0], 107, 2));
+    ASSERT_EQ(2u, run.firmware.size());
+    EXPECT_TRUE(hasString(run.firmware[0], 307, "-1.2]"));
+    EXPECT_TRUE(hasString(run.firmware[0], 70, " AB-"));
+    EXPECT_TRUE(hasString(run.firmware[0], 134, ".2"));
+    EXPECT_TRUE(hasUnsigned(run.firmware[0], 104, 0));
+    EXPECT_TRUE(hasUnsigned(run.firmware[0], 107, 2));
 
-    EXPECT_TRUE(hasString(firmware[1], 307, "-1.2]"));
-    EXPECT_TRUE(hasString(firmware[1], 70, " AB"));
-    EXPECT_TRUE(hasString(firmware[1], 134, "1.2"));
-    EXPECT_TRUE(hasUnsigned(firmware[1], 104, 1));
-    EXPECT_TRUE(hasUnsigned(firmware[1], 107, 2));
+    EXPECT_TRUE(hasString(run.firmware[1], 307, "-1.2]"));
+    EXPECT_TRUE(hasString(run.firmware[1], 70, " AB"));
+    EXPECT_TRUE(hasString(run.firmware[1], 134, "1.2"));
+    EXPECT_TRUE(hasUnsigned(run.firmware[1], 104, 1));
+    EXPECT_TRUE(hasUnsigned(run.firmware[1], 107, 2));
 }
 
 TEST(FirmwareOemNodes, VersionWithoutDotGivesMinorZero) {
     TestMI mi;
-    TableBuilder builder;
-    builder.add(oemStrings(0x0B00, {"Corvane Diagnostics -[ABC-7]-"}));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+    FirmwareRun const run(mi, {oemStrings(0x0B00, {"Corvane Diagnostics -[ABC-7]-"})});
 
-    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
-    ASSERT_EQ(1u, firmware.size());
-    EXPECT_TRUE(hasString(firmware[0], 134, "7"));
-    EXPECT_TRUE(hasUnsigned(firmware[0], 104, 7));
-    EXPECT_TRUE(hasUnsigned(firmware[0], 107, 0));
+    ASSERT_EQ(1u, run.firmware.size());
+    EXPECT_TRUE(hasString(run.firmware[0], 134, "7"));
+    EXPECT_TRUE(hasUnsigned(run.firmware[0], 104, 7));
+    EXPECT_TRUE(hasUnsigned(run.firmware[0], 107, 0));
 }
 
 TEST(FirmwareOemNodes, VersionBeginningWithALetterGivesMajorZero) {
     TestMI mi;
-    TableBuilder builder;
-    builder.add(oemStrings(0x0B00, {"Corvane Diagnostics -[ABC-v2.3]-"}));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+    FirmwareRun const run(mi, {oemStrings(0x0B00, {"Corvane Diagnostics -[ABC-v2.3]-"})});
 
-    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
-    ASSERT_EQ(1u, firmware.size());
-    EXPECT_TRUE(hasString(firmware[0], 134, "v2.3"));
-    EXPECT_TRUE(hasUnsigned(firmware[0], 104, 0));
-    EXPECT_TRUE(hasUnsigned(firmware[0], 107, 3));
+    ASSERT_EQ(1u, run.firmware.size());
+    EXPECT_TRUE(hasString(run.firmware[0], 134, "v2.3"));
+    EXPECT_TRUE(hasUnsigned(run.firmware[0], 104, 0));
+    EXPECT_TRUE(hasUnsigned(run.firmware[0], 107, 3));
 }
 
 TEST(FirmwareOemNodes, CloseParenAsLastCharacterRaisesOutOfRangeAndAbandonsTheStructure) {
     TestMI mi;
-    TableBuilder builder;
-    builder.add(oemStrings(0x0B00, {"Corvane Diagnostics -[D1-1.0]-", "Corvane Ostrel -[SP9])",
-                                    "Corvane Diagnostics -[D3-3.0]-"}));
-    builder.add(oemStrings(0x0B01, {"Corvane Ostrel -[SP2-2.0]-"}));
-    builder.add(biosInformation(0x0000, "Corvane", "C1 [B9-1.2]", "03/14/2021"));
-    builder.add(eventLog(0x0F00));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    LogCapture log;
-    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+    FirmwareRun const run(
+        mi, {oemStrings(0x0B00, {"Corvane Diagnostics -[D1-1.0]-", "Corvane Ostrel -[SP9])",
+                                 "Corvane Diagnostics -[D3-3.0]-"}),
+             oemStrings(0x0B01, {"Corvane Ostrel -[SP2-2.0]-"}),
+             biosInformation(0x0000, "Corvane", "C1 [B9-1.2]", "03/14/2021"), eventLog(0x0F00)});
 
     // The failing string is the second node (ordinal 2): printed as table 0,
     // index ordinal - 1 with the ordinal already moved on.
     std::string const logged = frametest::firstLogged("Exception=");
-    EXPECT_NE(std::string::npos, logged.find("Exception=basic_string::substr")) << log.dump();
+    EXPECT_NE(std::string::npos, logged.find("Exception=basic_string::substr")) << run.log.dump();
     EXPECT_NE(std::string::npos, logged.find(" Type=")) << logged;
     EXPECT_NE(std::string::npos, logged.find("Table 0 index =2")) << logged;
-    EXPECT_EQ((std::vector<int>{6000}), frametest::loggedLevels("Exception=")) << log.dump();
+    EXPECT_EQ((std::vector<int>{6000}), frametest::loggedLevels("Exception=")) << run.log.dump();
 
-    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
-    ASSERT_EQ(4u, firmware.size()) << log.dump();
-    EXPECT_TRUE(isNode(firmware[0], 3, 2, 3, 1, 1, "Diagnostics"));
-    EXPECT_TRUE(hasEventLogChild(mi, firmware[0], 4));
+    ASSERT_EQ(4u, run.firmware.size()) << run.log.dump();
+    EXPECT_TRUE(isNode(run.firmware[0], 3, 2, 3, 1, 1, "Diagnostics"));
+    EXPECT_TRUE(hasEventLogChild(mi, run.firmware[0], 4));
     // The failed node keeps what was set before the failure and gets no
     // event-log node.
-    EXPECT_TRUE(isNode(firmware[1], 5, 2, 3, 2, 1, "OTL"));
-    EXPECT_EQ((Ids{36, 108, 307}), propertyIds(firmware[1]));
-    EXPECT_TRUE(hasString(firmware[1], 307, "-[SP9])"));
+    EXPECT_TRUE(isNode(run.firmware[1], 5, 2, 3, 2, 1, "OTL"));
+    EXPECT_EQ((Ids{36, 108, 307}), propertyIds(run.firmware[1]));
+    EXPECT_TRUE(hasString(run.firmware[1], 307, "-[SP9])"));
     EXPECT_TRUE(childrenOf(mi, 5).empty());
     // The third string of that structure is never examined; the next
     // structure and the BIOS phase go on.
-    EXPECT_TRUE(isNode(firmware[2], 6, 2, 3, 3, 1, "OTL"));
-    EXPECT_TRUE(hasString(firmware[2], 70, "SP2"));
-    EXPECT_TRUE(isNode(firmware[3], 8, 2, 3, 4, 1, "BIOS"));
+    EXPECT_TRUE(isNode(run.firmware[2], 6, 2, 3, 3, 1, "OTL"));
+    EXPECT_TRUE(hasString(run.firmware[2], 70, "SP2"));
+    EXPECT_TRUE(isNode(run.firmware[3], 8, 2, 3, 4, 1, "BIOS"));
 }
 
 TEST(FirmwareOemNodes, OrdinalIsSharedByOemAndBiosNodesInCreationOrder) {
     TestMI mi;
-    TableBuilder builder;
-    builder.add(biosInformation(0x0000, "Corvane", "C1 [B1-1.0]", "03/14/2021"));
-    builder.add(
-        oemStrings(0x0B00, {"Corvane Diagnostics -[D1-1.0]-", "Corvane Ostrel -[S1-1.0]-"}));
-    builder.add(biosInformation(0x0001, "Corvane", "C2 [B2-2.0]", "04/14/2021"));
-    builder.add(eventLog(0x0F00));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+    FirmwareRun const run(
+        mi, {biosInformation(0x0000, "Corvane", "C1 [B1-1.0]", "03/14/2021"),
+             oemStrings(0x0B00, {"Corvane Diagnostics -[D1-1.0]-", "Corvane Ostrel -[S1-1.0]-"}),
+             biosInformation(0x0001, "Corvane", "C2 [B2-2.0]", "04/14/2021"), eventLog(0x0F00)});
 
     // OEM nodes first, then BIOS nodes; each followed by its event-log node.
-    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
-    ASSERT_EQ(4u, firmware.size());
-    EXPECT_TRUE(isNode(firmware[0], 3, 2, 3, 1, 1, "Diagnostics"));
-    EXPECT_TRUE(isNode(firmware[1], 5, 2, 3, 2, 1, "OTL"));
-    EXPECT_TRUE(isNode(firmware[2], 7, 2, 3, 3, 1, "BIOS"));
-    EXPECT_TRUE(hasString(firmware[2], 70, "B1"));
-    EXPECT_TRUE(isNode(firmware[3], 9, 2, 3, 4, 1, "BIOS"));
-    EXPECT_TRUE(hasString(firmware[3], 70, "B2"));
-    for (size_t i = 0; i < firmware.size(); ++i) {
-        EXPECT_TRUE(hasEventLogChild(mi, firmware[i], firmware[i]->getNodeId() + 1)) << i;
+    ASSERT_EQ(4u, run.firmware.size());
+    EXPECT_TRUE(isNode(run.firmware[0], 3, 2, 3, 1, 1, "Diagnostics"));
+    EXPECT_TRUE(isNode(run.firmware[1], 5, 2, 3, 2, 1, "OTL"));
+    EXPECT_TRUE(isNode(run.firmware[2], 7, 2, 3, 3, 1, "BIOS"));
+    EXPECT_TRUE(hasString(run.firmware[2], 70, "B1"));
+    EXPECT_TRUE(isNode(run.firmware[3], 9, 2, 3, 4, 1, "BIOS"));
+    EXPECT_TRUE(hasString(run.firmware[3], 70, "B2"));
+    for (size_t i = 0; i < run.firmware.size(); ++i) {
+        EXPECT_TRUE(hasEventLogChild(mi, run.firmware[i], run.firmware[i]->getNodeId() + 1)) << i;
     }
     // Both OEM nodes came from one structure: its entry keeps the last.
-    EXPECT_EQ(firmware[1], lists.storage[11][0].node);
-    EXPECT_EQ(firmware[2], lists.storage[0][0].node);
-    EXPECT_EQ(firmware[3], lists.storage[0][1].node);
+    EXPECT_EQ(run.firmware[1], run.lists.storage[11][0].node);
+    EXPECT_EQ(run.firmware[2], run.lists.storage[0][0].node);
+    EXPECT_EQ(run.firmware[3], run.lists.storage[0][1].node);
 }
 
 TEST(FirmwareOemNodes, WithoutEventLogStructureFirmwareNodesHaveNoChildren) {
     TestMI mi;
-    TableBuilder builder;
-    builder.add(oemStrings(0x0B00, {"Corvane Diagnostics -[D1-1.0]-"}));
-    builder.add(biosInformation(0x0000, "Corvane", "C1 [B1-1.0]", "03/14/2021"));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    LogCapture log;
-    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+    FirmwareRun const run(mi, {oemStrings(0x0B00, {"Corvane Diagnostics -[D1-1.0]-"}),
+                               biosInformation(0x0000, "Corvane", "C1 [B1-1.0]", "03/14/2021")});
 
-    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
-    ASSERT_EQ(2u, firmware.size());
-    EXPECT_TRUE(isNode(firmware[0], 3, 2, 3, 1, 1, "Diagnostics"));
-    EXPECT_TRUE(isNode(firmware[1], 4, 2, 3, 2, 1, "BIOS"));
+    ASSERT_EQ(2u, run.firmware.size());
+    EXPECT_TRUE(isNode(run.firmware[0], 3, 2, 3, 1, 1, "Diagnostics"));
+    EXPECT_TRUE(isNode(run.firmware[1], 4, 2, 3, 2, 1, "BIOS"));
     EXPECT_EQ(3u, mi.nodeList.size());
     // The event-log builder still ran once per firmware node.
-    EXPECT_EQ(2u, loggedCount("makeLogNodes entry")) << log.dump();
+    EXPECT_EQ(2u, loggedCount("makeLogNodes entry")) << run.log.dump();
 }
 
 // ------------------------------------------------------------ BIOS nodes
 
 TEST(FirmwareBiosNodes, BracketedVersionSetsEveryProperty) {
     VersionedMI mi(2, 7);
-    TableBuilder builder;
-    builder.add(
-        biosInformation(0x0000, "Corvane Ltd.", "C1S [R5B3-1.06]", "03/14/2021", 0x18, 0x03, 0x11));
-    builder.add(eventLog(0x0F00));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    LogCapture log;
-    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+    FirmwareRun const run(mi, {biosInformation(0x0000, "Corvane Ltd.", "C1S [R5B3-1.06]",
+                                               "03/14/2021", 0x18, 0x03, 0x11),
+                               eventLog(0x0F00)});
 
-    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
-    ASSERT_EQ(1u, firmware.size()) << log.dump();
-    IC::Node const* node = firmware[0];
+    ASSERT_EQ(1u, run.firmware.size()) << run.log.dump();
+    IC::Node const* node = run.firmware[0];
     EXPECT_TRUE(isNode(node, 3, 2, 3, 1, 1, "BIOS"));
     EXPECT_EQ(std::vector<unsigned int>{1}, node->getMIIds());
     EXPECT_EQ((Ids{36, 70, 104, 107, 108, 134, 164, 175, 187, 188, 307}), propertyIds(node));
@@ -686,11 +580,11 @@ TEST(FirmwareBiosNodes, BracketedVersionSetsEveryProperty) {
     EXPECT_TRUE(hasUnsigned(node, 107, 7));
     EXPECT_TRUE(hasUnsigned(node, 187, 3));
     EXPECT_TRUE(hasUnsigned(node, 188, 0x11));
-    EXPECT_EQ(node, lists.storage[0][0].node);
+    EXPECT_EQ(node, run.lists.storage[0][0].node);
     EXPECT_TRUE(hasEventLogChild(mi, node, 4));
 
-    EXPECT_TRUE(log.contains("Table 0 length = 24")) << log.dump();
-    EXPECT_FALSE(log.contains(VERSION_ERROR)) << log.dump();
+    EXPECT_TRUE(run.log.contains("Table 0 length = 24")) << run.log.dump();
+    EXPECT_FALSE(run.log.contains(VERSION_ERROR)) << run.log.dump();
 }
 
 TEST(FirmwareBiosNodes, SmbiosVersionComesFromTheAcquiredTable) {
@@ -726,208 +620,147 @@ TEST(FirmwareBiosNodes, SmbiosVersionComesFromTheAcquiredTable) {
 
 TEST(FirmwareBiosNodes, VersionWithoutBracketsLogsTheErrorAndSetsTheWholeVersion) {
     VersionedMI mi(2, 4);
-    TableBuilder builder;
-    builder.add(biosInformation(0x0000, "Corvane", "1.05", "03/14/2021"));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    LogCapture log;
-    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+    FirmwareRun const run(mi, {biosInformation(0x0000, "Corvane", "1.05", "03/14/2021")});
 
-    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
-    ASSERT_EQ(1u, firmware.size());
-    IC::Node const* node = firmware[0];
+    ASSERT_EQ(1u, run.firmware.size());
+    IC::Node const* node = run.firmware[0];
     EXPECT_TRUE(hasString(node, 134, "1.05"));
     EXPECT_TRUE(hasString(node, 307, "1.05"));
     EXPECT_TRUE(lacksProperty(node, 70));
     EXPECT_EQ((Ids{36, 104, 107, 108, 134, 164, 175, 187, 188, 307}), propertyIds(node));
-    EXPECT_EQ((std::vector<int>{6000}), frametest::loggedLevels(VERSION_ERROR)) << log.dump();
+    EXPECT_EQ((std::vector<int>{6000}), frametest::loggedLevels(VERSION_ERROR)) << run.log.dump();
 }
 
 TEST(FirmwareBiosNodes, BracketsWithoutDashAreAnUnreadableVersion) {
     VersionedMI mi(2, 4);
-    TableBuilder builder;
-    builder.add(biosInformation(0x0000, "Corvane", "C1 [R5B3 1.06]", "03/14/2021"));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    LogCapture log;
-    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+    FirmwareRun const run(mi, {biosInformation(0x0000, "Corvane", "C1 [R5B3 1.06]", "03/14/2021")});
 
-    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
-    ASSERT_EQ(1u, firmware.size());
-    EXPECT_TRUE(hasString(firmware[0], 134, "C1 [R5B3 1.06]"));
-    EXPECT_TRUE(lacksProperty(firmware[0], 70));
-    EXPECT_EQ((std::vector<int>{6000}), frametest::loggedLevels(VERSION_ERROR)) << log.dump();
+    ASSERT_EQ(1u, run.firmware.size());
+    EXPECT_TRUE(hasString(run.firmware[0], 134, "C1 [R5B3 1.06]"));
+    EXPECT_TRUE(lacksProperty(run.firmware[0], 70));
+    EXPECT_EQ((std::vector<int>{6000}), frametest::loggedLevels(VERSION_ERROR)) << run.log.dump();
 }
 
 TEST(FirmwareBiosNodes, DashOutsideTheBracketsIsNotABuildId) {
     VersionedMI mi(2, 4);
-    TableBuilder builder;
     // Character searches, no trimming: the inner text " R5 " has no dash.
-    builder.add(biosInformation(0x0000, "Corvane", "C1-A [ R5 ]", "03/14/2021"));
-    builder.add(biosInformation(0x0001, "Corvane", "X [ R5 - 2.1 ]", "03/14/2021"));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    LogCapture log;
-    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+    FirmwareRun const run(mi, {biosInformation(0x0000, "Corvane", "C1-A [ R5 ]", "03/14/2021"),
+                               biosInformation(0x0001, "Corvane", "X [ R5 - 2.1 ]", "03/14/2021")});
 
-    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
-    ASSERT_EQ(2u, firmware.size());
-    EXPECT_TRUE(hasString(firmware[0], 134, "C1-A [ R5 ]"));
-    EXPECT_TRUE(lacksProperty(firmware[0], 70));
-    EXPECT_TRUE(hasString(firmware[1], 70, " R5 "));
-    EXPECT_TRUE(hasString(firmware[1], 134, " 2.1 "));
-    EXPECT_EQ(1u, loggedCount(VERSION_ERROR)) << log.dump();
+    ASSERT_EQ(2u, run.firmware.size());
+    EXPECT_TRUE(hasString(run.firmware[0], 134, "C1-A [ R5 ]"));
+    EXPECT_TRUE(lacksProperty(run.firmware[0], 70));
+    EXPECT_TRUE(hasString(run.firmware[1], 70, " R5 "));
+    EXPECT_TRUE(hasString(run.firmware[1], 134, " 2.1 "));
+    EXPECT_EQ(1u, loggedCount(VERSION_ERROR)) << run.log.dump();
 }
 
 TEST(FirmwareBiosNodes, EmptyVersionStringNumberIsUnreadable) {
     VersionedMI mi(2, 4);
-    TableBuilder builder;
-    builder.add(biosInformation(0x0000, "", "", ""));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    LogCapture log;
-    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+    FirmwareRun const run(mi, {biosInformation(0x0000, "", "", "")});
 
-    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
-    ASSERT_EQ(1u, firmware.size());
+    ASSERT_EQ(1u, run.firmware.size());
     // Strings that name no string are set as empty texts.
-    EXPECT_TRUE(hasString(firmware[0], 36, ""));
-    EXPECT_TRUE(hasString(firmware[0], 164, ""));
-    EXPECT_TRUE(hasString(firmware[0], 307, ""));
-    EXPECT_TRUE(hasString(firmware[0], 134, ""));
-    EXPECT_EQ(1u, loggedCount(VERSION_ERROR)) << log.dump();
+    EXPECT_TRUE(hasString(run.firmware[0], 36, ""));
+    EXPECT_TRUE(hasString(run.firmware[0], 164, ""));
+    EXPECT_TRUE(hasString(run.firmware[0], 307, ""));
+    EXPECT_TRUE(hasString(run.firmware[0], 134, ""));
+    EXPECT_EQ(1u, loggedCount(VERSION_ERROR)) << run.log.dump();
 }
 
 TEST(FirmwareBiosNodes, Length0x14HasNoSmbiosVersionAndNoEcRelease) {
     VersionedMI mi(2, 4);
-    TableBuilder builder;
-    builder.add(biosInformation(0x0000, "Corvane", "C1 [B1-1.0]", "03/14/2021", 0x14));
-    SD::SmBios parsed(builder.build());
-    ASSERT_EQ(0x14, parsed.getTables()[0].getLength());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+    FirmwareRun const run(mi,
+                          {biosInformation(0x0000, "Corvane", "C1 [B1-1.0]", "03/14/2021", 0x14)});
+    ASSERT_EQ(0x14, run.parsed.getTables()[0].getLength());
 
-    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
-    ASSERT_EQ(1u, firmware.size());
-    EXPECT_EQ((Ids{36, 70, 108, 134, 164, 307}), propertyIds(firmware[0]));
-    EXPECT_TRUE(lacksProperty(firmware[0], 175));
-    EXPECT_TRUE(lacksProperty(firmware[0], 104));
-    EXPECT_TRUE(lacksProperty(firmware[0], 107));
-    EXPECT_TRUE(lacksProperty(firmware[0], 187));
-    EXPECT_TRUE(lacksProperty(firmware[0], 188));
+    ASSERT_EQ(1u, run.firmware.size());
+    EXPECT_EQ((Ids{36, 70, 108, 134, 164, 307}), propertyIds(run.firmware[0]));
+    EXPECT_TRUE(lacksProperty(run.firmware[0], 175));
+    EXPECT_TRUE(lacksProperty(run.firmware[0], 104));
+    EXPECT_TRUE(lacksProperty(run.firmware[0], 107));
+    EXPECT_TRUE(lacksProperty(run.firmware[0], 187));
+    EXPECT_TRUE(lacksProperty(run.firmware[0], 188));
 }
 
 TEST(FirmwareBiosNodes, Length0x16HasTheSmbiosVersionButNoEcRelease) {
     VersionedMI mi(2, 4);
-    TableBuilder builder;
-    builder.add(biosInformation(0x0000, "Corvane", "C1 [B1-1.0]", "03/14/2021", 0x16));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+    FirmwareRun const run(mi,
+                          {biosInformation(0x0000, "Corvane", "C1 [B1-1.0]", "03/14/2021", 0x16)});
 
-    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
-    ASSERT_EQ(1u, firmware.size());
-    EXPECT_EQ((Ids{36, 70, 104, 107, 108, 134, 164, 175, 307}), propertyIds(firmware[0]));
-    EXPECT_TRUE(hasVersion(firmware[0], 175, 2, 4));
-    EXPECT_TRUE(hasUnsigned(firmware[0], 104, 2));
-    EXPECT_TRUE(hasUnsigned(firmware[0], 107, 4));
+    ASSERT_EQ(1u, run.firmware.size());
+    EXPECT_EQ((Ids{36, 70, 104, 107, 108, 134, 164, 175, 307}), propertyIds(run.firmware[0]));
+    EXPECT_TRUE(hasVersion(run.firmware[0], 175, 2, 4));
+    EXPECT_TRUE(hasUnsigned(run.firmware[0], 104, 2));
+    EXPECT_TRUE(hasUnsigned(run.firmware[0], 107, 4));
 }
 
 TEST(FirmwareBiosNodes, Length0x17ReadsTheMissingEcMinorAsZero) {
     VersionedMI mi(2, 4);
-    TableBuilder builder;
-    builder.add(biosInformation(0x0000, "Corvane", "C1 [B1-1.0]", "03/14/2021", 0x17, 0x05));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    LogCapture log;
-    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+    FirmwareRun const run(
+        mi, {biosInformation(0x0000, "Corvane", "C1 [B1-1.0]", "03/14/2021", 0x17, 0x05)});
 
     // Longer than 22 bytes, so both release bytes are read; the reader's own
     // check turns the byte at 0x17 into 0.
-    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
-    ASSERT_EQ(1u, firmware.size());
-    EXPECT_TRUE(hasUnsigned(firmware[0], 187, 5));
-    EXPECT_TRUE(hasUnsigned(firmware[0], 188, 0));
-    EXPECT_TRUE(log.contains("getNumber8 offset=23 length=23")) << log.dump();
+    ASSERT_EQ(1u, run.firmware.size());
+    EXPECT_TRUE(hasUnsigned(run.firmware[0], 187, 5));
+    EXPECT_TRUE(hasUnsigned(run.firmware[0], 188, 0));
+    EXPECT_TRUE(run.log.contains("getNumber8 offset=23 length=23")) << run.log.dump();
 }
 
 TEST(FirmwareBiosNodes, Length0x18WithEcBytesFFSetsTheVersionButNoEcRelease) {
     VersionedMI mi(2, 8);
-    TableBuilder builder;
-    builder.add(biosInformation(0x0000, "Corvane", "C1 [B1-1.0]", "03/14/2021", 0x18, 0xFF, 0xFF));
-    // One byte 0xFF is enough to leave both out.
-    builder.add(biosInformation(0x0001, "Corvane", "C1 [B1-1.0]", "03/14/2021", 0x18, 0x01, 0xFF));
-    builder.add(biosInformation(0x0002, "Corvane", "C1 [B1-1.0]", "03/14/2021", 0x18, 0xFF, 0x01));
-    // 254 is the largest release number.
-    builder.add(biosInformation(0x0003, "Corvane", "C1 [B1-1.0]", "03/14/2021", 0x18, 0xFE, 0x00));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+    FirmwareRun const run(
+        mi, {biosInformation(0x0000, "Corvane", "C1 [B1-1.0]", "03/14/2021", 0x18, 0xFF, 0xFF),
+             // One byte 0xFF is enough to leave both out.
+             biosInformation(0x0001, "Corvane", "C1 [B1-1.0]", "03/14/2021", 0x18, 0x01, 0xFF),
+             biosInformation(0x0002, "Corvane", "C1 [B1-1.0]", "03/14/2021", 0x18, 0xFF, 0x01),
+             // 254 is the largest release number.
+             biosInformation(0x0003, "Corvane", "C1 [B1-1.0]", "03/14/2021", 0x18, 0xFE, 0x00)});
 
-    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
-    ASSERT_EQ(4u, firmware.size());
+    ASSERT_EQ(4u, run.firmware.size());
     for (size_t i = 0; i < 3; ++i) {
-        EXPECT_TRUE(hasVersion(firmware[i], 175, 2, 8)) << i;
-        EXPECT_TRUE(hasUnsigned(firmware[i], 104, 2)) << i;
-        EXPECT_TRUE(hasUnsigned(firmware[i], 107, 8)) << i;
-        EXPECT_TRUE(lacksProperty(firmware[i], 187)) << i;
-        EXPECT_TRUE(lacksProperty(firmware[i], 188)) << i;
+        EXPECT_TRUE(hasVersion(run.firmware[i], 175, 2, 8)) << i;
+        EXPECT_TRUE(hasUnsigned(run.firmware[i], 104, 2)) << i;
+        EXPECT_TRUE(hasUnsigned(run.firmware[i], 107, 8)) << i;
+        EXPECT_TRUE(lacksProperty(run.firmware[i], 187)) << i;
+        EXPECT_TRUE(lacksProperty(run.firmware[i], 188)) << i;
     }
-    EXPECT_TRUE(hasUnsigned(firmware[3], 187, 254));
-    EXPECT_TRUE(hasUnsigned(firmware[3], 188, 0));
+    EXPECT_TRUE(hasUnsigned(run.firmware[3], 187, 254));
+    EXPECT_TRUE(hasUnsigned(run.firmware[3], 188, 0));
 }
 
 TEST(FirmwareBiosNodes, FailureInABiosStructureLogsTable0AndTheLoopIndex) {
     VersionedMI mi(2, 4);
-    TableBuilder builder;
-    builder.add(biosInformation(0x0000, "Corvane", "C1 [B1-1.0]", "03/14/2021"));
-    // The last structure claims a formatted area longer than its bytes, so
-    // its strings cannot be found: the vendor lookup throws.
-    builder.add(biosInformation(0x0001, "Corvane", "C2 [B2-2.0]", "04/14/2021").length(0x40));
-    SD::SmBios parsed(builder.build());
-    ASSERT_EQ(2u, parsed.getTables().size());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    LogCapture log;
-    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+    FirmwareRun const run(
+        mi, {biosInformation(0x0000, "Corvane", "C1 [B1-1.0]", "03/14/2021"),
+             // The last structure claims a formatted area longer than its bytes, so
+             // its strings cannot be found: the vendor lookup throws.
+             biosInformation(0x0001, "Corvane", "C2 [B2-2.0]", "04/14/2021").length(0x40)});
+    ASSERT_EQ(2u, run.parsed.getTables().size());
 
     std::string const logged = frametest::firstLogged("Exception=");
-    EXPECT_NE(std::string::npos, logged.find(" Type=")) << log.dump();
+    EXPECT_NE(std::string::npos, logged.find(" Type=")) << run.log.dump();
     EXPECT_NE(std::string::npos, logged.find("Table 0 index =1")) << logged;
-    EXPECT_EQ((std::vector<int>{6000}), frametest::loggedLevels("Exception=")) << log.dump();
+    EXPECT_EQ((std::vector<int>{6000}), frametest::loggedLevels("Exception=")) << run.log.dump();
 
-    std::vector<IC::Node*> const firmware = firmwareNodes(mi);
-    ASSERT_EQ(2u, firmware.size());
-    EXPECT_TRUE(isNode(firmware[0], 3, 2, 3, 1, 1, "BIOS"));
-    EXPECT_TRUE(hasString(firmware[0], 70, "B1"));
+    ASSERT_EQ(2u, run.firmware.size());
+    EXPECT_TRUE(isNode(run.firmware[0], 3, 2, 3, 1, 1, "BIOS"));
+    EXPECT_TRUE(hasString(run.firmware[0], 70, "B1"));
     // The node made before the failure stays, with what it had by then.
-    EXPECT_TRUE(isNode(firmware[1], 4, 2, 3, 2, 1, "BIOS"));
-    EXPECT_TRUE(propertyIds(firmware[1]).empty());
-    EXPECT_TRUE(log.contains("makeFirmwareNodes exit")) << log.dump();
+    EXPECT_TRUE(isNode(run.firmware[1], 4, 2, 3, 2, 1, "BIOS"));
+    EXPECT_TRUE(propertyIds(run.firmware[1]).empty());
+    EXPECT_TRUE(run.log.contains("makeFirmwareNodes exit")) << run.log.dump();
 }
 
 TEST(FirmwareBuilder, NoOemAndNoBiosStructuresMakeNoNodeAndLogOnlyEntryAndExit) {
     TestMI mi;
-    TableBuilder builder;
-    builder.add(eventLog(0x0F00));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    LogCapture log;
-    mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
+    FirmwareRun const run(mi, {eventLog(0x0F00)});
 
     EXPECT_EQ(1u, mi.nodeList.size());
     EXPECT_EQ((std::vector<std::string>{"makeFirmwareNodes entry", "makeFirmwareNodes exit"}),
               frametest::loggedTexts())
-        << log.dump();
+        << run.log.dump();
     std::vector<int> const levels = frametest::loggedLevels("makeFirmwareNodes");
     EXPECT_EQ((std::vector<int>{3000, 3000}), levels);
 }

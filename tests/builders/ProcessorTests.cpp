@@ -150,11 +150,18 @@ Structure cache(uint16_t handle, std::string const& socket, unsigned int level) 
     return out;
 }
 
-// A parsed table and its structure lists.
-struct Built {
-    explicit Built(TableBuilder const& table) : parsed(table.build()), lists(parsed) {}
+// makeCpuNodes run on mi over the table, under a planar node added first
+// (node id 2); cpus holds the processor nodes (type 4) it made, in order.
+struct CpuRun {
+    CpuRun(TestMI& mi, TableBuilder const& table) : parsed(table.build()), lists(parsed) {
+        planar = buildertest::addParent(mi);
+        mi.makeCpuNodes(lists.get(), planar->getNodeId());
+        cpus = nodesOfType(mi, 4);
+    }
     SD::SmBios parsed;
     StructureLists lists;
+    IC::MutableNode* planar = nullptr;
+    std::vector<IC::Node*> cpus;
 };
 
 // The captured log-output texts written under one logger, in order.
@@ -196,19 +203,15 @@ TEST(ProcessorNodes, PopulatedEnabledProcessorWithCachesAndCoresFieldByField) {
     table.add(cache(0x0701, "L2-Cache", 2));
     table.add(cache(0x0702, "L3-Cache", 3));
     table.add(cpu(c));
-    Built built(table);
     TestMI mi;
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    ASSERT_EQ(2u, planar->getNodeId());
-
-    mi.makeCpuNodes(built.lists.get(), planar->getNodeId());
+    CpuRun const run(mi, table);
+    ASSERT_EQ(2u, run.planar->getNodeId());
 
     // Planar, processor, three caches, two cores.
     ASSERT_EQ(7u, mi.nodeList.size());
     EXPECT_EQ(9u, mi.nextNodeId);
-    std::vector<IC::Node*> const cpus = nodesOfType(mi, 4);
-    ASSERT_EQ(1u, cpus.size());
-    IC::Node const* node = cpus[0];
+    ASSERT_EQ(1u, run.cpus.size());
+    IC::Node const* node = run.cpus[0];
     EXPECT_EQ(node, mi.nodeList[1]);
     EXPECT_TRUE(hasNodeType(node, 4));
     EXPECT_EQ(3u, node->getNodeId());
@@ -289,16 +292,12 @@ TEST(ProcessorNodes, StatusPopulatedAndEnabledMakesANode) {
     c.status = 0x41;
     TableBuilder table;
     table.add(cpu(c));
-    Built built(table);
     TestMI mi;
-    IC::MutableNode* planar = buildertest::addParent(mi);
+    CpuRun const run(mi, table);
 
-    mi.makeCpuNodes(built.lists.get(), planar->getNodeId());
-
-    std::vector<IC::Node*> const cpus = nodesOfType(mi, 4);
-    ASSERT_EQ(1u, cpus.size());
-    EXPECT_EQ(1u, cpus[0]->getStatus());
-    EXPECT_TRUE(hasBool(cpus[0], 55, true));
+    ASSERT_EQ(1u, run.cpus.size());
+    EXPECT_EQ(1u, run.cpus[0]->getStatus());
+    EXPECT_TRUE(hasBool(run.cpus[0], 55, true));
 }
 
 TEST(ProcessorNodes, StatusNotPopulatedOrDisabledByBiosMakesNoNodeAndNoCacheNodes) {
@@ -318,11 +317,8 @@ TEST(ProcessorNodes, StatusNotPopulatedOrDisabledByBiosMakesNoNodeAndNoCacheNode
         table.add(cache(0x0701, "L2-Cache", 2));
         table.add(cache(0x0702, "L3-Cache", 3));
         table.add(cpu(c));
-        Built built(table);
         TestMI mi;
-        IC::MutableNode* planar = buildertest::addParent(mi);
-
-        mi.makeCpuNodes(built.lists.get(), planar->getNodeId());
+        CpuRun const run(mi, table);
 
         EXPECT_EQ(1u, mi.nodeList.size());
         EXPECT_EQ(3u, mi.nextNodeId);
@@ -338,17 +334,13 @@ TEST(ProcessorNodes, StatusWithReservedBit7SetStillMakesANode) {
     c.status = 0xC1;
     TableBuilder table;
     table.add(cpu(c));
-    Built built(table);
     TestMI mi;
-    IC::MutableNode* planar = buildertest::addParent(mi);
+    CpuRun const run(mi, table);
 
-    mi.makeCpuNodes(built.lists.get(), planar->getNodeId());
-
-    std::vector<IC::Node*> const cpus = nodesOfType(mi, 4);
-    ASSERT_EQ(1u, cpus.size());
-    EXPECT_EQ(1u, cpus[0]->getStatus());
-    EXPECT_EQ("CPU 1", cpus[0]->getDescription());
-    EXPECT_TRUE(hasBool(cpus[0], 55, true));
+    ASSERT_EQ(1u, run.cpus.size());
+    EXPECT_EQ(1u, run.cpus[0]->getStatus());
+    EXPECT_EQ("CPU 1", run.cpus[0]->getDescription());
+    EXPECT_TRUE(hasBool(run.cpus[0], 55, true));
 }
 
 // CPU status 2 (disabled by the user), 3 (disabled by firmware) and 4 (idle)
@@ -366,14 +358,11 @@ TEST(ProcessorNodes, StatusesDisabledByUserOrFirmwareOrIdleMakeNoNode) {
         c.coreEnabled = 1;
         table.add(cpu(c));
     }
-    Built built(table);
     TestMI mi;
-    IC::MutableNode* planar = buildertest::addParent(mi);
-
-    mi.makeCpuNodes(built.lists.get(), planar->getNodeId());
+    CpuRun const run(mi, table);
 
     EXPECT_EQ(1u, mi.nodeList.size());
-    EXPECT_TRUE(nodesOfType(mi, 4).empty());
+    EXPECT_TRUE(run.cpus.empty());
     EXPECT_TRUE(nodesOfType(mi, 42).empty());
     EXPECT_EQ(3u, loggedCount("Table 4 length = ")) << log.dump();
     EXPECT_EQ(0u, loggedCount("makeCacheNodes entry")) << log.dump();
@@ -393,21 +382,17 @@ TEST(ProcessorNodes, OnlyPopulatedWithCpuStatusOneIsSelected) {
         c.socket = "Socket " + std::to_string(status);
         table.add(cpu(c));
     }
-    Built built(table);
     TestMI mi;
-    IC::MutableNode* planar = buildertest::addParent(mi);
-
-    mi.makeCpuNodes(built.lists.get(), planar->getNodeId());
+    CpuRun const run(mi, table);
 
     // 0x41, 0x49 (bit 3 is outside the mask), 0x61 (bit 5 likewise) and 0xC1.
-    std::vector<IC::Node*> const cpus = nodesOfType(mi, 4);
-    ASSERT_EQ(4u, cpus.size());
+    ASSERT_EQ(4u, run.cpus.size());
     std::vector<std::string> const sockets = {"Socket 65", "Socket 73", "Socket 97", "Socket 193"};
-    for (size_t i = 0; i < cpus.size(); ++i) {
+    for (size_t i = 0; i < run.cpus.size(); ++i) {
         SCOPED_TRACE(sockets[i]);
-        EXPECT_TRUE(hasString(cpus[i], 53, sockets[i]));
-        EXPECT_EQ(1u, cpus[i]->getStatus());
-        EXPECT_EQ(i, cpus[i]->getIndex());
+        EXPECT_TRUE(hasString(run.cpus[i], 53, sockets[i]));
+        EXPECT_EQ(1u, run.cpus[i]->getStatus());
+        EXPECT_EQ(i, run.cpus[i]->getIndex());
     }
 }
 
@@ -422,18 +407,14 @@ TEST(ProcessorNodes, FirstProcessorSkippedSecondGetsIndexZeroAndDescriptionEndin
     TableBuilder table;
     table.add(cpu(absent));
     table.add(cpu(present));
-    Built built(table);
     TestMI mi;
-    IC::MutableNode* planar = buildertest::addParent(mi);
+    CpuRun const run(mi, table);
 
-    mi.makeCpuNodes(built.lists.get(), planar->getNodeId());
-
-    std::vector<IC::Node*> const cpus = nodesOfType(mi, 4);
-    ASSERT_EQ(1u, cpus.size());
-    EXPECT_TRUE(hasString(cpus[0], 53, "CPU1"));
-    EXPECT_EQ(0u, cpus[0]->getIndex());
-    EXPECT_EQ("CPU 1", cpus[0]->getDescription());
-    EXPECT_EQ(3u, cpus[0]->getNodeId());
+    ASSERT_EQ(1u, run.cpus.size());
+    EXPECT_TRUE(hasString(run.cpus[0], 53, "CPU1"));
+    EXPECT_EQ(0u, run.cpus[0]->getIndex());
+    EXPECT_EQ("CPU 1", run.cpus[0]->getDescription());
+    EXPECT_EQ(3u, run.cpus[0]->getNodeId());
 }
 
 TEST(ProcessorNodes, DescriptionCountsFromOneWhileIndexCountsFromZero) {
@@ -444,20 +425,16 @@ TEST(ProcessorNodes, DescriptionCountsFromOneWhileIndexCountsFromZero) {
         c.socket = "CPU" + std::to_string(i);
         table.add(cpu(c));
     }
-    Built built(table);
     TestMI mi;
-    IC::MutableNode* planar = buildertest::addParent(mi);
+    CpuRun const run(mi, table);
 
-    mi.makeCpuNodes(built.lists.get(), planar->getNodeId());
-
-    std::vector<IC::Node*> const cpus = nodesOfType(mi, 4);
-    ASSERT_EQ(3u, cpus.size());
+    ASSERT_EQ(3u, run.cpus.size());
     for (unsigned int i = 0; i < 3; ++i) {
         SCOPED_TRACE("processor " + std::to_string(i));
-        EXPECT_EQ(i, cpus[i]->getIndex());
-        EXPECT_EQ("CPU " + std::to_string(i + 1), cpus[i]->getDescription());
-        EXPECT_EQ(3u + i, cpus[i]->getNodeId());
-        EXPECT_EQ(2u, cpus[i]->getLinkedId());
+        EXPECT_EQ(i, run.cpus[i]->getIndex());
+        EXPECT_EQ("CPU " + std::to_string(i + 1), run.cpus[i]->getDescription());
+        EXPECT_EQ(3u + i, run.cpus[i]->getNodeId());
+        EXPECT_EQ(2u, run.cpus[i]->getLinkedId());
     }
 }
 
@@ -466,18 +443,14 @@ TEST(ProcessorNodes, ProcessorIdIsStoredAsItsEightBytesReversed) {
     c.id = 0x0123456789ABCDEFull;
     TableBuilder table;
     table.add(cpu(c));
-    Built built(table);
-    ASSERT_EQ(0xEF, built.parsed.getTables()[0].getByte(0x08));
     TestMI mi;
-    IC::MutableNode* planar = buildertest::addParent(mi);
+    CpuRun const run(mi, table);
+    ASSERT_EQ(0xEF, run.parsed.getTables()[0].getByte(0x08));
 
-    mi.makeCpuNodes(built.lists.get(), planar->getNodeId());
-
-    std::vector<IC::Node*> const cpus = nodesOfType(mi, 4);
-    ASSERT_EQ(1u, cpus.size());
-    EXPECT_TRUE(hasBytes(cpus[0], 89, {0x01, 0x23, 0x45, 0x67, 0x89, 0xAB, 0xCD, 0xEF}));
+    ASSERT_EQ(1u, run.cpus.size());
+    EXPECT_TRUE(hasBytes(run.cpus[0], 89, {0x01, 0x23, 0x45, 0x67, 0x89, 0xAB, 0xCD, 0xEF}));
     // Stepping: the low nibble of the first byte, 0xF, as decimal text.
-    EXPECT_TRUE(hasString(cpus[0], 124, "15"));
+    EXPECT_TRUE(hasString(run.cpus[0], 124, "15"));
 }
 
 TEST(ProcessorNodes, SteppingIsTheLowNibbleOfTheFirstIdByteAsDecimalText) {
@@ -492,17 +465,13 @@ TEST(ProcessorNodes, SteppingIsTheLowNibbleOfTheFirstIdByteAsDecimalText) {
         c.id = 0xBFEBFBFF00090600ull | first;
         table.add(cpu(c));
     }
-    Built built(table);
     TestMI mi;
-    IC::MutableNode* planar = buildertest::addParent(mi);
+    CpuRun const run(mi, table);
 
-    mi.makeCpuNodes(built.lists.get(), planar->getNodeId());
-
-    std::vector<IC::Node*> const cpus = nodesOfType(mi, 4);
-    ASSERT_EQ(4u, cpus.size());
-    for (size_t i = 0; i < cpus.size(); ++i) {
+    ASSERT_EQ(4u, run.cpus.size());
+    for (size_t i = 0; i < run.cpus.size(); ++i) {
         SCOPED_TRACE("first ID byte " + std::to_string(firstBytes[i]));
-        EXPECT_TRUE(hasString(cpus[i], 124, steppings[i]));
+        EXPECT_TRUE(hasString(run.cpus[i], 124, steppings[i]));
         EXPECT_EQ(1u, loggedCount("Processor ID byte1 " + steppings[i])) << log.dump();
     }
 }
@@ -518,17 +487,13 @@ TEST(ProcessorNodes, UpgradeOtherAndUnknownGiveZeroThreeGivesOneAbove22GiveZero)
         c.upgrade = upgrade;
         table.add(cpu(c));
     }
-    Built built(table);
     TestMI mi;
-    IC::MutableNode* planar = buildertest::addParent(mi);
+    CpuRun const run(mi, table);
 
-    mi.makeCpuNodes(built.lists.get(), planar->getNodeId());
-
-    std::vector<IC::Node*> const cpus = nodesOfType(mi, 4);
-    ASSERT_EQ(upgrades.size(), cpus.size());
-    for (size_t i = 0; i < cpus.size(); ++i) {
+    ASSERT_EQ(upgrades.size(), run.cpus.size());
+    for (size_t i = 0; i < run.cpus.size(); ++i) {
         SCOPED_TRACE("upgrade " + std::to_string(upgrades[i]));
-        EXPECT_TRUE(hasEnum(cpus[i], 304, 1, values[i]));
+        EXPECT_TRUE(hasEnum(run.cpus[i], 304, 1, values[i]));
     }
 }
 
@@ -543,17 +508,13 @@ TEST(ProcessorNodes, CharacteristicsBit2GivesSixtyFourElseThirtyTwo) {
         c.characteristics = word;
         table.add(cpu(c));
     }
-    Built built(table);
     TestMI mi;
-    IC::MutableNode* planar = buildertest::addParent(mi);
+    CpuRun const run(mi, table);
 
-    mi.makeCpuNodes(built.lists.get(), planar->getNodeId());
-
-    std::vector<IC::Node*> const cpus = nodesOfType(mi, 4);
-    ASSERT_EQ(words.size(), cpus.size());
-    for (size_t i = 0; i < cpus.size(); ++i) {
+    ASSERT_EQ(words.size(), run.cpus.size());
+    for (size_t i = 0; i < run.cpus.size(); ++i) {
         SCOPED_TRACE("characteristics " + std::to_string(words[i]));
-        EXPECT_TRUE(hasUnsigned(cpus[i], 15, widths[i]));
+        EXPECT_TRUE(hasUnsigned(run.cpus[i], 15, widths[i]));
     }
 }
 
@@ -572,16 +533,12 @@ TEST(ProcessorNodes, StructureEndingInsideCharacteristicsKeepsPropertiesSetSoFar
     TableBuilder table;
     table.add(cache(0x0700, "L1-Cache", 1));
     table.add(cpu(c));
-    Built built(table);
-    ASSERT_EQ(0x27, built.parsed.getTables()[1].getLength());
     TestMI mi;
-    IC::MutableNode* planar = buildertest::addParent(mi);
+    CpuRun const run(mi, table);
+    ASSERT_EQ(0x27, run.parsed.getTables()[1].getLength());
 
-    mi.makeCpuNodes(built.lists.get(), planar->getNodeId());
-
-    std::vector<IC::Node*> const cpus = nodesOfType(mi, 4);
-    ASSERT_EQ(1u, cpus.size());
-    IC::Node const* node = cpus[0];
+    ASSERT_EQ(1u, run.cpus.size());
+    IC::Node const* node = run.cpus[0];
     EXPECT_EQ(1u, node->getStatus());
     EXPECT_EQ("CPU 1", node->getDescription());
     EXPECT_EQ((std::vector<unsigned int>{2, 19, 36, 38, 45, 50, 53, 55, 80, 89, 124, 125, 296, 298,
@@ -612,19 +569,15 @@ TEST(ProcessorNodes, FailingProcessorDoesNotStopTheNextOne) {
     TableBuilder table;
     table.add(cpu(broken));
     table.add(cpu(whole));
-    Built built(table);
     TestMI mi;
-    IC::MutableNode* planar = buildertest::addParent(mi);
+    CpuRun const run(mi, table);
 
-    mi.makeCpuNodes(built.lists.get(), planar->getNodeId());
-
-    std::vector<IC::Node*> const cpus = nodesOfType(mi, 4);
-    ASSERT_EQ(2u, cpus.size());
-    EXPECT_TRUE(lacksProperty(cpus[0], 15));
-    EXPECT_TRUE(hasString(cpus[1], 53, "CPU1"));
-    EXPECT_EQ(1u, cpus[1]->getIndex());
-    EXPECT_EQ("CPU 2", cpus[1]->getDescription());
-    EXPECT_TRUE(hasUnsigned(cpus[1], 15, 64));
+    ASSERT_EQ(2u, run.cpus.size());
+    EXPECT_TRUE(lacksProperty(run.cpus[0], 15));
+    EXPECT_TRUE(hasString(run.cpus[1], 53, "CPU1"));
+    EXPECT_EQ(1u, run.cpus[1]->getIndex());
+    EXPECT_EQ("CPU 2", run.cpus[1]->getDescription());
+    EXPECT_TRUE(hasUnsigned(run.cpus[1], 15, 64));
     EXPECT_NE(std::string::npos, frametest::firstLogged("Exception=").find("Table 4 index =0"))
         << log.dump();
 }
@@ -639,11 +592,8 @@ TEST(ProcessorNodes, ThreeCacheCallsPerProcessorAndHandleFFFFMatchesNothing) {
     table.add(cache(0x0700, "L1-Cache", 1));
     table.add(cache(0x0701, "L2-Cache", 2));
     table.add(cpu(c));
-    Built built(table);
     TestMI mi;
-    IC::MutableNode* planar = buildertest::addParent(mi);
-
-    mi.makeCpuNodes(built.lists.get(), planar->getNodeId());
+    CpuRun const run(mi, table);
 
     EXPECT_EQ(3u, loggedCount("makeCacheNodes entry handle=")) << log.dump();
     EXPECT_EQ(1u, loggedCount("makeCacheNodes entry handle=1792")) << log.dump();
@@ -672,11 +622,8 @@ TEST(ProcessorNodes, EachProcessorGetsItsOwnCachesAndCoresWithIdsInCreationOrder
         c.threadCount = 2;
         table.add(cpu(c));
     }
-    Built built(table);
     TestMI mi;
-    IC::MutableNode* planar = buildertest::addParent(mi);
-
-    mi.makeCpuNodes(built.lists.get(), planar->getNodeId());
+    CpuRun const run(mi, table);
 
     // Processor 3: L1 4, L3 5, core 6. Processor 7: L1 8, L3 9, core 10.
     ASSERT_EQ(9u, mi.nodeList.size());
@@ -709,18 +656,14 @@ TEST(ProcessorNodes, FourCoresTwoEnabledEightThreads) {
     c.threadCount = 8;
     TableBuilder table;
     table.add(cpu(c));
-    Built built(table);
     TestMI mi;
-    IC::MutableNode* planar = buildertest::addParent(mi);
+    CpuRun const run(mi, table);
 
-    mi.makeCpuNodes(built.lists.get(), planar->getNodeId());
-
-    std::vector<IC::Node*> const cpus = nodesOfType(mi, 4);
-    ASSERT_EQ(1u, cpus.size());
-    EXPECT_TRUE(hasUnsigned(cpus[0], 190, 4));
-    EXPECT_TRUE(hasUnsigned(cpus[0], 189, 2));
-    EXPECT_TRUE(hasUnsigned(cpus[0], 87, 8));
-    std::vector<IC::Node*> const cores = childrenOf(mi, cpus[0]->getNodeId());
+    ASSERT_EQ(1u, run.cpus.size());
+    EXPECT_TRUE(hasUnsigned(run.cpus[0], 190, 4));
+    EXPECT_TRUE(hasUnsigned(run.cpus[0], 189, 2));
+    EXPECT_TRUE(hasUnsigned(run.cpus[0], 87, 8));
+    std::vector<IC::Node*> const cores = childrenOf(mi, run.cpus[0]->getNodeId());
     ASSERT_EQ(4u, cores.size());
     for (unsigned int i = 0; i < 4; ++i) {
         SCOPED_TRACE("core " + std::to_string(i));
@@ -744,15 +687,11 @@ TEST(ProcessorNodes, ThreadCountZeroLeavesCoresWithoutThreadProperty) {
     c.threadCount = 0;
     TableBuilder table;
     table.add(cpu(c));
-    Built built(table);
     TestMI mi;
-    IC::MutableNode* planar = buildertest::addParent(mi);
+    CpuRun const run(mi, table);
 
-    mi.makeCpuNodes(built.lists.get(), planar->getNodeId());
-
-    std::vector<IC::Node*> const cpus = nodesOfType(mi, 4);
-    ASSERT_EQ(1u, cpus.size());
-    EXPECT_TRUE(hasUnsigned(cpus[0], 87, 0));
+    ASSERT_EQ(1u, run.cpus.size());
+    EXPECT_TRUE(hasUnsigned(run.cpus[0], 87, 0));
     std::vector<IC::Node*> const cores = nodesOfType(mi, 42);
     ASSERT_EQ(2u, cores.size());
     for (IC::Node const* core : cores) {
@@ -773,16 +712,12 @@ TEST(ProcessorNodes, Level20StructureHasNoCoreDataAndLogsTheNoCoreSuffix) {
     c.threadCount = 8;
     TableBuilder table;
     table.add(cpu(c));
-    Built built(table);
-    ASSERT_EQ(0x1A, built.parsed.getTables()[0].getLength());
     TestMI mi;
-    IC::MutableNode* planar = buildertest::addParent(mi);
+    CpuRun const run(mi, table);
+    ASSERT_EQ(0x1A, run.parsed.getTables()[0].getLength());
 
-    mi.makeCpuNodes(built.lists.get(), planar->getNodeId());
-
-    std::vector<IC::Node*> const cpus = nodesOfType(mi, 4);
-    ASSERT_EQ(1u, cpus.size());
-    IC::Node const* node = cpus[0];
+    ASSERT_EQ(1u, run.cpus.size());
+    IC::Node const* node = run.cpus[0];
     // No serial, asset tag or part number fields; the 64-bit bit reads as
     // clear; the core fields read as 0 and are set all the same.
     EXPECT_EQ((std::vector<unsigned int>{15, 19, 36, 38, 53, 55, 80, 87, 89, 124, 125, 189, 190,
@@ -810,17 +745,13 @@ TEST(ProcessorNodes, CoreCountZeroMakesNoCoreNodes) {
     c.threadCount = 4;
     TableBuilder table;
     table.add(cpu(c));
-    Built built(table);
     TestMI mi;
-    IC::MutableNode* planar = buildertest::addParent(mi);
-
-    mi.makeCpuNodes(built.lists.get(), planar->getNodeId());
+    CpuRun const run(mi, table);
 
     EXPECT_TRUE(nodesOfType(mi, 42).empty());
-    std::vector<IC::Node*> const cpus = nodesOfType(mi, 4);
-    ASSERT_EQ(1u, cpus.size());
-    EXPECT_TRUE(hasUnsigned(cpus[0], 190, 0));
-    EXPECT_TRUE(hasUnsigned(cpus[0], 87, 4));
+    ASSERT_EQ(1u, run.cpus.size());
+    EXPECT_TRUE(hasUnsigned(run.cpus[0], 190, 0));
+    EXPECT_TRUE(hasUnsigned(run.cpus[0], 87, 4));
     EXPECT_EQ(" Cores =0 enabled=0 thread count=4 - no core data in smbios tables",
               frametest::firstLogged(" Cores ="))
         << log.dump();
@@ -836,17 +767,13 @@ TEST(ProcessorNodes, EmptyStringsAreSetAsEmptyText) {
     c.partNumber = "";
     TableBuilder table;
     table.add(cpu(c));
-    Built built(table);
     TestMI mi;
-    IC::MutableNode* planar = buildertest::addParent(mi);
+    CpuRun const run(mi, table);
 
-    mi.makeCpuNodes(built.lists.get(), planar->getNodeId());
-
-    std::vector<IC::Node*> const cpus = nodesOfType(mi, 4);
-    ASSERT_EQ(1u, cpus.size());
+    ASSERT_EQ(1u, run.cpus.size());
     for (unsigned int id : {53u, 36u, 307u, 50u, 2u, 45u}) {
         SCOPED_TRACE("property " + std::to_string(id));
-        EXPECT_TRUE(hasString(cpus[0], id, ""));
+        EXPECT_TRUE(hasString(run.cpus[0], id, ""));
     }
 }
 
@@ -854,11 +781,8 @@ TEST(ProcessorNodes, NoProcessorStructuresLogCountZeroAndMakeNothing) {
     smbiostest::LogCapture log;
     TableBuilder table;
     table.add(cache(0x0700, "L1-Cache", 1));
-    Built built(table);
     TestMI mi;
-    IC::MutableNode* planar = buildertest::addParent(mi);
-
-    mi.makeCpuNodes(built.lists.get(), planar->getNodeId());
+    CpuRun const run(mi, table);
 
     EXPECT_EQ(1u, mi.nodeList.size());
     EXPECT_EQ(
