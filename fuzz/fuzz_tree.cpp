@@ -2,6 +2,7 @@
 // plug-in's initialize groups them, and turned into the whole inventory tree
 // by every builder, including those the agent may call on its own.
 #include <cstdint>
+#include <cstdlib>
 #include <memory>
 #include <vector>
 
@@ -42,6 +43,13 @@ public:
 }  // namespace
 
 extern "C" int LLVMFuzzerInitialize(int*, char***) {
+    // The computer-system builder reads the process's table once (for the
+    // UUID rule). Point the acquisition at folders with neither an override
+    // file nor libpmem.so: the table stays empty, and no instrumented
+    // library is loaded and unloaded under the fuzzer, whose coverage
+    // counters would then point at unmapped memory.
+    setenv("KESTREL_DATA_DIR", "/nonexistent-smbios-fuzz-data/", 1);
+    setenv("KESTREL_CODE_DIR", "/nonexistent-smbios-fuzz-code/", 1);
     QNLog::QNLogger::setLogLevel(QNLog::LEVEL_OFF);
     QNLog::QNLogger::setTraceLevel(QNLog::LEVEL_OFF);
     return 0;
