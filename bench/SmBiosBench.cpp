@@ -7,6 +7,7 @@
 #include <cstdlib>
 #include <fstream>
 #include <iterator>
+#include <memory>
 #include <string>
 #include <vector>
 
@@ -82,14 +83,9 @@ class BenchMI : public IC::SmBiosMI {
 public:
     size_t build(SD::SmBios const& parsed) {
         IC::ManagementInterface::initialize(1, IC::Number(0u), IC::Number(0u));
-        std::vector<IC::TableData> storage[256];
+        std::unique_ptr<std::vector<IC::TableData>> owners[256];
         std::vector<IC::TableData>* lists[256];
-        for (unsigned int type = 0; type < 256; ++type) {
-            lists[type] = &storage[type];
-        }
-        for (SD::SmBios::Table const& t : parsed.getTables()) {
-            storage[t.getType()].push_back(IC::TableData(&t, t.getLength()));
-        }
+        groupStructures(parsed, owners, lists);
         makeRootNode(lists);
         return nodeList.size();
     }

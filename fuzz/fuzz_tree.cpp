@@ -17,14 +17,9 @@ class FuzzMI : public IC::SmBiosMI {
 public:
     void build(SD::SmBios const& parsed) {
         IC::ManagementInterface::initialize(1, IC::Number(0u), IC::Number(0u));
-        std::vector<IC::TableData> storage[256];
+        std::unique_ptr<std::vector<IC::TableData>> owners[256];
         std::vector<IC::TableData>* lists[256];
-        for (unsigned int type = 0; type < 256; ++type) {
-            lists[type] = &storage[type];
-        }
-        for (SD::SmBios::Table const& t : parsed.getTables()) {
-            storage[t.getType()].push_back(IC::TableData(&t, t.getLength()));
-        }
+        groupStructures(parsed, owners, lists);
         makeRootNode(lists);
         makeBMCNodes(lists, 2);
         makeTemperatureSensorNodes(lists, 2, 3);

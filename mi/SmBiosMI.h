@@ -175,7 +175,6 @@ protected:
     unsigned int smbiosMajorVersion = 0;
     unsigned int smbiosMinorVersion = 0;
 
-private:
     // Makes the structure lists, one new list per SMBIOS type in owners
     // (lists holds the same lists for the builders), and files every
     // structure of smbios in the list of its type; a structure that cannot

@@ -5,6 +5,18 @@
 
 namespace smbiosdump {
 
+uint16_t getWord(std::vector<uint8_t> const& bytes, size_t offset) {
+    return static_cast<uint16_t>(bytes[offset] | (bytes[offset + 1] << 8));
+}
+
+uint32_t getDword(std::vector<uint8_t> const& bytes, size_t offset) {
+    uint32_t value = 0;
+    for (size_t i = 0; i < 4; ++i) {
+        value |= static_cast<uint32_t>(bytes[offset + i]) << (8 * i);
+    }
+    return value;
+}
+
 namespace {
 
 void putWord(std::vector<uint8_t>& bytes, size_t offset, uint16_t value) {
@@ -16,18 +28,6 @@ void putDword(std::vector<uint8_t>& bytes, size_t offset, uint32_t value) {
     for (size_t i = 0; i < 4; ++i) {
         bytes[offset + i] = static_cast<uint8_t>((value >> (8 * i)) & 0xFF);
     }
-}
-
-uint16_t getWord(std::vector<uint8_t> const& bytes, size_t offset) {
-    return static_cast<uint16_t>(bytes[offset] | (bytes[offset + 1] << 8));
-}
-
-uint32_t getDword(std::vector<uint8_t> const& bytes, size_t offset) {
-    uint32_t value = 0;
-    for (size_t i = 0; i < 4; ++i) {
-        value |= static_cast<uint32_t>(bytes[offset + i]) << (8 * i);
-    }
-    return value;
 }
 
 uint64_t getQword(std::vector<uint8_t> const& bytes, size_t offset) {

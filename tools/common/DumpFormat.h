@@ -34,6 +34,11 @@ constexpr size_t DMI_ENTRY_POINT_SIZE = 0x0F;
 constexpr size_t SM3_ENTRY_POINT_SIZE = 0x18;
 constexpr uint32_t DUMP_BIN_TABLE_OFFSET = 0x20;
 
+// The little-endian 16- and 32-bit values at offset; the caller keeps the
+// field inside bytes.
+uint16_t getWord(std::vector<uint8_t> const& bytes, size_t offset);
+uint32_t getDword(std::vector<uint8_t> const& bytes, size_t offset);
+
 // The 31-byte "_SM_" entry point, both checksums set, entry-point revision
 // 0. Its BCD revision is major*16+minor when both are below 10, else 0.
 std::vector<uint8_t> makeSmEntryPoint(uint8_t major, uint8_t minor, uint16_t tableLength,

@@ -19,18 +19,6 @@ std::string hex(uint64_t value) {
     return text;
 }
 
-uint16_t getWord(std::vector<uint8_t> const& bytes, size_t offset) {
-    return static_cast<uint16_t>(bytes[offset] | (bytes[offset + 1] << 8));
-}
-
-uint32_t getDword(std::vector<uint8_t> const& bytes, size_t offset) {
-    uint32_t value = 0;
-    for (size_t i = 0; i < 4; ++i) {
-        value |= static_cast<uint32_t>(bytes[offset + i]) << (8 * i);
-    }
-    return value;
-}
-
 // A number 0-255 in decimal, at least one digit.
 bool parseByte(std::string const& text, uint8_t& value) {
     if (text.empty() || text.size() > 3) {
