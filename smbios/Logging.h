@@ -1,7 +1,12 @@
 // The plug-in's logging: every message is composed once in a
 // QNMessageBuffer and written twice, through the log and through the trace,
-// with the function, source file, line and the file's logger. Nothing is
-// composed when no output takes the level.
+// with the function, source file, line and the file's logger.
+//
+// Nothing is composed when no output takes the level, so the expression
+// given to a log macro must have no effect: no structure read, no call that
+// may throw or change state. A value a step reads for its log line is read
+// into a local first and the local is logged, so that what is read, and
+// every exception a read may raise, never depend on the log thresholds.
 #pragma once
 
 #include "QNLog/QNLogger.h"

@@ -56,21 +56,32 @@ void SmBiosMI::makeLogNodes(TableLists tables, unsigned int parentId) {
                                                                      Number(16u), Number(31u)},
                                                  true));
 
-            SMBIOS_DETAIL(logger, "Handle=" << getNumber16(t, HANDLE));
-            SMBIOS_DETAIL(logger, "Log Header Start offset=" << getNumber16(t, HEADER_START));
-            SMBIOS_DETAIL(logger, "Log Data Start offset=" << getNumber16(t, DATA_START));
-            SMBIOS_DETAIL(logger, "Access Method=" << getNumber8(t, ACCESS_METHOD));
-            SMBIOS_DETAIL(logger, "Log Status=" << getNumber8(t, LOG_STATUS));
-            SMBIOS_DETAIL(logger, "Log Change Status=" << bytesText(getBuffer(t, CHANGE_TOKEN, 4)));
-            SMBIOS_DETAIL(logger,
-                          "Access Method Address=" << bytesText(getBuffer(t, ACCESS_ADDRESS, 4)));
-            SMBIOS_DETAIL(logger, "Log Header Format=" << getNumber8(t, HEADER_FORMAT));
+            // The header fields are only logged, but each is read whatever
+            // the log thresholds: a field cut off by a short structure ends
+            // this structure's handling at every level alike.
+            unsigned int const handle = getNumber16(t, HANDLE);
+            SMBIOS_DETAIL(logger, "Handle=" << handle);
+            unsigned int const headerStart = getNumber16(t, HEADER_START);
+            SMBIOS_DETAIL(logger, "Log Header Start offset=" << headerStart);
+            unsigned int const dataStart = getNumber16(t, DATA_START);
+            SMBIOS_DETAIL(logger, "Log Data Start offset=" << dataStart);
+            unsigned int const accessMethod = getNumber8(t, ACCESS_METHOD);
+            SMBIOS_DETAIL(logger, "Access Method=" << accessMethod);
+            unsigned int const logStatus = getNumber8(t, LOG_STATUS);
+            SMBIOS_DETAIL(logger, "Log Status=" << logStatus);
+            std::vector<unsigned char> const changeToken = getBuffer(t, CHANGE_TOKEN, 4);
+            SMBIOS_DETAIL(logger, "Log Change Status=" << bytesText(changeToken));
+            std::vector<unsigned char> const accessAddress = getBuffer(t, ACCESS_ADDRESS, 4);
+            SMBIOS_DETAIL(logger, "Access Method Address=" << bytesText(accessAddress));
+            unsigned int const headerFormat = getNumber8(t, HEADER_FORMAT);
+            SMBIOS_DETAIL(logger, "Log Header Format=" << headerFormat);
             unsigned int const descriptorCount = getNumber8(t, DESCRIPTOR_COUNT);
             unsigned int const descriptorLength = getNumber8(t, DESCRIPTOR_LENGTH);
             SMBIOS_DETAIL(logger, "Number of Log Type Descriptors=" << descriptorCount);
             SMBIOS_DETAIL(logger, "Log Type Descriptor Length=" << descriptorLength);
-            SMBIOS_DETAIL(logger, "Log Type Descriptors=" << bytesText(getBufferUnprot(
-                                      t, DESCRIPTORS, descriptorCount * descriptorLength)));
+            std::vector<unsigned char> const descriptors =
+                getBufferUnprot(t, DESCRIPTORS, descriptorCount * descriptorLength);
+            SMBIOS_DETAIL(logger, "Log Type Descriptors=" << bytesText(descriptors));
         }
         SMBIOSMI_CATCH_STRUCTURE(logger, 15, k)
     }
