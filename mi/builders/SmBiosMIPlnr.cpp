@@ -126,19 +126,19 @@ void SmBiosMI::makePlanarNodes(TableLists tables, unsigned int parentNodeId) {
             node->setProperty(31, PropertyValue(location, true));
             parent->setProperty(31, PropertyValue(location, true));
         }
-        SMBIOS_DETAIL(logger, "Handle=" << getNumber16(t, CHASSIS_HANDLE));
+        // Read whatever the log thresholds: a chassis handle cut off by a
+        // short structure ends the planar here at every level alike.
+        unsigned int const chassisHandle = getNumber16(t, CHASSIS_HANDLE);
+        SMBIOS_DETAIL(logger, "Handle=" << chassisHandle);
         node->setProperty(128, PropertyValue(Number(getNumber8(t, BOARD_TYPE)), true));
 
         // The planar takes every structure over into groups of its own; the
-        // shared groups are left empty.
+        // shared groups are left empty. Each group moves whole, in its order.
         std::vector<TableData>* groups[256];
         for (unsigned int type = 0; type < 256; ++type) {
             owners[type].reset(new std::vector<TableData>());
             groups[type] = owners[type].get();
-            while (!tables[type]->empty()) {
-                groups[type]->push_back(tables[type]->front());
-                tables[type]->erase(tables[type]->begin());
-            }
+            groups[type]->swap(*tables[type]);
         }
 
         unsigned int const count = getNumber8(t, CONTAINED_COUNT);
@@ -163,10 +163,10 @@ void SmBiosMI::makePlanarNodes(TableLists tables, unsigned int parentNodeId) {
                     for (unsigned int type = 0; type < 256 && !found; ++type) {
                         for (TableData const& member : *groups[type]) {
                             if (getNumber16(member.table, HANDLE) == contained) {
+                                unsigned int const memberType = member.table->getByte(0);
                                 SMBIOS_DETAIL(logger, "Planar contained element handle "
                                                           << contained << " found in Bios table "
-                                                          << static_cast<unsigned int>(
-                                                                 member.table->getByte(0)));
+                                                          << memberType);
                                 found = true;
                                 break;
                             }
