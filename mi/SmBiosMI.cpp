@@ -1,6 +1,7 @@
 #include "mi/SmBiosMI.h"
 
 #include <memory>
+#include <mutex>
 
 #include "IC/PropertyValue.h"
 #include "IC/Version2.h"
@@ -32,6 +33,9 @@ MutableNode* SmBiosMI::newNode(unsigned int parentId, unsigned int nodeType, uns
 }
 
 Error SmBiosMI::initialize(unsigned int id, Number const& a, Number const& b) {
+    // One initialize at a time, and no other operation on this interface
+    // while the node list is rebuilt: the agent may call from several threads.
+    std::lock_guard<std::recursive_mutex> const guard(operationLock());
     SMBIOS_DETAIL(logger, "initialize entry");
     for (unsigned int type = 0; type < 256; ++type) {
         tablecount[type] = 0;
@@ -110,6 +114,7 @@ void SmBiosMI::groupStructures(SD::SmBios const& smbios,
 
 bool SmBiosMI::makeRequestedNodes(unsigned int parentId, unsigned int const* locations,
                                   unsigned int locationCount, bool bmc) {
+    std::lock_guard<std::recursive_mutex> const guard(operationLock());
     SMBIOS_DETAIL(logger, "makeRequestedNodes entry");
     bool parentFound = false;
     for (Node const* node : nodeList) {

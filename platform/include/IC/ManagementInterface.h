@@ -1,8 +1,16 @@
 // The base class of every management interface the agent loads. It owns the
 // nodes in its node list and deletes them. The order of the virtual
 // operations is part of the agent's interface and must not change.
+//
+// The agent may call an interface from several threads: every operation
+// holds the interface's operation lock, a recursive mutex, for its whole
+// run, so calls on one interface are serialised. A derived interface whose
+// operation builds on the base's (an initialize that fills the node list)
+// holds the same lock for its whole run too (operationLock()), so that no
+// other call sees the node list half made.
 #pragma once
 
+#include <mutex>
 #include <string>
 #include <vector>
 
@@ -42,6 +50,9 @@ public:
     virtual Error getNode(std::string const& name, Node*& node);
 
 protected:
+    // The lock every operation holds; see above.
+    std::recursive_mutex& operationLock() const { return operationMutex_; }
+
     unsigned int miId;
     unsigned int nextNodeId;
     std::vector<unsigned int> miIdList;
@@ -52,6 +63,7 @@ private:
     ManagementInterface& operator=(ManagementInterface const&) = delete;
     void deleteNodes();
 
+    mutable std::recursive_mutex operationMutex_;
     AlertCallback alertCallback_ = nullptr;
     void const* alertContext_ = nullptr;
     LoadCallback loadCallback_ = nullptr;
