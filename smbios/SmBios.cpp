@@ -11,6 +11,19 @@ namespace SMBIOS_CLASS {
 SD::Mutex _initMutex;
 SmBiosInitializer* _smbios = nullptr;
 QNLog::QNLogger loggerSmBios("Quillon.IC.SmBios");
+
+namespace {
+// The acquisition is kept for the life of the process, which for a plug-in
+// ends when the agent unloads it: then it is released, so that a load,
+// initialize and unload cycle leaves nothing behind. Defined after the
+// mutex, so it goes first when the statics are destroyed.
+struct ReleaseAtUnload {
+    ~ReleaseAtUnload() {
+        delete _smbios;
+        _smbios = nullptr;
+    }
+} releaseAtUnload;
+}  // namespace
 }  // namespace SMBIOS_CLASS
 
 using SMBIOS_CLASS::loggerSmBios;

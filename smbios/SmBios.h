@@ -104,7 +104,8 @@ std::ostream& operator<<(std::ostream& out, std::vector<SmBios::String> const& s
 namespace SMBIOS_CLASS {
 // Guards the first acquisition of the process.
 extern SD::Mutex _initMutex;
-// The one acquisition, null until the first SmBios() completes it.
+// The one acquisition, null until the first SmBios() completes it;
+// released when the library is unloaded.
 extern SmBiosInitializer* _smbios;
 extern QNLog::QNLogger loggerSmBios;
 }  // namespace SMBIOS_CLASS

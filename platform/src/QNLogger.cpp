@@ -116,8 +116,6 @@ void writeMessage(char const* output, bool enabled, char const* function, char c
 
 }  // namespace
 
-QNLogger::QNLogger(char const* name) : name_(orEmpty(name)) {}
-
 void QNLogger::logLevelMessage(char const* function, char const* file, int line,
                                QNLogger const& logger, int level, QNMessageBuffer const& message) {
     writeMessage("log", isLogEnabled(level), function, file, line, logger, level, message);

@@ -33,10 +33,16 @@ struct QNLogRecord {
     std::string text;
 };
 
+// A logger keeps only a pointer to its name, which must outlive it (a
+// string literal): a logger has nothing to destroy, so a message written
+// while a library's statics are being destroyed still finds its logger
+// whole, whatever order the statics go in.
 class QNLogger {
 public:
-    explicit QNLogger(char const* name);
-    std::string const& getName() const { return name_; }
+    // Constant-initialised for a literal name: usable from any static
+    // initialiser, before or after its own turn.
+    constexpr explicit QNLogger(char const* name) : name_(name != nullptr ? name : "") {}
+    char const* getName() const { return name_; }
 
     static void logLevelMessage(char const* function, char const* file, int line,
                                 QNLogger const& logger, int level, QNMessageBuffer const& message);
@@ -73,7 +79,7 @@ public:
     static size_t capturedCount(std::string const& text, std::string const& output = "log");
 
 private:
-    std::string name_;
+    char const* name_;
 };
 
 }  // namespace QNLog
