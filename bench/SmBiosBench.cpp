@@ -1,9 +1,15 @@
 // Speed and memory of the table parser, the dump-file import and the whole
 // tree build, on a synthetic table, the example server and (when the corpus
-// folder is there) the largest real table, a VMware machine's.
+// folder is there) the largest real table, a VMware machine's; and the
+// built plug-in's initialize, loaded as the agent loads it, on a realistic
+// 64 KB table and on 10,000 small structures.
 #include <benchmark/benchmark.h>
+#include <dlfcn.h>
 #include <malloc.h>
+#include <sys/stat.h>
+#include <unistd.h>
 
+#include <cstdio>
 #include <cstdlib>
 #include <fstream>
 #include <iterator>
@@ -12,6 +18,7 @@
 #include <vector>
 
 #include "DumpFormat.h"
+#include "IC/ManagementInterface.h"
 #include "IC/Number.h"
 #include "QNLog/QNLogger.h"
 #include "mi/SmBiosMI.h"
@@ -157,6 +164,167 @@ BENCHMARK(BM_BuildTreeExample);
 
 void BM_BuildTreeVMware(benchmark::State& state) { buildTree(state, vmwareTable()); }
 BENCHMARK(BM_BuildTreeVMware);
+
+// The example's structures, without its end-of-table structure, repeated
+// with fresh handles until the next copy would pass 64 KB, then an
+// end-of-table structure: a large server's table of the usual kinds.
+std::vector<unsigned char> realistic64KTable() {
+    SD::SmBios const example(exampleTable());
+    std::vector<unsigned char> raw;
+    unsigned int handle = 0;
+    size_t copySize = 0;
+    for (SD::SmBios::Table const& table : example.getTables()) {
+        copySize += table.getType() == 127 ? 0 : table.getData().size();
+    }
+    while (copySize != 0 && raw.size() + copySize + 6 <= 0xFFFF) {
+        for (SD::SmBios::Table const& table : example.getTables()) {
+            if (table.getType() == 127) {
+                continue;
+            }
+            std::vector<unsigned char> bytes = table.getData();
+            bytes[2] = static_cast<unsigned char>(handle & 0xFF);
+            bytes[3] = static_cast<unsigned char>(handle >> 8);
+            ++handle;
+            raw.insert(raw.end(), bytes.begin(), bytes.end());
+        }
+    }
+    for (unsigned char b :
+         {127, 4, static_cast<int>(handle & 0xFF), static_cast<int>(handle >> 8), 0, 0}) {
+        raw.push_back(static_cast<unsigned char>(b));
+    }
+    return raw;
+}
+
+// Appends a structure without strings: its header, the fields given, and
+// the empty string set.
+void appendStructure(std::vector<unsigned char>& raw, unsigned char type, unsigned int handle,
+                     std::vector<unsigned char> const& fields) {
+    raw.push_back(type);
+    raw.push_back(static_cast<unsigned char>(4 + fields.size()));
+    raw.push_back(static_cast<unsigned char>(handle & 0xFF));
+    raw.push_back(static_cast<unsigned char>(handle >> 8));
+    raw.insert(raw.end(), fields.begin(), fields.end());
+    raw.push_back(0);
+    raw.push_back(0);
+}
+
+// A computer system, a chassis and a baseboard, so that the whole tree is
+// built under a planar, then count Inactive structures (type 126) of the
+// smallest size and an end-of-table structure.
+std::vector<unsigned char> inactiveTable(unsigned int count) {
+    std::vector<unsigned char> raw;
+    appendStructure(raw, 1, 0, {0, 0, 0, 0});
+    // Chassis: no strings, type 0x17 (rack mount chassis).
+    appendStructure(raw, 3, 1, {0, 0x17, 0, 0, 0});
+    // Baseboard: no strings, no features, chassis handle 1, a motherboard,
+    // no contained objects.
+    appendStructure(raw, 2, 2, {0, 0, 0, 0, 0, 0, 0, 1, 0, 0x0A, 0});
+    for (unsigned int i = 0; i < count; ++i) {
+        appendStructure(raw, 126, 3 + i, {});
+    }
+    appendStructure(raw, 127, 3 + count, {});
+    return raw;
+}
+
+// The folder of this program, where the built plug-in lies beside it.
+std::string programFolder() {
+    char const* out = std::getenv("SMBIOS_OUT_DIR");
+    if (out != nullptr) {
+        return out;
+    }
+    std::vector<char> path(4096);
+    ssize_t const length = readlink("/proc/self/exe", path.data(), path.size() - 1);
+    std::string const self(path.data(), length > 0 ? static_cast<size_t>(length) : 0);
+    size_t const slash = self.rfind('/');
+    return slash == std::string::npos ? "." : self.substr(0, slash);
+}
+
+// The built plug-in, loaded with an override file of the given table in a
+// private data folder, so that its acquisition takes that table; unloaded
+// and the folder removed when the object goes.
+class LoadedPlugin {
+public:
+    explicit LoadedPlugin(std::vector<unsigned char> const& raw) {
+        char const* tmp = std::getenv("TMPDIR");
+        std::string pattern =
+            std::string(tmp != nullptr && *tmp != '\0' ? tmp : "/tmp") + "/smbios-bench-XXXXXX";
+        if (mkdtemp(&pattern[0]) == nullptr) {
+            return;
+        }
+        folder_ = pattern;
+        overrideDir_ = folder_ + "/SmBiosOverride";
+        overrideFile_ = overrideDir_ + "/smbios.txt";
+        mkdir(overrideDir_.c_str(), 0700);
+        std::vector<uint8_t> const table(raw.begin(), raw.end());
+        std::vector<uint8_t> const header = smbiosdump::makeSmEntryPoint(
+            2, 7, static_cast<uint16_t>(table.size() > 0xFFFF ? 0xFFFF : table.size()), 0x000E1000,
+            0, 0);
+        std::ofstream(overrideFile_) << smbiosdump::formatOverride(header, table);
+        setenv("KESTREL_DATA_DIR", folder_.c_str(), 1);
+        setenv("KESTREL_CODE_DIR", folder_.c_str(), 1);
+        handle_ = dlopen((programFolder() + "/libsmbiosmi.so").c_str(), RTLD_NOW | RTLD_LOCAL);
+        if (handle_ == nullptr) {
+            return;
+        }
+        auto const openMI = reinterpret_cast<IC::OpenMIFunction>(dlsym(handle_, "OpenMI"));
+        IC::Error* err = nullptr;
+        if (openMI == nullptr || openMI(&mi_, &err) != 0) {
+            mi_ = nullptr;
+        }
+    }
+    ~LoadedPlugin() {
+        if (handle_ != nullptr) {
+            dlclose(handle_);
+        }
+        if (!folder_.empty()) {
+            std::remove(overrideFile_.c_str());
+            rmdir(overrideDir_.c_str());
+            rmdir(folder_.c_str());
+        }
+        unsetenv("KESTREL_DATA_DIR");
+        unsetenv("KESTREL_CODE_DIR");
+    }
+    LoadedPlugin(LoadedPlugin const&) = delete;
+    LoadedPlugin& operator=(LoadedPlugin const&) = delete;
+
+    IC::ManagementInterface* mi() const { return mi_; }
+
+private:
+    std::string folder_;
+    std::string overrideDir_;
+    std::string overrideFile_;
+    void* handle_ = nullptr;
+    IC::ManagementInterface* mi_ = nullptr;
+};
+
+// initialize of the built plug-in, after its one acquisition: the copy of
+// the acquired table, the grouping and the whole tree.
+void initializePlugin(benchmark::State& state, std::vector<unsigned char> const& raw) {
+    LoadedPlugin plugin(raw);
+    if (plugin.mi() == nullptr) {
+        state.SkipWithError("the built plug-in could not be loaded");
+        return;
+    }
+    plugin.mi()->initialize(1, IC::Number(0u), IC::Number(0u));
+    for (auto _ : state) {
+        plugin.mi()->initialize(1, IC::Number(0u), IC::Number(0u));
+    }
+    std::vector<IC::Node*> nodes;
+    plugin.mi()->getMap(nodes);
+    state.counters["nodes"] = static_cast<double>(nodes.size());
+    state.counters["table_bytes"] = static_cast<double>(raw.size());
+    state.counters["structures"] = static_cast<double>(SD::SmBios(raw).getTables().size());
+}
+
+void BM_InitializeRealistic64KTable(benchmark::State& state) {
+    initializePlugin(state, realistic64KTable());
+}
+BENCHMARK(BM_InitializeRealistic64KTable)->Unit(benchmark::kMillisecond);
+
+void BM_Initialize10000InactiveStructures(benchmark::State& state) {
+    initializePlugin(state, inactiveTable(10000));
+}
+BENCHMARK(BM_Initialize10000InactiveStructures)->Unit(benchmark::kMillisecond);
 
 }  // namespace
 
