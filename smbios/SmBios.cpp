@@ -32,11 +32,48 @@ SmBios::Table::Table() = default;
 
 SmBios::Table::Table(std::vector<unsigned char> const& bytes) : Table(bytes.data(), bytes.size()) {}
 
+namespace {
+
+// Where the string set that starts at bytes[start] ends: the position of its
+// double NUL, or size when the bytes run out first (a missing byte after the
+// last one counts as the end). nulCount is the number of NULs before it,
+// each the end of one string.
+size_t stringSetEnd(unsigned char const* bytes, size_t size, size_t start, unsigned int& nulCount) {
+    nulCount = 0;
+    size_t p = start;
+    for (; p < size; ++p) {
+        if (bytes[p] == 0 && (p + 1 >= size || bytes[p + 1] == 0)) {
+            break;
+        }
+        if (bytes[p] == 0) {
+            ++nulCount;
+        }
+    }
+    return p;
+}
+
+// The size a structure parsed from bytes[0, size) gets: its formatted area
+// as its length byte says (bounded by what is there), the string set's
+// bytes, and the two NULs appended. 0 when fewer than four bytes are left.
+size_t parsedSize(unsigned char const* bytes, size_t size) {
+    if (size <= 3) {
+        return 0;
+    }
+    size_t const length = bytes[1];
+    size_t const formatted = length < size ? length : size;
+    unsigned int nulCount = 0;
+    size_t const end = stringSetEnd(bytes, size, length, nulCount);
+    return formatted + (end > length ? end - length : 0) + 2;
+}
+
+}  // namespace
+
 // Parses one structure from bytes[0, size): the formatted area as its length
 // byte says (bounded by what is there), then the string set up to its double
 // NUL, where a missing byte after the last one counts as the end. Each NUL
 // inside the set ends one string; the count is one more than those, so an
-// empty string set still counts one (empty) string.
+// empty string set still counts one (empty) string. The data is allocated
+// once, at its size.
 SmBios::Table::Table(unsigned char const* bytes, size_t size) {
     if (size <= 3) {
         SMBIOS_DETAIL(loggerSmBios, "Table::Constructor vector<Byte> too small return");
@@ -45,19 +82,15 @@ SmBios::Table::Table(unsigned char const* bytes, size_t size) {
     type_ = bytes[0];
     length_ = bytes[1];
     handle_ = static_cast<unsigned short>(bytes[2] + 256u * bytes[3]);
-    strCount_ = 0;
     size_t const formatted = length_ < size ? length_ : size;
+    unsigned int nulCount = 0;
+    size_t const end = stringSetEnd(bytes, size, length_, nulCount);
+    data_.reserve(parsedSize(bytes, size));
     data_.assign(bytes, bytes + formatted);
-    for (size_t p = length_; p < size; ++p) {
-        if (bytes[p] == 0 && (p + 1 >= size || bytes[p + 1] == 0)) {
-            break;
-        }
-        data_.push_back(bytes[p]);
-        if (bytes[p] == 0) {
-            ++strCount_;
-        }
+    if (end > length_) {
+        data_.insert(data_.end(), bytes + length_, bytes + end);
     }
-    ++strCount_;
+    strCount_ = nulCount + 1;
     data_.push_back(0);
     data_.push_back(0);
     SMBIOS_DETAIL(loggerSmBios, "Table::Constructor vector<Byte> good return");
@@ -168,6 +201,20 @@ SmBios::SmBios(std::vector<unsigned char> const& raw) {
     // position advances by the size of its data. Parsing ends when fewer than
     // four bytes are left, or when a last structure without a string set got
     // a terminator appended that carries the position past the end.
+    //
+    // The structures are counted first, so that the list is allocated once
+    // at its size: a large table of small structures costs no more than it
+    // holds.
+    size_t count = 0;
+    for (size_t pos = 0; pos < raw.size();) {
+        size_t const size = parsedSize(raw.data() + pos, raw.size() - pos);
+        if (size == 0) {
+            break;
+        }
+        pos += size;
+        ++count;
+    }
+    tables_.reserve(count);
     size_t pos = 0;
     while (pos < raw.size()) {
         Table table(raw.data() + pos, raw.size() - pos);

@@ -87,6 +87,9 @@ public:
     unsigned char find(unsigned char type);
 
 protected:
+    // The acquisition moves a parsed table's structures into itself.
+    friend class SmBiosInitializer;
+
     unsigned char majorVersion_ = 0;
     unsigned char minorVersion_ = 0;
     unsigned char revision_ = 0;

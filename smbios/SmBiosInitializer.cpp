@@ -97,13 +97,13 @@ SmBiosInitializer::~SmBiosInitializer() {
 
 void SmBiosInitializer::takeTables(std::vector<unsigned char> const& raw) {
     SmBios parsed(raw);
-    tables_ = parsed.getTables();
+    tables_ = std::move(parsed.tables_);
 }
 
 // The override file was read: its header and table section decide alone;
 // a failure leaves the table empty and the machine's memory is not tried.
 void SmBiosInitializer::acquireFromFile(std::string const&, std::vector<std::string> const& head,
-                                        std::vector<std::string> const& tableTokens) {
+                                        std::vector<std::string>& tableTokens) {
     std::vector<unsigned char> header;
     int const headResult = readHead(header, head);
     if (headResult != 0) {
@@ -144,6 +144,7 @@ void SmBiosInitializer::acquireFromFile(std::string const&, std::vector<std::str
     }
     std::vector<unsigned char> raw;
     int const tablesResult = readTables(raw, tableTokens);
+    std::vector<std::string>().swap(tableTokens);
     if (tablesResult != 0) {
         SMBIOS_WARNING(loggerSmBiosInitializer,
                        "Constructor readTables() return code " << tablesResult);
@@ -154,6 +155,7 @@ void SmBiosInitializer::acquireFromFile(std::string const&, std::vector<std::str
     revision_ = 0;
     SMBIOS_DETAIL(loggerSmBiosInitializer, "Constructor going to SmBios.getTables()");
     takeTables(raw);
+    std::vector<unsigned char>().swap(raw);
     SMBIOS_DETAIL(loggerSmBiosInitializer, "Constructor return from SmBios.getTables()");
     std::sort(tables_.begin(), tables_.end(), _sort_criterion_handle);
     SMBIOS_DETAIL(loggerSmBiosInitializer, "Constructor success");
@@ -247,15 +249,16 @@ int importSmBios(std::string const& path, std::vector<std::string>& head,
     bool headerEnded = false;
     bool tableRead = false;
     std::string token;
+    // Each token moves into its list: a data run can be as long as the file.
     while (!headerEnded && readTableLine(file, token) == 0) {
-        head.push_back(token);
-        SMBIOS_DETAIL(loggerSmBiosInitializer, "importSmBios() header='" << token << "'");
-        headerEnded = token.find("</EPHEADER>") != std::string::npos;
+        head.push_back(std::move(token));
+        SMBIOS_DETAIL(loggerSmBiosInitializer, "importSmBios() header='" << head.back() << "'");
+        headerEnded = head.back().find("</EPHEADER>") != std::string::npos;
     }
     while (headerEnded && readTableLine(file, token) == 0) {
-        tables.push_back(token);
+        tables.push_back(std::move(token));
         tableRead = true;
-        SMBIOS_DETAIL(loggerSmBiosInitializer, "importSmBios() table='" << token << "'");
+        SMBIOS_DETAIL(loggerSmBiosInitializer, "importSmBios() table='" << tables.back() << "'");
     }
     int const closeResult = PlatformUtilities::closeFile(&file);
     SMBIOS_DETAIL(loggerSmBiosInitializer, "importSmBios() file close code " << closeResult);
@@ -369,6 +372,15 @@ int readHead(std::vector<unsigned char>& bytes, std::vector<std::string> const& 
 }
 
 int readTables(std::vector<unsigned char>& bytes, std::vector<std::string> const& tables) {
+    // Room for every data run at once (size blocks included, an overestimate
+    // of a few bytes at most), so that the bytes are not copied as they grow.
+    size_t hexDigits = 0;
+    for (std::string const& token : tables) {
+        if (!token.empty() && token[0] != '<') {
+            hexDigits += token.size();
+        }
+    }
+    bytes.reserve(bytes.size() + hexDigits / 2);
     bool inSizeBlock = false;
     bool endSeen = false;
     for (std::string const& token : tables) {

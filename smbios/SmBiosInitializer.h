@@ -19,8 +19,10 @@ public:
     ~SmBiosInitializer() override;
 
 private:
+    // Takes the override file's header and table tokens; the table tokens
+    // are released once decoded.
     void acquireFromFile(std::string const& path, std::vector<std::string> const& head,
-                         std::vector<std::string> const& tables);
+                         std::vector<std::string>& tables);
     void acquireFromMemory();
     void takeTables(std::vector<unsigned char> const& raw);
 };

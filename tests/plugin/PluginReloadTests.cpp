@@ -26,7 +26,11 @@ namespace {
 
 int const kCycles = 200;
 
-size_t heapInUse() { return mallinfo2().uordblks; }
+// Bytes in use on the heap, large blocks (mapped of their own) included.
+size_t heapInUse() {
+    struct mallinfo2 const info = mallinfo2();
+    return info.uordblks + info.hblkhd;
+}
 
 // One cycle: load, OpenMI, initialize, unload. Returns the number of nodes
 // the initialize made, 0 when a step failed (reported).
