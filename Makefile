@@ -4,7 +4,8 @@
 #   make              build (build/)
 #   make demo         run the host program on the example dump
 #   make test         build and run every test for this machine's architecture
-#   make check        the tests again under ASan+UBSan (clang) and as a 32-bit x86 build
+#   make check        the tests again under ASan+UBSan (clang), as a 32-bit x86 build, and
+#                     the plug-in's thread tests under ThreadSanitizer (clang)
 #   make install PREFIX=/opt/corvane   programs to PREFIX/bin, libraries to PREFIX/lib
 #   make fuzz         build the libFuzzer targets (clang) and run each for FUZZ_SECONDS
 #   make bench        build and run the benchmarks
@@ -21,10 +22,11 @@ GENERATOR := $(shell command -v ninja >/dev/null 2>&1 && echo "-G Ninja")
 BUILD := build
 ASAN_BUILD := build-asan
 M32_BUILD := build-m32
+TSAN_BUILD := build-tsan
 FUZZ_BUILD := build-fuzz
 EXAMPLE := examples/demo-server.smbios.txt
 
-.PHONY: all build demo test check check-asan check-m32 install fuzz bench format clean
+.PHONY: all build demo test check check-asan check-m32 check-tsan install fuzz bench format clean
 
 all: build
 
@@ -40,7 +42,7 @@ demo: build
 test: build
 	$(CTEST) --test-dir $(BUILD) --output-on-failure -j $(JOBS)
 
-check: check-asan check-m32
+check: check-asan check-m32 check-tsan
 
 check-asan:
 	CC=clang CXX=clang++ $(CMAKE) -S . -B $(ASAN_BUILD) $(GENERATOR) -DCMAKE_BUILD_TYPE=Debug -DSMBIOS_SANITIZE=ON
@@ -53,6 +55,14 @@ check-m32:
 	  -DCMAKE_C_FLAGS=-m32 -DCMAKE_CXX_FLAGS=-m32 -DSMBIOS_BENCH=OFF
 	$(CMAKE) --build $(M32_BUILD) -j $(JOBS)
 	$(CTEST) --test-dir $(M32_BUILD) --output-on-failure -j $(JOBS)
+
+# ThreadSanitizer: the platform library, the plug-in and its thread tests only.
+check-tsan:
+	CC=clang CXX=clang++ $(CMAKE) -S . -B $(TSAN_BUILD) $(GENERATOR) -DCMAKE_BUILD_TYPE=RelWithDebInfo \
+	  -DSMBIOS_TSAN=ON -DSMBIOS_BENCH=OFF
+	$(CMAKE) --build $(TSAN_BUILD) -j $(JOBS) --target plugin_thread_tests
+	TSAN_OPTIONS=halt_on_error=1:second_deadlock_stack=1 \
+	  $(CTEST) --test-dir $(TSAN_BUILD) --output-on-failure -j $(JOBS) -R "^PluginThreads\."
 
 install: build
 	$(CMAKE) --install $(BUILD) --prefix $(PREFIX)
@@ -71,4 +81,4 @@ format:
 	  \( -name '*.cpp' -o -name '*.h' \) -print0 | xargs -0 clang-format -i
 
 clean:
-	rm -rf $(BUILD) $(ASAN_BUILD) $(M32_BUILD) $(FUZZ_BUILD)
+	rm -rf $(BUILD) $(ASAN_BUILD) $(M32_BUILD) $(TSAN_BUILD) $(FUZZ_BUILD)
