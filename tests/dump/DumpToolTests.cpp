@@ -259,10 +259,10 @@ TEST(DumpTool, UnreadableInputFails) {
     expectInputRefused(
         runDump({"--from-table", missing, "--version", "2.7", "-o", dir.file("out.txt")}), missing,
         "No such file or directory", dir, {});
-    // A folder opens but does not read.
+    // A folder is not opened at all.
     ASSERT_EQ(mkdir(dir.file("folder").c_str(), 0755), 0);
     expectInputRefused(runDump({"--from-bin", dir.file("folder"), "-o", dir.file("out.txt")}),
-                       dir.file("folder"), "cannot read", dir, {"folder"});
+                       dir.file("folder"), "a directory, not a regular file", dir, {"folder"});
 }
 
 TEST(DumpTool, MalformedImageFails) {

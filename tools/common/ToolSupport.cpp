@@ -4,14 +4,62 @@
 #include <unistd.h>
 
 #include <CLI/CLI.hpp>
+#include <cerrno>
+#include <cstring>
 #include <exception>
 #include <iostream>
 #include <vector>
+
+#include "SD/RegularFile.h"
 
 namespace smbiostool {
 
 void complain(char const* program, std::string const& message) {
     std::cerr << program << ": " << message << std::endl;
+}
+
+bool readInputFile(std::string const& path, std::vector<std::uint8_t>& bytes, std::string& error) {
+    std::string why;
+    int const fd = SD::openRegularFile(path.c_str(), why);
+    if (fd < 0) {
+        error = "cannot open: " + why;
+        return false;
+    }
+    std::vector<std::uint8_t> content;
+    std::uint8_t buffer[65536];
+    bool tooLarge = false;
+    int readErrno = 0;
+    for (;;) {
+        ssize_t const count = ::read(fd, buffer, sizeof buffer);
+        if (count < 0) {
+            if (errno == EINTR) {
+                continue;
+            }
+            readErrno = errno;
+            break;
+        }
+        if (count == 0) {
+            break;
+        }
+        size_t const size = static_cast<size_t>(count);
+        if (size > MAX_INPUT_FILE_SIZE - content.size()) {
+            tooLarge = true;
+            break;
+        }
+        content.insert(content.end(), buffer, buffer + size);
+    }
+    ::close(fd);
+    if (readErrno != 0) {
+        error = std::string("cannot read: ") + std::strerror(readErrno);
+        return false;
+    }
+    if (tooLarge) {
+        error = "larger than " + std::to_string(MAX_INPUT_FILE_SIZE / (1024 * 1024)) +
+                " MiB, too large for an SMBIOS table";
+        return false;
+    }
+    bytes = std::move(content);
+    return true;
 }
 
 int usage(char const* program, std::string const& message) {

@@ -4,7 +4,10 @@
 // installed with them.
 #pragma once
 
+#include <cstddef>
+#include <cstdint>
 #include <string>
+#include <vector>
 
 namespace CLI {
 class App;
@@ -36,6 +39,17 @@ bool parseCommandLine(CLI::App& app, int argc, char** argv, char const* program,
 // that escapes it is said as an unexpected failure, and the status is then
 // EXIT_FAILED.
 int runMain(char const* program, int (*run)(int, char**), int argc, char** argv);
+
+// The largest input file the tools accept: a --dump-bin image, a raw table
+// or an override dump is at most some hundreds of kilobytes, so anything this
+// size is the wrong file.
+constexpr size_t MAX_INPUT_FILE_SIZE = 16u * 1024u * 1024u;
+
+// Reads the whole regular file into `bytes`, up to MAX_INPUT_FILE_SIZE,
+// without ever blocking on a FIFO or opening a device. Returns false and the
+// reason in `error` (without the file's name): "cannot open: No such file or
+// directory", "a FIFO, not a regular file", "larger than 16 MiB, ...".
+bool readInputFile(std::string const& path, std::vector<std::uint8_t>& bytes, std::string& error);
 
 // The folder that holds this program ("." when it cannot be told).
 std::string ownFolder();

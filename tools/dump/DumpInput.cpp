@@ -103,39 +103,6 @@ bool readFromOpenMemory(PMemFunctions const& pmem, Capture& capture, std::string
 
 }  // namespace
 
-bool readInputFile(std::string const& path, std::vector<uint8_t>& bytes, std::string& error) {
-    std::FILE* file = std::fopen(path.c_str(), "rb");
-    if (file == nullptr) {
-        error = std::string("cannot open: ") + std::strerror(errno);
-        return false;
-    }
-    std::vector<uint8_t> content;
-    uint8_t buffer[65536];
-    size_t count = 0;
-    bool tooLarge = false;
-    while ((count = std::fread(buffer, 1, sizeof buffer, file)) > 0) {
-        if (count > MAX_INPUT_FILE_SIZE - content.size()) {
-            tooLarge = true;
-            break;
-        }
-        content.insert(content.end(), buffer, buffer + count);
-    }
-    bool const failed = std::ferror(file) != 0;
-    int const readErrno = errno;
-    std::fclose(file);
-    if (failed) {
-        error = std::string("cannot read: ") + std::strerror(readErrno);
-        return false;
-    }
-    if (tooLarge) {
-        error = "larger than " + std::to_string(MAX_INPUT_FILE_SIZE / (1024 * 1024)) +
-                " MiB, too large for an SMBIOS table";
-        return false;
-    }
-    bytes = std::move(content);
-    return true;
-}
-
 bool parseSmbiosVersion(std::string const& text, uint8_t& major, uint8_t& minor) {
     size_t const dot = text.find('.');
     if (dot == std::string::npos) {

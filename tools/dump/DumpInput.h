@@ -14,6 +14,8 @@
 #include <string>
 #include <vector>
 
+#include "ToolSupport.h"
+
 namespace smbiosdump {
 
 // What goes into an override dump file.
@@ -24,14 +26,9 @@ struct Capture {
     uint8_t minor = 0;
 };
 
-// The largest input file the readers accept: a --dump-bin image or a raw
-// table is at most some tens of kilobytes, so anything this size is the
-// wrong file.
-constexpr size_t MAX_INPUT_FILE_SIZE = 16u * 1024u * 1024u;
-
-// Reads the whole file into `bytes`, up to MAX_INPUT_FILE_SIZE. Returns
-// false and the reason in `error` (without the file's name).
-bool readInputFile(std::string const& path, std::vector<uint8_t>& bytes, std::string& error);
+// The whole input file, up to the tools' common limit.
+using smbiostool::MAX_INPUT_FILE_SIZE;
+using smbiostool::readInputFile;
 
 // Parses "MAJ.MIN" (each a decimal number 0-255).
 bool parseSmbiosVersion(std::string const& text, uint8_t& major, uint8_t& minor);
