@@ -1,8 +1,12 @@
 # Front door of the build. Every target drives CMake in a build folder of its
 # own, so the plain, sanitizer and 32-bit builds never mix.
 #
+# Each target first makes sure the Debian packages it needs are there
+# (tools/ensure-packages installs the missing ones, or says how).
+#
 #   make              build (build/)
-#   make demo         run the host program on the example dump
+#   make demo         build the host program, the plug-in and libpmem only, and
+#                     run the host on the example dump
 #   make test         build and run every test for this machine's architecture
 #   make check        the tests again under ASan+UBSan (clang), as a 32-bit x86 build, and
 #                     the plug-in's thread tests under ThreadSanitizer (clang)
@@ -30,13 +34,21 @@ EXAMPLE := examples/demo-server.smbios.txt
 
 all: build
 
-$(BUILD)/CMakeCache.txt:
+# packages-GOAL: the Debian packages of that goal (see tools/ensure-packages).
+packages-%:
+	@sh tools/ensure-packages $*
+
+$(BUILD)/CMakeCache.txt: | packages-build
 	$(CMAKE) -S . -B $(BUILD) $(GENERATOR) -DCMAKE_BUILD_TYPE=RelWithDebInfo
 
-build: $(BUILD)/CMakeCache.txt
+build: packages-build $(BUILD)/CMakeCache.txt
 	$(CMAKE) --build $(BUILD) -j $(JOBS)
 
-demo: build
+# What the demo runs, and nothing else: no test or benchmark is compiled.
+DEMO_TARGETS := smbios-inventory smbiosmi pmem
+
+demo: packages-build $(BUILD)/CMakeCache.txt
+	$(CMAKE) --build $(BUILD) -j $(JOBS) --target $(DEMO_TARGETS)
 	$(BUILD)/out/smbios-inventory --dump $(EXAMPLE) --sensors processor --sensors disk --bmc
 
 test: build
@@ -44,20 +56,20 @@ test: build
 
 check: check-asan check-m32 check-tsan
 
-check-asan:
+check-asan: packages-check
 	CC=clang CXX=clang++ $(CMAKE) -S . -B $(ASAN_BUILD) $(GENERATOR) -DCMAKE_BUILD_TYPE=Debug -DSMBIOS_SANITIZE=ON
 	$(CMAKE) --build $(ASAN_BUILD) -j $(JOBS)
 	ASAN_OPTIONS=detect_leaks=1 UBSAN_OPTIONS=print_stacktrace=1:halt_on_error=1 \
 	  $(CTEST) --test-dir $(ASAN_BUILD) --output-on-failure -j $(JOBS)
 
-check-m32:
+check-m32: packages-check
 	$(CMAKE) -S . -B $(M32_BUILD) $(GENERATOR) -DCMAKE_BUILD_TYPE=RelWithDebInfo \
 	  -DCMAKE_C_FLAGS=-m32 -DCMAKE_CXX_FLAGS=-m32 -DSMBIOS_BENCH=OFF
 	$(CMAKE) --build $(M32_BUILD) -j $(JOBS)
 	$(CTEST) --test-dir $(M32_BUILD) --output-on-failure -j $(JOBS)
 
 # ThreadSanitizer: the platform library, the plug-in and its thread tests only.
-check-tsan:
+check-tsan: packages-check
 	CC=clang CXX=clang++ $(CMAKE) -S . -B $(TSAN_BUILD) $(GENERATOR) -DCMAKE_BUILD_TYPE=RelWithDebInfo \
 	  -DSMBIOS_TSAN=ON -DSMBIOS_BENCH=OFF
 	$(CMAKE) --build $(TSAN_BUILD) -j $(JOBS) --target plugin_thread_tests
@@ -67,16 +79,16 @@ check-tsan:
 install: build
 	$(CMAKE) --install $(BUILD) --prefix $(PREFIX)
 
-fuzz:
+fuzz: packages-fuzz
 	CC=clang CXX=clang++ $(CMAKE) -S . -B $(FUZZ_BUILD) $(GENERATOR) -DCMAKE_BUILD_TYPE=RelWithDebInfo \
 	  -DSMBIOS_FUZZ=ON -DSMBIOS_TESTS=OFF -DSMBIOS_BENCH=OFF
 	$(CMAKE) --build $(FUZZ_BUILD) -j $(JOBS)
 	FUZZ_SECONDS=$(FUZZ_SECONDS) fuzz/run-all $(FUZZ_BUILD)/out
 
-bench: build
+bench: packages-bench build
 	$(BUILD)/out/smbios-bench
 
-format:
+format: packages-format
 	find platform smbios mi pmem tools tests bench fuzz examples \
 	  \( -name '*.cpp' -o -name '*.h' \) -print0 | xargs -0 clang-format -i
 
