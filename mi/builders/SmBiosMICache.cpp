@@ -1,5 +1,6 @@
 #include "IC/PropertyValue.h"
 #include "mi/SmBiosMI.h"
+#include "mi/builders/DecodeTable.h"
 
 namespace IC {
 
@@ -23,50 +24,32 @@ unsigned int cacheSize(unsigned int word) {
     return (word & 0x8000) != 0 ? blocks << 6 : blocks;
 }
 
-unsigned char operationalMode(unsigned int mode) {
-    switch (mode) {
-        case 0:  // write through
-            return 2;
-        case 1:  // write back
-            return 1;
-        case 2:  // varies with memory address
-            return 3;
-        default:  // unknown
-            return 0;
-    }
-}
+// What a code that no table row holds becomes.
+unsigned char const kUnknown = 0;
 
-unsigned char systemCacheType(unsigned int type) {
-    switch (type) {
-        case 3:  // instruction
-            return 1;
-        case 4:  // data
-            return 2;
-        case 5:  // unified
-            return 3;
-        default:
-            return 0;
-    }
-}
+// Operational mode (configuration bits 8-9) to the agent's write policy.
+constexpr decode::Row<unsigned char> OPERATIONAL_MODES[] = {
+    {0, 2},  // write through
+    {1, 1},  // write back
+    {2, 3},  // varies with memory address
+};
 
-unsigned char associativity(unsigned int value) {
-    switch (value) {
-        case 3:  // direct mapped
-            return 1;
-        case 4:  // 2-way
-            return 3;
-        case 5:  // 4-way
-            return 4;
-        case 6:  // fully associative
-            return 2;
-        case 7:  // 8-way
-            return 5;
-        case 8:  // 16-way
-            return 6;
-        default:
-            return 0;
-    }
-}
+// System cache type to the agent's cache type.
+constexpr decode::Row<unsigned char> SYSTEM_CACHE_TYPES[] = {
+    {3, 1},  // instruction
+    {4, 2},  // data
+    {5, 3},  // unified
+};
+
+// Associativity to the agent's associativity.
+constexpr decode::Row<unsigned char> ASSOCIATIVITIES[] = {
+    {3, 1},  // direct mapped
+    {4, 3},  // 2-way
+    {5, 4},  // 4-way
+    {6, 2},  // fully associative
+    {7, 5},  // 8-way
+    {8, 6},  // 16-way
+};
 
 }  // namespace
 
@@ -91,7 +74,9 @@ void SmBiosMI::makeCacheNodes(TableLists tables, unsigned int parentNodeId, unsi
             node->setDescription("Processor Cache");
             propString(t, SOCKET, 53, node);
             unsigned int const mode = getEnumValue16(t, CONFIGURATION, 0x0300, 8);
-            node->setProperty(72, PropertyValue(EnumValue(operationalMode(mode)), true));
+            node->setProperty(
+                72,
+                PropertyValue(EnumValue(decode::lookup(OPERATIONAL_MODES, mode, kUnknown)), true));
 
             if (entry.length > 6) {
                 unsigned int const level = (getNumber16(t, CONFIGURATION) & 7) + 1;
@@ -111,9 +96,13 @@ void SmBiosMI::makeCacheNodes(TableLists tables, unsigned int parentNodeId, unsi
             }
 
             node->setProperty(
-                9, PropertyValue(EnumValue(systemCacheType(t->getByte(SYSTEM_CACHE_TYPE))), true));
+                9, PropertyValue(EnumValue(decode::lookup(SYSTEM_CACHE_TYPES,
+                                                          t->getByte(SYSTEM_CACHE_TYPE), kUnknown)),
+                                 true));
             node->setProperty(
-                5, PropertyValue(EnumValue(associativity(t->getByte(ASSOCIATIVITY))), true));
+                5, PropertyValue(EnumValue(decode::lookup(ASSOCIATIVITIES,
+                                                          t->getByte(ASSOCIATIVITY), kUnknown)),
+                                 true));
             unsigned int const speed = getNumber8(t, SPEED);
             if (speed != 0) {
                 node->setProperty(57, PropertyValue(Number(1000.0 / speed), true));

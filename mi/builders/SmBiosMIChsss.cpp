@@ -3,6 +3,7 @@
 
 #include "IC/PropertyValue.h"
 #include "mi/SmBiosMI.h"
+#include "mi/builders/DecodeTable.h"
 #include "mi/builders/SmBiosMICmptr.h"
 
 namespace IC {
@@ -10,6 +11,8 @@ namespace IC {
 namespace {
 QNLog::QNLogger logger("Quillon.IC.MI.SmBiosMI.SmBiosMIChsss");
 
+// Kept: without a System Information structure, the system's maker, model
+// and serial number texts of every chassis are this sentence.
 char const* const NO_SYSTEM_TABLE = "Bios system information table does not exist";
 
 // System Enclosure or Chassis (type 3) fields.
@@ -41,29 +44,25 @@ struct ChassisKind {
     bool mainChassis;
 };
 
+// Kept as they stand: Rack Mount and Blade give package type 0x11,
+// Multi-system 1, Blade Enclosure 0x1C and is no main chassis; the agent's
+// chassis reports depend on these values. The Expansion Chassis row is never
+// used: such a structure is skipped before its node is made.
+constexpr decode::Row<ChassisKind> CHASSIS_KINDS[] = {
+    {0x07, {0x07, 3, "Tower Chassis", true}},
+    {0x11, {0x11, 3, "Main Server Chassis", true}},
+    {0x12, {0x12, 3, "Expansion Chassis", false}},
+    {0x17, {0x11, 3, "Rack Mount Chassis", true}},
+    {0x19, {0x01, 3, "Multi System Chassis", true}},
+    {0x1C, {0x11, 16, "Blade Chassis", true}},
+    {0x1D, {0x1C, 17, "Blade Enclosure Chassis", false}},
+};
+
+// Any other type keeps its own code as the package type (0 for the codes
+// below 0x03 and above 0x1D), a plain enclosure and the name "Chassis".
 ChassisKind chassisKind(unsigned int type) {
-    switch (type) {
-        case 0x07:
-            return {0x07, 3, "Tower Chassis", true};
-        case 0x11:
-            return {0x11, 3, "Main Server Chassis", true};
-        case 0x12:
-            return {0x12, 3, "Expansion Chassis", false};
-        case 0x17:
-            return {0x11, 3, "Rack Mount Chassis", true};
-        case 0x19:
-            return {0x01, 3, "Multi System Chassis", true};
-        case 0x1C:
-            return {0x11, 16, "Blade Chassis", true};
-        case 0x1D:
-            return {0x1C, 17, "Blade Enclosure Chassis", false};
-        default:
-            break;
-    }
-    if (type <= 0x02 || type > 0x1D) {
-        return {0, 3, nullptr, false};
-    }
-    return {type, 3, nullptr, false};
+    ChassisKind const other = {type <= 0x02 || type > 0x1D ? 0u : type, 3, nullptr, false};
+    return decode::lookup(CHASSIS_KINDS, type, other);
 }
 
 // Baseboard types that make a chassis the planar's home when it contains

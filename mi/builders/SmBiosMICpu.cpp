@@ -1,5 +1,6 @@
 #include "IC/PropertyValue.h"
 #include "mi/SmBiosMI.h"
+#include "mi/builders/DecodeTable.h"
 
 namespace SD {
 
@@ -45,21 +46,13 @@ unsigned char const CHARACTERISTICS = 0x26;
 unsigned int const STATUS_MASK = 0x47;
 unsigned int const POPULATED_AND_ENABLED = 0x41;
 
-// The node status of a processor from its CPU status bits.
-unsigned int processorStatus(unsigned int cpuStatus) {
-    switch (cpuStatus) {
-        case 1:
-            return 1;
-        case 2:
-            return 16;
-        case 3:
-            return 24;
-        case 4:
-            return 7;
-        default:
-            return 0;
-    }
-}
+// The node status of a processor from its CPU status bits (0 for the rest).
+constexpr decode::Row<unsigned int> PROCESSOR_STATUSES[] = {
+    {1, 1},   // enabled
+    {2, 16},  // disabled by the user
+    {3, 24},  // disabled by the firmware (POST error)
+    {4, 7},   // idle, waiting to be enabled
+};
 
 std::vector<Number> numbers(std::initializer_list<unsigned int> values) {
     std::vector<Number> list;
@@ -95,8 +88,10 @@ void SmBiosMI::makeCpuNodes(TableLists tables, unsigned int parentNodeId) {
             MutableNode* node = newNode(parentNodeId, 4, cpuIndex);
             ++cpuIndex;
             unsigned int const nodeId = node->getNodeId();
-            node->setStatus(processorStatus(status & 0x07));
+            node->setStatus(decode::lookup(PROCESSOR_STATUSES, status & 0x07, 0u));
             node->setProperty(125, PropertyValue(numbers({0, 1, 16, 24, 7}), true));
+            // Kept: the description counts from 1 ("CPU 1") while the index
+            // counts from 0; the agent shows the description to people.
             node->setDescription("CPU " + std::to_string(cpuIndex));
 
             propString(t, SOCKET, 53, node);
@@ -145,16 +140,17 @@ void SmBiosMI::makeCpuNodes(TableLists tables, unsigned int parentNodeId) {
 
             // Every core carries the whole processor's thread count.
             for (unsigned int c = 0; c < cores; ++c) {
-                MutableNode* core = new MutableNode(takeNodeId(), nodeId, miIdList, 42, c);
+                MutableNode* core = newNode(nodeId, 42, c);
                 core->setDescription("CPU Core Information");
                 core->setStatus(c < enabled ? 1 : 16);
                 core->setProperty(125, PropertyValue(numbers({1, 16}), true));
                 core->setProperty(128,
                                   PropertyValue(EnumValue(static_cast<unsigned char>(0)), true));
                 if (threads != 0) {
+                    // Kept: every core carries the whole processor's thread
+                    // count, as the agent's reports expect.
                     core->setProperty(87, PropertyValue(Number(threads), true));
                 }
-                addNode(core);
             }
         }
         SMBIOSMI_CATCH_STRUCTURE(logger, 4, k)

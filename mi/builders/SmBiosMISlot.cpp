@@ -1,3 +1,4 @@
+#include <iterator>
 #include <map>
 
 #include "IC/PropertyValue.h"
@@ -14,7 +15,7 @@ unsigned char const SLOT_TYPE = 0x05;
 unsigned char const SLOT_ID = 0x09;
 
 // SMBIOS slot type to the agent's slot type.
-std::pair<unsigned int, unsigned int> const SLOT_TYPES[] = {
+constexpr std::pair<unsigned int, unsigned int> SLOT_TYPES[] = {
     {0x01, 1},  {0x02, 0},  {0x03, 1},  {0x04, 1},  {0x05, 1},  {0x06, 16}, {0x07, 1},
     {0x08, 1},  {0x09, 1},  {0x0A, 7},  {0x0B, 7},  {0x0C, 7},  {0x0D, 1},  {0x0E, 16},
     {0x0F, 1},  {0x10, 1},  {0x11, 1},  {0x12, 17}, {0x13, 1},  {0xA0, 1},  {0xA1, 1},
@@ -23,12 +24,9 @@ std::pair<unsigned int, unsigned int> const SLOT_TYPES[] = {
     {0xB0, 23}, {0xB1, 18}, {0xB2, 19}, {0xB3, 20}, {0xB4, 21}, {0xB5, 22}, {0xB6, 23},
 };
 
+// Filled once at load time, in table order; the codes are unique.
 std::map<unsigned int, unsigned int> makeSlotMap() {
-    std::map<unsigned int, unsigned int> map;
-    for (auto const& pair : SLOT_TYPES) {
-        map.insert(pair);
-    }
-    return map;
+    return std::map<unsigned int, unsigned int>(std::begin(SLOT_TYPES), std::end(SLOT_TYPES));
 }
 
 }  // namespace
@@ -40,12 +38,8 @@ std::map<unsigned int, unsigned int> const slotMap = makeSlotMap();
 // The agent's slot type of an SMBIOS slot type; 1 (other) for a type the map
 // does not hold.
 unsigned int SmBiosMI::getCIMSlotType(unsigned int smbiosSlotType) {
-    for (auto const& entry : SMBIOS_MI_SLOT::slotMap) {
-        if (entry.first == smbiosSlotType) {
-            return entry.second;
-        }
-    }
-    return 1;
+    auto const entry = SMBIOS_MI_SLOT::slotMap.find(smbiosSlotType);
+    return entry != SMBIOS_MI_SLOT::slotMap.end() ? entry->second : 1;
 }
 
 // One node per System Slots structure, under the planar.
