@@ -28,10 +28,12 @@ unsigned char const MANUFACTURER = 0x17;
 unsigned char const SERIAL = 0x18;
 unsigned char const PART_NUMBER = 0x1A;
 
-// Form factor byte to property 85 (bytes above 0x0F give 0).
+// Form factor byte to property 85 (bytes above 0x0F give 0). Kept with its
+// irregular rows (Row of chips gives 1), as the agent's reports expect.
 unsigned char const FORM_FACTORS[] = {0, 1, 0, 7, 2, 1, 3, 4, 6, 8, 9, 1, 11, 12, 13, 1};
 
-// Memory type byte to property 295 (bytes above 0x19 give 1).
+// Memory type byte to property 295 (bytes above 0x19 give 1). Kept with its
+// irregular rows (EPROM gives what DRAM gives, FB-DIMM gives 1).
 unsigned char const MEMORY_TYPES[] = {1,  1, 0,  2,  6,  7,  8,  9,  10, 11, 12, 13, 2,
                                       15, 1, 17, 18, 19, 20, 21, 23, 1,  1,  1,  24, 25};
 
@@ -77,6 +79,8 @@ void SmBiosMI::makeDimmNodes(TableLists tables, unsigned int parentNodeId) {
                     node->setProperty(37, PropertyValue(Number(capacity), true));
                 }
             }
+            // Kept: property 301 comes from the error-information handle at
+            // 0x0B, not the device count at 0x0D; the agent's reports use it so.
             propNumber16(t, ARRAY_ERROR_HANDLE, 301, node);
             SMBIOS_DETAIL(logger, "Table 16 length = " << entry.length);
         }

@@ -30,6 +30,9 @@ void SmBiosMI::makeDiskControllerNodes(TableLists tables, unsigned int parentId)
             TableData& entry = (*tables[11])[k];
             SD::SmBios::Table const* t = entry.table;
             unsigned int const count = getNumber8(t, OEM_COUNT);
+            // Kept: every structure uses up a node id before its strings are
+            // looked at, so one without the IDE string leaves a gap in the ids;
+            // the agent's stored trees carry these ids.
             unsigned int const nodeId = takeNodeId();
             if (count == 0) {
                 continue;
@@ -41,6 +44,7 @@ void SmBiosMI::makeDiskControllerNodes(TableLists tables, unsigned int parentId)
                 if (!enabled && text != IDE_DISABLED) {
                     continue;
                 }
+                // Kept: the index is always 1.
                 MutableNode* node = addNode(new MutableNode(nodeId, parentId, miIdList, 50, 1));
                 entry.node = node;
                 node->setProperty(

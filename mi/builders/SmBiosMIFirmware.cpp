@@ -77,8 +77,8 @@ void SmBiosMI::parseFirmwareOemString(std::string const& s, MutableNode* node) {
     size_t const p = s.find('[');
     size_t const q = s.find(']');
     std::string inner = s.substr(p + 1, q - p - 1);
-    // The dash is looked for before trimming and its position applied to
-    // the trimmed text.
+    // Kept: the dash is looked for before trimming and its position applied
+    // to the trimmed text; the firmware names the agent shows come out so.
     size_t const d = inner.find('-');
     inner = trimstr(inner);
     if (d != std::string::npos) {
@@ -138,8 +138,7 @@ void SmBiosMI::makeFirmwareNodes(TableLists tables, unsigned int parentId) {
                     continue;
                 }
                 std::string const name = diagnostics ? "Diagnostics" : "OTL";
-                MutableNode* node =
-                    addNode(new MutableNode(takeNodeId(), parentId, miIdList, 3, ordinal++));
+                MutableNode* node = newNode(parentId, 3, ordinal++);
                 entry.node = node;
                 node->setDescription(name);
                 node->setProperty(108, PropertyValue(name, true));
@@ -149,6 +148,8 @@ void SmBiosMI::makeFirmwareNodes(TableLists tables, unsigned int parentId) {
                 makeLogNodes(tables, node->getNodeId());
             }
         }
+        // Kept: the failure messages of this phase name table 0 and the
+        // firmware ordinal minus one, as log searches expect.
         SMBIOSMI_CATCH_STRUCTURE(logger, 0, ordinal - 1)
     }
 
@@ -158,8 +159,7 @@ void SmBiosMI::makeFirmwareNodes(TableLists tables, unsigned int parentId) {
             TableData& entry = (*tables[0])[k];
             SD::SmBios::Table const* t = entry.table;
             SMBIOS_DETAIL(logger, "Table " << 0 << " length = " << entry.length);
-            MutableNode* node =
-                addNode(new MutableNode(takeNodeId(), parentId, miIdList, 3, ordinal++));
+            MutableNode* node = newNode(parentId, 3, ordinal++);
             entry.node = node;
             node->setStatus(1);
             node->setDescription(baseName);
@@ -192,6 +192,8 @@ void SmBiosMI::makeFirmwareNodes(TableLists tables, unsigned int parentId) {
                 node->setProperty(
                     175,
                     PropertyValue(Number(Version2(smbiosMajorVersion, smbiosMinorVersion)), true));
+                // Kept: the BIOS node's 104 and 107 carry the SMBIOS version,
+                // unlike the OEM-string images'; the agent's reports expect it.
                 node->setProperty(104, PropertyValue(Number(smbiosMajorVersion), true));
                 node->setProperty(107, PropertyValue(Number(smbiosMinorVersion), true));
             }

@@ -14,6 +14,8 @@ unsigned char const MAXIMUM = 0x06;
 unsigned char const MINIMUM = 0x08;
 unsigned char const OEM_DEFINED = 0x10;
 unsigned char const NOMINAL = 0x14;
+// Kept: the nominal value's "unknown" is tested against 0x800, not 0x8000 as
+// for the limits; the agent's sensor history was recorded with this test.
 unsigned int const NOMINAL_UNKNOWN = 0x800;
 unsigned int const LIMIT_UNKNOWN = 0x8000;
 
@@ -23,7 +25,8 @@ SmBiosMI::ProbeKind const SmBiosMI::temperatureProbe = {28, 22, 10.0,
                                                         "Temperature in 0.1 degrees="};
 
 // One sensor node per probe at the given location, under the given parent.
-// The readings are unsigned words scaled by the probe's divisor.
+// The readings are unsigned words scaled by the probe's divisor (kept: a
+// negative temperature, a two's-complement word, becomes a large value).
 void SmBiosMI::makeProbeNodes(TableLists tables, unsigned int parentId, unsigned int location,
                               ProbeKind const& kind, QNLog::QNLogger const& probeLogger) {
     std::vector<TableData>& probes = *tables[kind.smbiosType];
@@ -38,6 +41,9 @@ void SmBiosMI::makeProbeNodes(TableLists tables, unsigned int parentId, unsigned
             }
             MutableNode* node = newNode(parentId, kind.nodeType, static_cast<unsigned int>(k));
             entry.node = node;
+            // Kept as it stands: critical and non-recoverable run on into the
+            // cases below them, so their final status is 0; the agent's
+            // alerting was tuned on these statuses.
             switch ((locationAndStatus & 0xE0) >> 5) {
                 case 3:  // OK
                     node->setStatus(1);
@@ -82,6 +88,8 @@ void SmBiosMI::makeProbeNodes(TableLists tables, unsigned int parentId, unsigned
 // Temperature sensor nodes for the temperature probes at a location.
 void SmBiosMI::makeTemperatureSensorNodes(TableLists tables, unsigned int parentId,
                                           unsigned int location) {
+    // The entry and exit texts are composed of three parts, as every
+    // builder's are; kept so that log searches find them the same way.
     SMBIOS_DETAIL(logger, "make"
                               << "TemperatureSensor"
                               << "Nodes entry");
