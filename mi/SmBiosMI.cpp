@@ -147,9 +147,10 @@ bool SmBiosMI::makeRequestedNodes(unsigned int parentId, unsigned int const* loc
 
 // Readers and writers. Offsets are checked against the formatted-area
 // length on plain integers, so an offset near 255 fails rather than wraps.
-// The 16-bit readers check only the offset itself, the 16-bit writers the
-// whole word; the wide boolean writers check the whole field but test only
-// the byte at the offset.
+// Kept: the 16-bit readers check only the offset itself, the 16-bit writers
+// the whole word; the wide boolean writers check the whole field but test
+// only the byte at the offset. A word straddling the end of the formatted
+// area is therefore read (and bounded by Table::getWord) but never written.
 
 #define SMBIOSMI_FAIL(text, off, length) \
     SMBIOS_DETAIL(logger, text << static_cast<unsigned int>(off) << " length=" << (length))
@@ -362,7 +363,8 @@ void SmBiosMI::propBuffer(SD::SmBios::Table const* t, unsigned char off, unsigne
                           unsigned int id, MutableNode* node) {
     unsigned int const length = t->getLength();
     if (static_cast<unsigned int>(off) + count <= length) {
-        // Stored backwards: a little-endian field becomes its big-endian bytes.
+        // Stored backwards, deliberately unlike getBuffer: a little-endian
+        // field becomes its big-endian bytes, which the agent shows as is.
         std::vector<unsigned char> bytes;
         for (unsigned int i = count; i-- > 0;) {
             bytes.push_back(t->getByte(static_cast<unsigned char>(off + i)));

@@ -98,6 +98,9 @@ SmBios::Table::Table(unsigned char const* bytes, size_t size) {
 
 SmBios::Table::~Table() = default;
 
+// Kept: a byte is bounded by the whole structure, strings included, a word
+// by the formatted area only; the builders' reads of the last fields rely on
+// the difference.
 unsigned char SmBios::Table::getByte(unsigned char off) const {
     if (off >= data_.size()) {
         throw std::out_of_range("");
@@ -240,6 +243,8 @@ SmBios::~SmBios() { SMBIOS_DETAIL(loggerSmBios, "Destructor  entry-exit"); }
 
 SmBios::Table& SmBios::operator[](unsigned char pos) { return tables_[pos]; }
 
+// Kept: the result is the count of tables from the first match on, not its
+// position; the frame groups tables itself and never indexes with it.
 unsigned char SmBios::find(unsigned char type) {
     unsigned int const shown = type;
     SMBIOS_DETAIL(loggerSmBios, "find " << shown << " entry");

@@ -33,7 +33,8 @@ unsigned int const DMI_TABLE_ADDRESS = 0x08;
 unsigned int const DMI_BCD_REVISION = 0x0E;
 
 // Physical-memory search areas: the "_SM_" anchor in the BIOS area, the
-// legacy "_DMI_" anchor anywhere in the first megabyte.
+// legacy "_DMI_" anchor anywhere in the first megabyte (kept wider than the
+// BIOS area: old firmware that places it lower is still found).
 unsigned long const SM_SEARCH_START = 0xF0000;
 unsigned long const DMI_SEARCH_START = 0x0;
 unsigned long const SEARCH_END = 0xFFFFF;
@@ -101,7 +102,9 @@ void SmBiosInitializer::takeTables(std::vector<unsigned char> const& raw) {
 }
 
 // The override file was read: its header and table section decide alone;
-// a failure leaves the table empty and the machine's memory is not tried.
+// a failure leaves the table empty and the machine's memory is not tried
+// (kept: an installed override that is broken must not silently give way to
+// the machine's own table).
 void SmBiosInitializer::acquireFromFile(std::string const&, std::vector<std::string> const& head,
                                         std::vector<std::string>& tableTokens) {
     std::vector<unsigned char> header;
@@ -405,6 +408,8 @@ int readTables(std::vector<unsigned char>& bytes, std::vector<std::string> const
         SMBIOS_WARNING(loggerSmBiosInitializer,
                        "readTables() terminating </SHOWSMBIOS> was not found " << 55);
     }
+    // Kept: an unterminated size block and a bad digit end with 55 too, the
+    // one code the acquisition tests for.
     int const result = endSeen ? 0 : 55;
     SMBIOS_DETAIL(loggerSmBiosInitializer, "readTables() exit" << result);
     return result;
