@@ -1,5 +1,7 @@
 // Physical memory through the kernel's memory device (/dev/mem), read-only:
-// it is opened with O_RDONLY, read with pread, never mapped or written.
+// it is opened with O_RDONLY (without waiting, and only when it is a
+// character device or a regular file), read with pread, never mapped or
+// written.
 #pragma once
 
 #include <string>
@@ -17,10 +19,11 @@ public:
     DevMem& operator=(DevMem const&) = delete;
 
     // Whether the device can be opened for reading now (opened and closed
-    // again at once).
+    // again at once). Only a character device or a regular file can.
     static bool canOpen(std::string const& path);
 
-    // Opens the device (once; opening it again keeps it open).
+    // Opens the device (once; opening it again keeps it open); false for
+    // anything but a character device or a regular file.
     bool open() override;
     // Closes the device; true also when it was not open.
     bool close() override;

@@ -8,6 +8,9 @@
 //   devmem  the kernel's memory device, PMEM_DEVMEM_FILE (default /dev/mem)
 // PMEM_SOURCE=image|sysfs|devmem takes that source or none; without it the
 // first usable one in that order serves (image only when PMEM_IMAGE is set).
+// Every file is opened without waiting, and only when it is a regular file
+// (or, for devmem, a character device): a FIFO, socket, folder or other
+// device makes its source unusable, as an unreadable file does.
 // The library prints nothing: failures are results.
 #include <climits>
 #include <cstdlib>

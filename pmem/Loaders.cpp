@@ -1,6 +1,5 @@
 #include "Loaders.h"
 
-#include <fcntl.h>
 #include <unistd.h>
 
 #include <algorithm>
@@ -11,6 +10,7 @@
 #include <utility>
 
 #include "DumpFormat.h"
+#include "SD/RegularFile.h"
 
 namespace pmem {
 
@@ -129,7 +129,12 @@ bool placeEntryPointAndTable(RegionMemory& memory, std::vector<unsigned char> co
 }  // namespace
 
 bool readWholeFile(std::string const& path, size_t limit, std::vector<unsigned char>& bytes) {
-    int const fd = ::open(path.c_str(), O_RDONLY | O_CLOEXEC);
+    // Only a regular file is read: a FIFO would make the load of the library
+    // wait for a writer, a device would be read to its limit. Whatever the
+    // file is, the library has nowhere to say why its source is unusable, so
+    // the reason is not kept.
+    std::string why;
+    int const fd = SD::openRegularFile(path.c_str(), why);
     if (fd < 0) {
         return false;
     }

@@ -20,7 +20,9 @@ constexpr unsigned long kBiosAreaSize = 0x10000;
 // names: right above the first megabyte.
 constexpr unsigned long kMovedTableAddress = 0x100000;
 
-// The whole file, when it can be read and holds at most `limit` bytes.
+// The whole file, when it is a regular file (anything else is refused
+// without being opened, or waited for), can be read and holds at most
+// `limit` bytes.
 bool readWholeFile(std::string const& path, size_t limit, std::vector<unsigned char>& bytes);
 
 // Places the files of "FILE@BASE[,FILE@BASE...]" (BASE hexadecimal, with or

@@ -8,6 +8,7 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <functional>
 #include <memory>
 #include <string>
 #include <utility>
@@ -32,6 +33,8 @@ public:
     PMemLibrary(PMemLibrary const&) = delete;
     PMemLibrary& operator=(PMemLibrary const&) = delete;
 
+    // Whether the library was loaded and its five functions bound.
+    bool loaded() const { return isInitialized_ != nullptr; }
     int isInitialized() const;
     int open() const;
     int close() const;
@@ -54,6 +57,28 @@ private:
 // `expected`.
 ::testing::AssertionResult readsBytes(PMemLibrary const& pm, unsigned long address,
                                       std::vector<uint8_t> const& expected);
+
+// What runInChild returns when the child did not exit by itself.
+constexpr int kChildHung = -1;    // still running when its time was up: killed
+constexpr int kChildFailed = -2;  // not started, or ended by a signal
+// The time a child gets: far more than loading the library ever takes, so
+// that only a child that waits for something that never comes runs out.
+constexpr unsigned kChildSeconds = 10;
+
+// Runs body in a child process (which has this process's environment and
+// sees the files made so far) and returns its result as the child's exit
+// status (0-255), or kChildHung or kChildFailed. The guard of the tests
+// that, should the library regress, would wait forever (a FIFO opened for
+// reading waits for a writer): the child is killed instead.
+int runInChild(std::function<int()> const& body, unsigned seconds = kChildSeconds);
+
+// What isInitializedInChild returns when the library could not be loaded.
+constexpr int kNotLoaded = 3;
+
+// PMemIsInitialized (1 or 0) of the library loaded afresh in a child
+// process with this process's environment; kNotLoaded, kChildHung or
+// kChildFailed otherwise.
+int isInitializedInChild();
 
 // Every test starts with no PMEM_SOURCE and no PMEM_IMAGE, an empty folder
 // as the sysfs folder and a memory device that does not exist, so that this
