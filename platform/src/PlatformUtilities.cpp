@@ -3,11 +3,14 @@
 
 #include <dlfcn.h>
 #include <sys/types.h>
+#include <unistd.h>
 
 #include <cerrno>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
+
+#include "SD/RegularFile.h"
 
 namespace SD {
 
@@ -83,9 +86,21 @@ int PlatformUtilities::openFile(char const* path, _FileHandle** file, int /*mode
     if (path == nullptr) {
         return EINVAL;
     }
-    std::FILE* stream = std::fopen(path, "r");
+    // Only a regular file is opened, and never by waiting: a FIFO would
+    // hold the caller until some writer came, a device may do anything on
+    // open. The opener leaves errno alone when it refuses a file for its
+    // kind, and sets it when the system refused the file.
+    errno = 0;
+    std::string why;
+    int const fd = openRegularFile(path, why);
+    if (fd < 0) {
+        return errno != 0 ? errno : EINVAL;
+    }
+    std::FILE* stream = ::fdopen(fd, "r");
     if (stream == nullptr) {
-        return errno != 0 ? errno : EIO;
+        int const error = errno != 0 ? errno : EIO;
+        ::close(fd);
+        return error;
     }
     *file = new _FileHandle;
     (*file)->stream = stream;

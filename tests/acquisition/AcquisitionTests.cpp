@@ -4,9 +4,14 @@
 // runs in a process of its own, because the table is acquired once per
 // process.
 #include <dlfcn.h>
+#include <fcntl.h>
 #include <gtest/gtest.h>
+#include <sys/stat.h>
+#include <unistd.h>
 
 #include <algorithm>
+#include <chrono>
+#include <future>
 #include <string>
 #include <thread>
 #include <vector>
@@ -120,6 +125,26 @@ std::vector<unsigned int> typesOf(SD::SmBios const& smbios) {
         types.push_back(t.getType());
     }
     return types;
+}
+
+// Acquires the table on a thread of its own. When the acquisition has not
+// ended within 10 s it is taken to wait on the FIFO `fifo` for a writer: one
+// opens the FIFO and goes at once (again every 100 ms until the acquisition
+// ends), which releases the reader, and `waited` is set, so that the test
+// fails instead of hanging.
+SD::SmBios acquireReleasingFifo(std::string const& fifo, bool& waited) {
+    std::future<SD::SmBios> acquiring = std::async(std::launch::async, [] { return SD::SmBios(); });
+    waited = false;
+    std::chrono::milliseconds patience(10000);
+    while (acquiring.wait_for(patience) != std::future_status::ready) {
+        waited = true;
+        patience = std::chrono::milliseconds(100);
+        int const writer = open(fifo.c_str(), O_WRONLY | O_NONBLOCK | O_CLOEXEC);
+        if (writer >= 0) {
+            close(writer);
+        }
+    }
+    return acquiring.get();
 }
 
 // Each test starts with no acquisition made in its process, an empty data
@@ -673,6 +698,46 @@ TEST_F(Acquisition, MissingOverrideFileFallsBackToMemory) {
     EXPECT_EQ(smbios.getTables().size(), 5u);
     EXPECT_EQ(fake.opens(), 1);
     EXPECT_TRUE(log.contains("importSmBios() file not found, using machine SMBios")) << log.dump();
+}
+
+TEST_F(Acquisition, OverrideFileThatIsAFifoFallsBackToMemoryWithoutWaiting) {
+    std::vector<uint8_t> const table = sampleTable();
+    std::string const folder = dataDir_.path() + "/SmBiosOverride";
+    std::string const fifo = folder + "/smbios.txt";
+    ASSERT_EQ(mkdir(folder.c_str(), 0755), 0);
+    ASSERT_EQ(mkfifo(fifo.c_str(), 0600), 0);
+    FakePMem fake(kFakeFull);
+    fake.map(0xF0000, biosAreaWith(smEntryPoint(table, 2, 7), kSmAnchor));
+    fake.map(kTableAddress, table);
+    useCodeDir(kFakeFull);
+    LogCapture log;
+    bool waited = false;
+    SD::SmBios const smbios = acquireReleasingFifo(fifo, waited);
+    EXPECT_FALSE(waited) << "the acquisition waited for a writer on the override FIFO";
+    EXPECT_TRUE(log.contains("importSmBios() file not found, using machine SMBios")) << log.dump();
+    EXPECT_EQ(smbios.getMinorVersion(), 7);
+    EXPECT_EQ(smbios.getTables().size(), 5u);
+    EXPECT_EQ(fake.opens(), 1);
+    struct stat info;
+    ASSERT_EQ(lstat(fifo.c_str(), &info), 0);
+    EXPECT_TRUE(S_ISFIFO(info.st_mode)) << "the override FIFO was replaced";
+}
+
+TEST_F(Acquisition, OverrideFileThatIsAFolderFallsBackToMemory) {
+    std::vector<uint8_t> const table = sampleTable();
+    std::string const folder = dataDir_.path() + "/SmBiosOverride";
+    ASSERT_EQ(mkdir(folder.c_str(), 0755), 0);
+    ASSERT_EQ(mkdir((folder + "/smbios.txt").c_str(), 0755), 0);
+    FakePMem fake(kFakeFull);
+    fake.map(0xF0000, biosAreaWith(smEntryPoint(table, 2, 6), kSmAnchor));
+    fake.map(kTableAddress, table);
+    useCodeDir(kFakeFull);
+    LogCapture log;
+    SD::SmBios smbios;
+    EXPECT_TRUE(log.contains("importSmBios() file not found, using machine SMBios")) << log.dump();
+    EXPECT_EQ(smbios.getMinorVersion(), 6);
+    EXPECT_EQ(smbios.getTables().size(), 5u);
+    EXPECT_EQ(fake.opens(), 1);
 }
 
 TEST_F(Acquisition, InitializerDestructorLogsItsLine) {

@@ -1,10 +1,14 @@
 // SD::PlatformUtilities: the agent's folders, line reading and UUID text.
+#include <fcntl.h>
 #include <gtest/gtest.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
 #include <cerrno>
+#include <chrono>
 #include <climits>
 #include <cstdlib>
+#include <future>
 #include <vector>
 
 #include "PlatformTestHelpers.h"
@@ -112,6 +116,67 @@ TEST(PlatformUtilities, OpenMissingFileReportsErrno) {
     _FileHandle* file = reinterpret_cast<_FileHandle*>(&scratch);
     EXPECT_EQ(ENOENT, PlatformUtilities::openFile(missing.c_str(), &file, 0, 0));
     EXPECT_EQ(nullptr, file);
+}
+
+TEST(PlatformUtilities, OpenFifoIsRefusedWithoutWaitingForAWriter) {
+    smbiostest::TempDir scratch;
+    std::string const fifo = scratch.file("smbios.txt");
+    ASSERT_EQ(0, mkfifo(fifo.c_str(), 0600));
+    _FileHandle* file = reinterpret_cast<_FileHandle*>(&scratch);
+    std::future<int> opening = std::async(std::launch::async, [&fifo, &file] {
+        return PlatformUtilities::openFile(fifo.c_str(), &file, 0, 0);
+    });
+    // An open that waits for a writer is released by one coming and going,
+    // so that the test fails instead of hanging.
+    bool waited = false;
+    std::chrono::milliseconds patience(10000);
+    while (opening.wait_for(patience) != std::future_status::ready) {
+        waited = true;
+        patience = std::chrono::milliseconds(100);
+        int const writer = open(fifo.c_str(), O_WRONLY | O_NONBLOCK | O_CLOEXEC);
+        if (writer >= 0) {
+            close(writer);
+        }
+    }
+    int const result = opening.get();
+    EXPECT_FALSE(waited) << "openFile waited for a writer on the FIFO";
+    EXPECT_EQ(EINVAL, result);
+    EXPECT_EQ(nullptr, file);
+    if (result == 0 && file != nullptr) {
+        PlatformUtilities::closeFile(&file);
+    }
+}
+
+TEST(PlatformUtilities, OpenFolderIsRefused) {
+    smbiostest::TempDir scratch;
+    _FileHandle* file = reinterpret_cast<_FileHandle*>(&scratch);
+    int const result = PlatformUtilities::openFile(scratch.path().c_str(), &file, 0, 0);
+    EXPECT_EQ(EINVAL, result);
+    EXPECT_EQ(nullptr, file);
+    if (result == 0 && file != nullptr) {
+        PlatformUtilities::closeFile(&file);
+    }
+}
+
+TEST(PlatformUtilities, OpenCharacterDeviceIsRefused) {
+    struct stat info;
+    if (stat("/dev/null", &info) != 0 || !S_ISCHR(info.st_mode)) {
+        GTEST_SKIP() << "this system has no /dev/null character device";
+    }
+    _FileHandle* file = nullptr;
+    int const result = PlatformUtilities::openFile("/dev/null", &file, 0, 0);
+    EXPECT_EQ(EINVAL, result);
+    EXPECT_EQ(nullptr, file);
+    if (result == 0 && file != nullptr) {
+        PlatformUtilities::closeFile(&file);
+    }
+}
+
+TEST(PlatformUtilities, OpenSymbolicLinkToRegularFileReadsTheFile) {
+    smbiostest::TempDir scratch;
+    smbiostest::writeFile(scratch.file("real.txt"), "first\nsecond\n");
+    ASSERT_EQ(0, symlink("real.txt", scratch.file("link.txt").c_str()));
+    EXPECT_EQ((std::vector<std::string>{"first", "second"}), readAll(scratch.file("link.txt")));
 }
 
 TEST(PlatformUtilities, OpenNullPathIsInvalid) {

@@ -19,7 +19,9 @@ public:
     static char getSeparator();
 
     // Opens a file for reading. Returns 0 and sets *file, or an error code
-    // (the system's errno value) and sets *file to null.
+    // (the system's errno value) and sets *file to null. Only a regular file
+    // is opened: anything else (a FIFO, a folder, a device, a socket) gives
+    // EINVAL at once, without being opened or waited for.
     static int openFile(char const* path, _FileHandle** file, int mode, int flags);
     // Returns the next line without its terminator (a carriage return before
     // the line feed is stripped too), allocated with new[]; the caller
