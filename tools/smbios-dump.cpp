@@ -8,6 +8,10 @@
 // physical-memory library libpmem.so. The input is read completely before
 // anything is written, and the file is written all or nothing.
 //
+// Only a missing file, a regular file or a symbolic link is ever replaced
+// (the last two with --force); a folder, FIFO, socket or device in the
+// output's place is refused, --force or not.
+//
 // Exit status: 0 after writing, 1 when the input cannot be read or the file
 // cannot be written (nothing is written then), 2 for a wrong command line.
 
@@ -88,7 +92,9 @@ int run(int argc, char** argv) {
     auto* dataDirOption =
         app.add_option("--data-dir", dataDir, "The agent's data directory for --install")
             ->type_name("DIR");
-    app.add_flag("--force", force, "Replace the output file when it exists");
+    app.add_flag("--force", force,
+                 "Replace the output file when it exists (a regular file or a symbolic link; "
+                 "nothing else is replaced)");
 
     fromBinOption->excludes(fromTableOption)->excludes(fromMachineOption);
     fromTableOption->excludes(fromMachineOption);
@@ -134,13 +140,20 @@ int run(int argc, char** argv) {
     }
 
     // Where the file goes; an existing one is refused before any input is
-    // read, and again (without a race) when it is put in place.
+    // read, and again (without a race) when it is put in place. What is not
+    // a regular file or a symbolic link is never replaced: a device or FIFO
+    // would be swapped for a plain file.
     bool const toStandardOutput = !install && output == "-";
     std::string target = output;
     std::string installDataDir;
     if (install) {
         installDataDir = smbiosdump::dataDirectory(dataDir);
         target = smbiosdump::overridePath(installDataDir);
+    }
+    std::string error;
+    if (!toStandardOutput && !smbiosdump::mayReplace(target, error)) {
+        complain(error);
+        return smbiostool::EXIT_FAILED;
     }
     if (!toStandardOutput && !force && access(target.c_str(), F_OK) == 0) {
         complain(target + " exists; not replaced (use --force to replace it)");
@@ -149,7 +162,6 @@ int run(int argc, char** argv) {
 
     // The whole input, before anything is written.
     smbiosdump::Capture capture;
-    std::string error;
     if (fromBinOption->count() > 0 || fromTableOption->count() > 0) {
         std::string const& path = fromBinOption->count() > 0 ? fromBin : fromTable;
         std::vector<uint8_t> bytes;

@@ -117,16 +117,70 @@ TEST(DumpWrite, ReplacesExistingFileWhenAsked) {
     EXPECT_EQ(dumptest::folderEntries(dir.path()), names({"smbios.txt"}));
 }
 
-TEST(DumpWrite, FailedRenameRemovesTemporaryFile) {
-    // A folder in the file's place cannot be replaced by a file.
+TEST(DumpWrite, FolderInPlaceIsNeverReplaced) {
     TempDir dir;
-    ASSERT_EQ(mkdir(dir.file("smbios.txt").c_str(), 0755), 0);
+    std::string const folder = dir.file("smbios.txt");
+    ASSERT_EQ(mkdir(folder.c_str(), 0755), 0);
+    for (bool replace : {false, true}) {
+        std::string error;
+        EXPECT_EQ(smbiosdump::writeFileAtomically(folder, "new", replace, error),
+                  WriteResult::FAILED);
+        EXPECT_EQ(error, folder + " is a directory, not a regular file; nothing written");
+        EXPECT_EQ(dumptest::folderEntries(dir.path()), names({"smbios.txt"}));
+        EXPECT_TRUE(dumptest::folderEntries(folder).empty());
+    }
+}
+
+TEST(DumpWrite, FifoInPlaceIsNeverReplaced) {
+    TempDir dir;
+    std::string const fifo = dir.file("smbios.txt");
+    ASSERT_TRUE(dumptest::makeFifo(fifo));
+    for (bool replace : {false, true}) {
+        std::string error;
+        WriteResult result = WriteResult::WRITTEN;
+        EXPECT_FALSE(dumptest::waitedOnFifo(fifo, [&] {
+            result = smbiosdump::writeFileAtomically(fifo, "new", replace, error);
+        })) << "the writer waited on the FIFO";
+        EXPECT_EQ(result, WriteResult::FAILED);
+        EXPECT_EQ(error, fifo + " is a FIFO, not a regular file; nothing written");
+        struct stat info;
+        ASSERT_EQ(lstat(fifo.c_str(), &info), 0);
+        EXPECT_TRUE(S_ISFIFO(info.st_mode));
+        EXPECT_EQ(dumptest::folderEntries(dir.path()), names({"smbios.txt"}));
+    }
+}
+
+TEST(DumpWrite, ReplacesSymbolicLinkItselfWhenAsked) {
+    TempDir dir;
+    smbiostest::writeFile(dir.file("real.txt"), "old");
+    ASSERT_EQ(symlink("real.txt", dir.file("smbios.txt").c_str()), 0);
     std::string error;
+    EXPECT_EQ(smbiosdump::writeFileAtomically(dir.file("smbios.txt"), "new", false, error),
+              WriteResult::EXISTS);
     EXPECT_EQ(smbiosdump::writeFileAtomically(dir.file("smbios.txt"), "new", true, error),
-              WriteResult::FAILED);
-    EXPECT_NE(error.find("cannot rename"), std::string::npos) << error;
-    EXPECT_EQ(dumptest::folderEntries(dir.path()), names({"smbios.txt"}));
-    EXPECT_TRUE(dumptest::folderEntries(dir.file("smbios.txt")).empty());
+              WriteResult::WRITTEN)
+        << error;
+    struct stat info;
+    ASSERT_EQ(lstat(dir.file("smbios.txt").c_str(), &info), 0);
+    EXPECT_TRUE(S_ISREG(info.st_mode));
+    EXPECT_EQ(dumptest::readText(dir.file("smbios.txt")), "new");
+    EXPECT_EQ(dumptest::readText(dir.file("real.txt")), "old");
+    EXPECT_EQ(dumptest::folderEntries(dir.path()), names({"real.txt", "smbios.txt"}));
+}
+
+TEST(DumpMayReplace, NothingRegularFileOrLinkOnly) {
+    TempDir dir;
+    std::string error;
+    EXPECT_TRUE(smbiosdump::mayReplace(dir.file("missing"), error));
+    EXPECT_TRUE(smbiosdump::mayReplace(dir.file("missing/smbios.txt"), error));
+    smbiostest::writeFile(dir.file("plain"), "x");
+    EXPECT_TRUE(smbiosdump::mayReplace(dir.file("plain"), error));
+    // A link is replaced itself, whatever it names.
+    ASSERT_EQ(symlink(dir.path().c_str(), dir.file("link").c_str()), 0);
+    EXPECT_TRUE(smbiosdump::mayReplace(dir.file("link"), error));
+    EXPECT_TRUE(error.empty()) << error;
+    EXPECT_FALSE(smbiosdump::mayReplace(dir.path(), error));
+    EXPECT_EQ(error, dir.path() + " is a directory, not a regular file; nothing written");
 }
 
 TEST(DumpWrite, MissingFolderIsAnError) {

@@ -5,6 +5,7 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <functional>
 #include <string>
 #include <vector>
 
@@ -20,6 +21,20 @@ std::string toolPath();
 // Runs the built smbios-dump.
 hosttest::RunResult runDump(std::vector<std::string> const& args,
                             hosttest::Environment const& environment = hosttest::Environment());
+
+// Runs `work` on a thread of its own. Should it still run after 10 s, it is
+// taken to wait on the FIFO `fifo`: the FIFO is then opened from both sides
+// and closed again, every 100 ms until the work ends, which releases a
+// reader waiting for a writer and a writer waiting for a reader. Returns
+// whether that was needed, so that a test fails instead of hanging.
+bool waitedOnFifo(std::string const& fifo, std::function<void()> const& work);
+
+// Makes a FIFO; false when it cannot be made.
+bool makeFifo(std::string const& path);
+
+// The names in `folder` that look like a temporary file of the dump file
+// `name` (".NAME.XXXXXX"), sorted.
+std::vector<std::string> temporaryFilesOf(std::string const& folder, std::string const& name);
 
 // A stand-in physical-memory library: "full" exports the five functions,
 // "nosearch" all but PMemSearch.

@@ -1,8 +1,10 @@
 // The built smbios-dump run as a child process: its command line, its
 // outputs (a file, the install location, standard output), its refusal to
-// replace a file, and its exits on bad input with nothing written.
+// replace a file without --force and anything but a regular file or a
+// symbolic link at all, and its exits on bad input with nothing written.
 #include <gtest/gtest.h>
 #include <sys/stat.h>
+#include <sys/sysmacros.h>
 #include <unistd.h>
 
 #include <string>
@@ -217,20 +219,6 @@ TEST(DumpTool, UnwritableFolderLeavesNoFile) {
     EXPECT_TRUE(dumptest::folderEntries(folder).empty());
 }
 
-TEST(DumpTool, FailedRenameLeavesNoTemporaryFile) {
-    // --force on a folder: the temporary file is written, its rename fails.
-    TableInput input;
-    std::string const target = input.dir.file("smbios.txt");
-    ASSERT_EQ(mkdir(target.c_str(), 0755), 0);
-    RunResult const run =
-        runDump({"--from-table", input.path(), "--version", "2.7", "-o", target, "--force"});
-    EXPECT_EQ(run.exitStatus, 1) << describe(run);
-    EXPECT_NE(run.err.find(target), std::string::npos) << describe(run);
-    EXPECT_EQ(dumptest::folderEntries(input.dir.path()),
-              (std::vector<std::string>{"smbios.txt", "table.bin"}));
-    EXPECT_TRUE(dumptest::folderEntries(target).empty());
-}
-
 TEST(DumpTool, MissingOutputFolderFails) {
     TableInput input;
     std::string const target = input.dir.file("missing/smbios.txt");
@@ -238,6 +226,150 @@ TEST(DumpTool, MissingOutputFolderFails) {
     EXPECT_EQ(run.exitStatus, 1) << describe(run);
     EXPECT_NE(run.err.find(input.dir.file("missing")), std::string::npos) << describe(run);
     EXPECT_EQ(dumptest::folderEntries(input.dir.path()), (std::vector<std::string>{"table.bin"}));
+}
+
+// --- an output place that holds no regular file: never replaced ----------
+
+// The one line smbios-dump says when it refuses to replace `target`, which
+// is `kind` ("a FIFO", ...).
+std::string notRegularLine(std::string const& target, char const* kind) {
+    return "smbios-dump: " + target + " is " + kind + ", not a regular file; nothing written\n";
+}
+
+// The runs of the tool at `target`, without and with --force.
+std::vector<std::vector<std::string>> writesAt(TableInput const& input, std::string const& target) {
+    std::vector<std::string> const args = {"--from-table", input.path(), "--version",
+                                           "2.7",          "-o",         target};
+    std::vector<std::string> forced = args;
+    forced.push_back("--force");
+    return {args, forced};
+}
+
+bool isKind(std::string const& path, mode_t kind) {
+    struct stat info;
+    return lstat(path.c_str(), &info) == 0 && (info.st_mode & S_IFMT) == kind;
+}
+
+TEST(DumpTool, OutputAtFifoIsNeverReplaced) {
+    TableInput input;
+    std::string const fifo = input.dir.file("smbios.txt");
+    ASSERT_TRUE(dumptest::makeFifo(fifo));
+    for (std::vector<std::string> const& args : writesAt(input, fifo)) {
+        SCOPED_TRACE(args.back());
+        RunResult run;
+        bool const waited = dumptest::waitedOnFifo(fifo, [&] { run = runDump(args); });
+        EXPECT_FALSE(waited) << "smbios-dump waited on the FIFO";
+        EXPECT_EQ(run.exitStatus, 1) << describe(run);
+        EXPECT_EQ(run.err, notRegularLine(fifo, "a FIFO")) << describe(run);
+        EXPECT_TRUE(isKind(fifo, S_IFIFO)) << "the FIFO was replaced";
+        EXPECT_EQ(dumptest::folderEntries(input.dir.path()),
+                  (std::vector<std::string>{"smbios.txt", "table.bin"}));
+    }
+}
+
+TEST(DumpTool, InstallOverFifoIsNeverReplaced) {
+    TableInput input;
+    TempDir data;
+    ASSERT_EQ(mkdir(data.file("SmBiosOverride").c_str(), 0755), 0);
+    std::string const fifo = data.file("SmBiosOverride/smbios.txt");
+    ASSERT_TRUE(dumptest::makeFifo(fifo));
+    RunResult run;
+    bool const waited = dumptest::waitedOnFifo(fifo, [&] {
+        run = runDump({"--from-table", input.path(), "--version", "2.7", "--install", "--data-dir",
+                       data.path(), "--force"});
+    });
+    EXPECT_FALSE(waited) << "smbios-dump waited on the FIFO";
+    EXPECT_EQ(run.exitStatus, 1) << describe(run);
+    EXPECT_EQ(run.err, notRegularLine(fifo, "a FIFO")) << describe(run);
+    EXPECT_TRUE(isKind(fifo, S_IFIFO)) << "the FIFO was replaced";
+    EXPECT_EQ(dumptest::folderEntries(data.file("SmBiosOverride")),
+              (std::vector<std::string>{"smbios.txt"}));
+}
+
+TEST(DumpTool, OutputAtFolderIsNeverReplaced) {
+    TableInput input;
+    std::string const folder = input.dir.file("smbios.txt");
+    ASSERT_EQ(mkdir(folder.c_str(), 0755), 0);
+    for (std::vector<std::string> const& args : writesAt(input, folder)) {
+        SCOPED_TRACE(args.back());
+        RunResult const run = runDump(args);
+        EXPECT_EQ(run.exitStatus, 1) << describe(run);
+        EXPECT_EQ(run.err, notRegularLine(folder, "a directory")) << describe(run);
+        EXPECT_TRUE(isKind(folder, S_IFDIR));
+        EXPECT_EQ(dumptest::folderEntries(input.dir.path()),
+                  (std::vector<std::string>{"smbios.txt", "table.bin"}));
+        EXPECT_TRUE(dumptest::folderEntries(folder).empty());
+    }
+}
+
+// A character device to aim at: a node of its own in `dir` (the device of
+// /dev/full) when this process may make one, else /dev/full or /dev/null
+// when this process cannot write into /dev, so that a tool that replaced
+// the device could not harm the system's. "" when there is none.
+std::string characterDevice(TempDir const& dir) {
+    std::string const own = dir.file("full");
+    if (mknod(own.c_str(), S_IFCHR | 0600, makedev(1, 7)) == 0) {
+        return own;
+    }
+    if (access("/dev", W_OK) == 0) {
+        return "";
+    }
+    for (char const* device : {"/dev/full", "/dev/null"}) {
+        if (isKind(device, S_IFCHR)) {
+            return device;
+        }
+    }
+    return "";
+}
+
+TEST(DumpTool, OutputAtCharacterDeviceIsNeverReplaced) {
+    TableInput input;
+    std::string const device = characterDevice(input.dir);
+    if (device.empty()) {
+        GTEST_SKIP() << "no character device to aim at: this process can make no device node "
+                        "and could write into /dev";
+    }
+    struct stat before;
+    ASSERT_EQ(lstat(device.c_str(), &before), 0);
+    std::string const folder = device.substr(0, device.rfind('/'));
+    std::string const name = device.substr(device.rfind('/') + 1);
+    for (std::vector<std::string> const& args : writesAt(input, device)) {
+        SCOPED_TRACE(device + " " + args.back());
+        RunResult const run = runDump(args);
+        EXPECT_EQ(run.exitStatus, 1) << describe(run);
+        EXPECT_EQ(run.err, notRegularLine(device, "a character device")) << describe(run);
+        struct stat after;
+        ASSERT_EQ(lstat(device.c_str(), &after), 0);
+        EXPECT_TRUE(S_ISCHR(after.st_mode)) << "the device node was replaced";
+        EXPECT_EQ(after.st_rdev, before.st_rdev);
+        EXPECT_TRUE(dumptest::temporaryFilesOf(folder, name).empty());
+    }
+}
+
+TEST(DumpTool, OutputAtSymbolicLinkToFileIsReplacedOnlyWithForce) {
+    TableInput input;
+    std::string const real = input.dir.file("real.txt");
+    std::string const link = input.dir.file("smbios.txt");
+    smbiostest::writeFile(real, "keep me\n");
+    ASSERT_EQ(symlink("real.txt", link.c_str()), 0);
+    std::vector<std::vector<std::string>> const runs = writesAt(input, link);
+
+    RunResult const refused = runDump(runs[0]);
+    EXPECT_EQ(refused.exitStatus, 1) << describe(refused);
+    EXPECT_NE(refused.err.find(link + " exists"), std::string::npos) << describe(refused);
+    EXPECT_TRUE(isKind(link, S_IFLNK));
+
+    // The link itself is replaced; the file it named stays as it was.
+    RunResult const forced = runDump(runs[1]);
+    ASSERT_EQ(forced.exitStatus, 0) << describe(forced);
+    EXPECT_EQ(forced.err, wroteLine(link));
+    EXPECT_TRUE(isKind(link, S_IFREG));
+    dumptest::ReadBack const back = dumptest::readBackThroughPlugin(link);
+    ASSERT_TRUE(back.ok());
+    EXPECT_EQ(back.table, dumptest::sampleTable());
+    EXPECT_EQ(dumptest::readText(real), "keep me\n");
+    EXPECT_EQ(dumptest::folderEntries(input.dir.path()),
+              (std::vector<std::string>{"real.txt", "smbios.txt", "table.bin"}));
 }
 
 // --- bad input: exit 1, the file and the reason named, nothing written ---
@@ -263,6 +395,22 @@ TEST(DumpTool, UnreadableInputFails) {
     ASSERT_EQ(mkdir(dir.file("folder").c_str(), 0755), 0);
     expectInputRefused(runDump({"--from-bin", dir.file("folder"), "-o", dir.file("out.txt")}),
                        dir.file("folder"), "a directory, not a regular file", dir, {"folder"});
+}
+
+TEST(DumpTool, FifoInputFailsAtOnce) {
+    TempDir dir;
+    std::string const fifo = dir.file("input.fifo");
+    ASSERT_TRUE(dumptest::makeFifo(fifo));
+    std::vector<std::vector<std::string>> const runs = {
+        {"--from-bin", fifo, "-o", dir.file("out.txt")},
+        {"--from-table", fifo, "--version", "2.7", "-o", dir.file("out.txt")}};
+    for (std::vector<std::string> const& args : runs) {
+        SCOPED_TRACE(args.front());
+        RunResult run;
+        bool const waited = dumptest::waitedOnFifo(fifo, [&] { run = runDump(args); });
+        EXPECT_FALSE(waited) << "smbios-dump waited for a writer on its input";
+        expectInputRefused(run, fifo, "a FIFO, not a regular file", dir, {"input.fifo"});
+    }
 }
 
 TEST(DumpTool, MalformedImageFails) {

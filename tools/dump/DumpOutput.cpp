@@ -10,6 +10,7 @@
 #include <vector>
 
 #include "DumpFormat.h"
+#include "SD/RegularFile.h"
 
 namespace smbiosdump {
 
@@ -152,6 +153,17 @@ bool makeOverrideFolder(std::string const& dataDir, std::string& error) {
     return true;
 }
 
+bool mayReplace(std::string const& path, std::string& error) {
+    struct stat info;
+    // A path that cannot be looked at is left to the write, which says why
+    // it fails.
+    if (lstat(path.c_str(), &info) != 0 || S_ISREG(info.st_mode) || S_ISLNK(info.st_mode)) {
+        return true;
+    }
+    error = path + " is " + SD::fileKind(info.st_mode) + ", not a regular file; nothing written";
+    return false;
+}
+
 WriteResult writeFileAtomically(std::string const& path, std::string const& content, bool replace,
                                 std::string& error) {
     std::string folder;
@@ -159,6 +171,9 @@ WriteResult writeFileAtomically(std::string const& path, std::string const& cont
     splitPath(path, folder, name);
     if (name.empty()) {
         error = path + " names a folder, not a file";
+        return WriteResult::FAILED;
+    }
+    if (!mayReplace(path, error)) {
         return WriteResult::FAILED;
     }
     if (!replace && exists(path)) {
@@ -169,6 +184,10 @@ WriteResult writeFileAtomically(std::string const& path, std::string const& cont
         return WriteResult::FAILED;
     }
     if (replace) {
+        // The rename replaces whatever is there by then: look once more.
+        if (!mayReplace(path, error)) {
+            return WriteResult::FAILED;
+        }
         if (rename(temporary.path().c_str(), path.c_str()) != 0) {
             error =
                 "cannot rename " + temporary.path() + " to " + path + ": " + std::strerror(errno);
