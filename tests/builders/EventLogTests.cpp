@@ -1,6 +1,7 @@
 // makeLogNodes: one system-event-log node per System Event Log structure
 // (type 15) under the given parent, its status from the log area length and
-// the log status bits, and the header fields written to the log.
+// the log status bits, and the header fields written to the log, each read
+// whatever the log thresholds.
 #include <gtest/gtest.h>
 
 #include <cstdint>
@@ -9,7 +10,9 @@
 
 #include "BuilderFixture.h"
 #include "IC/PropertyValue.h"
+#include "LogLevels.h"
 #include "QNLog/QNLogger.h"
+#include "TreeSnapshot.h"
 
 using buildertest::addParent;
 using buildertest::hasNodeType;
@@ -433,4 +436,115 @@ TEST(EventLogBuilder, FailureInOneStructureIsLoggedAndTheNextStructureGoesOn) {
     EXPECT_TRUE(hasUnsigned(nodes[1], 37, 0x1000));
     EXPECT_TRUE(hasUnsignedList(nodes[1], 125, {30, 1, 16, 31}));
     EXPECT_EQ("makeLogNodes exit", eventLogLog().back());
+}
+
+// ---------------------------------------------------------------------------
+// The log thresholds: the header fields are read whatever they are.
+
+namespace {
+
+// The full structure's formatted area cut to length bytes, the length byte
+// rewritten (it has no strings: the double NUL follows).
+std::vector<uint8_t> cutEventLog(size_t length) {
+    std::vector<uint8_t> bytes = eventLog(EventLog()).build();
+    bytes.resize(length);
+    bytes[1] = static_cast<uint8_t>(length);
+    bytes.push_back(0);
+    bytes.push_back(0);
+    return bytes;
+}
+
+// The builder over the cut structure under a firmware node; the tree as
+// text.
+std::string cutEventLogTree(size_t length) {
+    TableBuilder table;
+    table.addRaw(cutEventLog(length));
+    LogRun setup(table);
+    setup.run();
+    return buildertest::treeSnapshot(setup.mi.nodeList);
+}
+
+// Where a word field of the header straddles the end of a structure of this
+// length: the log area length (0x04), the header start (0x06) and the data
+// start (0x08). The handle (0x02) always fits; the other fields are bytes,
+// or byte runs read only when they fit whole.
+bool wordStraddles(size_t length) { return length == 0x05 || length == 0x07 || length == 0x09; }
+
+}  // namespace
+
+TEST(EventLogLogLevels, HeaderCutAtEachFieldGivesTheSameTreeAndFailureAtEveryLevel) {
+    buildertest::ScopedLogLevels const restore;
+    buildertest::LogToFile file;
+    size_t const full = eventLog(EventLog()).formattedSize();
+    ASSERT_EQ(0x1Bu, full);
+    for (size_t length = 4; length < full; ++length) {
+        SCOPED_TRACE("length " + std::to_string(length));
+        bool const straddles = wordStraddles(length);
+
+        // At the default levels: one event-log node, with what was set
+        // before a straddling word ended the structure's handling.
+        buildertest::ScopedLogLevels::set(QNLog::LEVEL_OFF, QNLog::LEVEL_OFF);
+        TableBuilder table;
+        table.addRaw(cutEventLog(length));
+        LogRun setup(table);
+        std::vector<IC::Node*> const nodes = setup.run();
+        ASSERT_EQ(1u, nodes.size());
+        ASSERT_EQ(length, setup.parsed.getTables()[0].getLength());
+        IC::Node const* node = nodes[0];
+        if (length == 0x05) {
+            // The log area length itself straddles: nothing after the name.
+            EXPECT_EQ((std::vector<unsigned int>{108}), propertyIds(node));
+            EXPECT_EQ(0u, node->getStatus());
+        } else {
+            EXPECT_EQ((std::vector<unsigned int>{37, 108, 125}), propertyIds(node));
+            EXPECT_TRUE(hasUnsigned(node, 37, length == 4 ? 0 : 0x1000));
+            // The log status (0x0B: valid) counts only when it is there.
+            unsigned int const status = length == 4 ? 16 : length > 0x0B ? 1 : 30;
+            EXPECT_EQ(status, node->getStatus());
+        }
+        std::string const atDefault = buildertest::treeSnapshot(setup.mi.nodeList);
+        EXPECT_EQ(atDefault, cutEventLogTree(length));
+
+        // With every level on: the same tree, and the failure of a
+        // straddling word logged at error level.
+        {
+            smbiostest::LogCapture log;
+            std::string const everyLevelOn = cutEventLogTree(length);
+            EXPECT_EQ(atDefault, everyLevelOn) << buildertest::snapshotDifference(
+                atDefault, everyLevelOn, "default levels", "every level on");
+            std::string const failure = frametest::firstLogged("Exception=");
+            if (straddles) {
+                EXPECT_EQ(0u, failure.find("Exception= Type=")) << log.dump();
+                EXPECT_NE(std::string::npos, failure.find("out_of_range")) << failure;
+                EXPECT_NE(std::string::npos, failure.find("Table 15 index =0")) << failure;
+                EXPECT_EQ((std::vector<int>{6000}), frametest::loggedLevels("Exception="));
+            } else {
+                EXPECT_EQ("", failure) << log.dump();
+                EXPECT_EQ("makeLogNodes exit", eventLogLog().back()) << log.dump();
+            }
+            // The header lines stop before the straddling field's own.
+            EXPECT_EQ(length != 0x05, loggedLine("Handle=") != "") << log.dump();
+            EXPECT_EQ(length != 0x05 && length != 0x07,
+                      loggedLine("Log Header Start offset=") != "")
+                << log.dump();
+            EXPECT_EQ(!straddles, loggedLine("Log Data Start offset=") != "") << log.dump();
+            EXPECT_EQ(!straddles, loggedLine("Log Type Descriptors=") != "") << log.dump();
+        }
+
+        // At the agent's thresholds (warnings and errors, no details) the
+        // header is read as well: the same failure is written to the log.
+        buildertest::LevelComparison const result =
+            buildertest::compareLevels([length] { return cutEventLogTree(length); }, file);
+        EXPECT_TRUE(result.same()) << result.difference();
+        EXPECT_EQ(atDefault, result.atDefault);
+        ASSERT_EQ(straddles ? 1u : 0u, result.agentMessages.size()) << result.difference();
+        if (straddles) {
+            EXPECT_NE(std::string::npos,
+                      result.agentMessages[0].find(std::string("log 6000 ") + LOG_LOGGER +
+                                                   " makeLogNodes SmBiosMILog.cpp:"))
+                << result.agentMessages[0];
+            EXPECT_NE(std::string::npos, result.agentMessages[0].find("Exception= Type="))
+                << result.agentMessages[0];
+        }
+    }
 }

@@ -1,8 +1,8 @@
 // The planar builder: the one planar node made from the preferred baseboard
 // structure (type 2) under its chassis, the product and location it copies
 // to the chassis, the takeover of the structure groups, the contained-handle
-// and group-association logging, and the two orders in which it runs the
-// component builders.
+// and group-association logging, the two orders in which it runs the
+// component builders, and a tree that does not depend on the log thresholds.
 #include <gtest/gtest.h>
 
 #include <cstdint>
@@ -11,6 +11,8 @@
 #include <vector>
 
 #include "BuilderFixture.h"
+#include "LogLevels.h"
+#include "TreeSnapshot.h"
 
 using buildertest::childrenOf;
 using buildertest::hasEnum;
@@ -639,4 +641,134 @@ TEST(PlanarGroup, GroupHoldingTheBaseboardByTypeAndHandleIsNotReported) {
     EXPECT_EQ(0u, log.count("    Table Type=")) << log.dump();
     // The lookup itself ran over the group.
     EXPECT_EQ(2u, log.count("Table 14 length = ")) << log.dump();
+}
+
+// ---------------------------------------------------------------------------
+// The log thresholds: the chassis handle at 0x0B is read whatever they are.
+
+namespace {
+
+// A baseboard of length 0x0C: every field up to the location, then the low
+// byte of the chassis handle, whose word straddles the end of the formatted
+// area.
+Structure straddlingBaseboard(uint16_t handle) {
+    return Structure(2, handle)
+        .str("Board Maker")
+        .str("MB-100")
+        .str("BV-1")
+        .str("BRD-1")
+        .str("BA-1")
+        .byte(0x09)
+        .str("Slot A")
+        .byte(0x00);
+}
+
+// The table the planar would hand on to its component builders: a BIOS, the
+// system, the short baseboard, a slot and the end of the table.
+TableBuilder straddlingTable() {
+    TableBuilder table;
+    table.add(Structure(0, 0x0000)
+                  .str("Corvane")
+                  .str("1.05 -[CVE1-1.05]-")
+                  .word(0xE800)
+                  .str("01/01/2020"));
+    table.add(systemInformation(0x0100));
+    table.add(straddlingBaseboard(0x0200));
+    table.add(Structure(9, 0x0900)
+                  .str("PCIe Slot 1")
+                  .byte(0xA5)
+                  .byte(0x0D)
+                  .byte(0x04)
+                  .byte(0x01)
+                  .word(0x0001)
+                  .byte(0x0C)
+                  .byte(0x01));
+    table.endOfTable(0xFEFF);
+    return table;
+}
+
+// The planar builder over the table under a chassis-like parent; the tree
+// as text.
+std::string straddlingTree() {
+    PlanarRun run(straddlingTable());
+    return buildertest::treeSnapshot(run.mi.nodeList);
+}
+
+}  // namespace
+
+TEST(PlanarLogLevels, BaseboardOfLength0x0CGivesTheSameTreeAtTheDefaultLevelsAndWithEveryLevelOn) {
+    buildertest::ScopedLogLevels const restore;
+    TableBuilder const table = straddlingTable();
+    ASSERT_EQ(0x0C, frametest::parse(table).getTables()[2].getLength());
+
+    // At the default levels (nothing enabled, no capture) the chassis handle
+    // is read all the same: the word straddles the end, the read throws, and
+    // the failure ends the planar builder for this structure. The planar
+    // node keeps what was set before the read, the board type (set after it)
+    // is missing, the shared lists are not taken over and no component
+    // builder runs: no slot, firmware or raw-table node.
+    buildertest::ScopedLogLevels::set(QNLog::LEVEL_OFF, QNLog::LEVEL_OFF);
+    PlanarRun run(table);
+    ASSERT_EQ(2u, run.mi.nodeList.size()) << buildertest::treeSnapshot(run.mi.nodeList);
+    EXPECT_EQ(run.parent, run.mi.nodeList[0]);
+    std::vector<IC::Node*> const planars = run.planars();
+    ASSERT_EQ(1u, planars.size());
+    IC::Node const* planar = planars[0];
+    EXPECT_EQ(3u, planar->getNodeId());
+    EXPECT_EQ(run.parent->getNodeId(), planar->getLinkedId());
+    EXPECT_EQ(1u, planar->getStatus());
+    EXPECT_EQ("Planar", planar->getDescription());
+    EXPECT_EQ((std::vector<unsigned int>{2, 31, 36, 39, 44, 50, 172}), propertyIds(planar));
+    EXPECT_TRUE(lacksProperty(planar, 128));
+    EXPECT_TRUE(hasString(planar, 31, "Slot A"));
+    EXPECT_EQ((std::vector<unsigned int>{31, 172}), propertyIds(run.parent));
+    EXPECT_EQ(planar, run.lists.storage[2][0].node);
+    EXPECT_EQ(1u, run.lists.storage[0].size());
+    EXPECT_EQ(1u, run.lists.storage[9].size());
+    EXPECT_FALSE(run.sharedListsEmpty());
+    EXPECT_TRUE(nodesOfType(run.mi, 62).empty());
+    EXPECT_TRUE(nodesOfType(run.mi, 55).empty());
+    EXPECT_TRUE(nodesOfType(run.mi, 3).empty());
+    std::string const atDefault = buildertest::treeSnapshot(run.mi.nodeList);
+    EXPECT_EQ(atDefault, straddlingTree());
+
+    // With every level on through the capture: the same tree, and the
+    // failure logged at error level; the chassis handle's detail line is
+    // never reached.
+    {
+        smbiostest::LogCapture log;
+        std::string const everyLevelOn = straddlingTree();
+        EXPECT_EQ(atDefault, everyLevelOn) << buildertest::snapshotDifference(
+            atDefault, everyLevelOn, "default levels", "every level on");
+        std::string const failure = frametest::firstLogged("Exception=");
+        EXPECT_NE(std::string::npos, failure.find("out_of_range")) << log.dump();
+        EXPECT_NE(std::string::npos, failure.find("Table 2 index =0")) << failure;
+        EXPECT_EQ((std::vector<int>{6000}), frametest::loggedLevels("Exception="));
+        EXPECT_EQ(0u, log.count("Handle=")) << log.dump();
+        EXPECT_EQ(0u, log.count("Count of contained object handles=")) << log.dump();
+        EXPECT_EQ(2u, log.count("makePlanarNodes exit")) << log.dump();
+    }
+
+    // With both thresholds at 0, written to a file: the same tree again.
+    {
+        buildertest::LogToFile file;
+        buildertest::ScopedLogLevels const everyLevel(buildertest::EVERY_LEVEL,
+                                                      buildertest::EVERY_LEVEL);
+        std::string const everyLevelOn = straddlingTree();
+        EXPECT_EQ(atDefault, everyLevelOn) << buildertest::snapshotDifference(
+            atDefault, everyLevelOn, "default levels", "thresholds 0");
+        std::vector<std::string> const errors = file.takeMessages(SD::LOG_ERROR);
+        ASSERT_EQ(1u, errors.size());
+        EXPECT_NE(std::string::npos, errors[0].find("Exception=")) << errors[0];
+    }
+
+    // And through the comparison of the log-independence tests: the three
+    // settings agree, and at the agent's thresholds (warnings and errors)
+    // the failure is logged as it is with every level on.
+    buildertest::LogToFile file;
+    buildertest::LevelComparison const result = buildertest::compareLevels(straddlingTree, file);
+    EXPECT_TRUE(result.same()) << result.difference();
+    EXPECT_EQ(atDefault, result.atDefault);
+    ASSERT_EQ(1u, result.agentMessages.size()) << result.difference();
+    EXPECT_NE(std::string::npos, result.agentMessages[0].find("Exception="));
 }
