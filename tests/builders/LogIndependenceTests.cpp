@@ -581,6 +581,36 @@ TEST(LogIndependenceHarness, AgentThresholdsRunLogsTheFailuresARealReadRaises) {
     EXPECT_EQ(traceLevel, QNLog::QNLogger::getTraceLevel());
 }
 
+TEST(LogIndependenceHarness, LogFileReadsBackTheMessagesWrittenSinceTheLastRead) {
+    buildertest::ScopedLogLevels const levels(SD::LOG_WARNING, SD::LOG_DETAIL);
+    LogToFile file;
+    SMBIOS_ERROR(probeLogger, "before the reset");
+    file.reset();
+    SMBIOS_DETAIL(probeLogger, "a detail: the trace only");
+    SMBIOS_WARNING(probeLogger, "a warning");
+    SMBIOS_ERROR(probeLogger, "an error\nover two lines");
+    std::vector<std::string> const messages = file.takeMessages(SD::LOG_WARNING);
+    ASSERT_EQ(2u, messages.size());
+    std::string const where =
+        " Quillon.IC.MI.SmBiosMI.LogIndependenceProbe TestBody "
+        "LogIndependenceTests.cpp:";
+    EXPECT_EQ(0u, messages[0].find("log 5000" + where)) << messages[0];
+    EXPECT_NE(std::string::npos, messages[0].find(" a warning")) << messages[0];
+    EXPECT_EQ(0u, messages[1].find("log 6000" + where)) << messages[1];
+    EXPECT_NE(std::string::npos, messages[1].find(" an error\nover two lines")) << messages[1];
+    // Only the errors, and nothing again once read.
+    EXPECT_TRUE(file.takeMessages(SD::LOG_WARNING).empty());
+    SMBIOS_ERROR(probeLogger, "later");
+    std::vector<std::string> const later = file.takeMessages(SD::LOG_ERROR);
+    ASSERT_EQ(1u, later.size());
+    EXPECT_NE(std::string::npos, later[0].find(" later")) << later[0];
+    // The trace output's messages, when asked for.
+    SMBIOS_DETAIL(probeLogger, "traced");
+    std::vector<std::string> const traced = file.takeMessages(0, "trace");
+    ASSERT_EQ(1u, traced.size());
+    EXPECT_EQ(0u, traced[0].find("trace 3000" + where)) << traced[0];
+}
+
 // ---------------------------------------------------------------------------
 // The demo table
 

@@ -98,8 +98,9 @@ inline std::vector<std::string> capturedMessages(int minLevel) {
 
 // Sends the logger's output to a private file while it lives, then back to
 // the file QNLOG_FILE names, or standard error. The file is made with
-// mkstemp under $TMPDIR (or the system's temporary folder) and removed at
-// the end.
+// mkstemp under $TMPDIR (or the system's temporary folder) and its name is
+// removed as soon as the logger and the reader have it open, so that
+// nothing is left behind, whatever way the process ends.
 class LogToFile {
 public:
     LogToFile() {
@@ -108,29 +109,30 @@ public:
                               "/smbios-levels-XXXXXX";
         std::vector<char> name(pattern.begin(), pattern.end());
         name.push_back('\0');
-        int const fd = ::mkstemp(name.data());
-        if (fd < 0) {
+        fd_ = ::mkstemp(name.data());
+        if (fd_ < 0) {
             throw std::runtime_error("mkstemp failed for " + pattern);
         }
-        ::close(fd);
         path_ = name.data();
-        if (!QNLog::QNLogger::setLogFile(path_)) {
-            ::unlink(path_.c_str());
+        bool const opened = QNLog::QNLogger::setLogFile(path_);
+        if (opened) {
+            in_.open(path_, std::ios::binary);
+        }
+        ::unlink(path_.c_str());
+        if (!opened || !in_) {
+            ::close(fd_);
             throw std::runtime_error("the logger cannot write to " + path_);
         }
-        in_.open(path_, std::ios::binary);
     }
     ~LogToFile() {
         char const* previous = std::getenv("QNLOG_FILE");
         if (previous == nullptr || !QNLog::QNLogger::setLogFile(previous)) {
             QNLog::QNLogger::setLogFile("");
         }
-        ::unlink(path_.c_str());
+        ::close(fd_);
     }
     LogToFile(LogToFile const&) = delete;
     LogToFile& operator=(LogToFile const&) = delete;
-
-    std::string const& path() const { return path_; }
 
     // Skips what the file holds so far: the next takeMessages returns only
     // what is written from now on. A file grown past a few megabytes is
@@ -142,7 +144,7 @@ public:
         in_.seekg(0, std::ios::end);
         std::streamoff const end = in_.tellg();
         if (end > kMaxSize) {
-            if (::truncate(path_.c_str(), 0) != 0) {
+            if (::ftruncate(fd_, 0) != 0) {
                 throw std::runtime_error("cannot empty " + path_);
             }
             read_ = 0;
@@ -206,6 +208,7 @@ public:
 private:
     static constexpr std::streamoff kMaxSize = 4 << 20;
 
+    int fd_ = -1;
     std::string path_;
     std::ifstream in_;
     size_t read_ = 0;
