@@ -155,7 +155,7 @@ bool SmBiosMI::makeRequestedNodes(unsigned int parentId, unsigned int const* loc
 #define SMBIOSMI_FAIL(text, off, length) \
     SMBIOS_DETAIL(logger, text << static_cast<unsigned int>(off) << " length=" << (length))
 
-bool SmBiosMI::getBool16(SD::SmBios::Table const* t, unsigned char off, unsigned short mask) {
+bool SmBiosMI::getBool16(SD::SmBios::Table const* t, unsigned char off, unsigned short mask) const {
     unsigned int const length = t->getLength();
     if (off < length) {
         return (t->getWord(off) & mask) != 0;
@@ -164,7 +164,7 @@ bool SmBiosMI::getBool16(SD::SmBios::Table const* t, unsigned char off, unsigned
     return false;
 }
 
-unsigned int SmBiosMI::getNumber16(SD::SmBios::Table const* t, unsigned char off) {
+unsigned int SmBiosMI::getNumber16(SD::SmBios::Table const* t, unsigned char off) const {
     unsigned int const length = t->getLength();
     if (off < length) {
         return t->getWord(off);
@@ -174,7 +174,7 @@ unsigned int SmBiosMI::getNumber16(SD::SmBios::Table const* t, unsigned char off
 }
 
 unsigned int SmBiosMI::getEnumValue16(SD::SmBios::Table const* t, unsigned char off,
-                                      unsigned short mask, unsigned char shift) {
+                                      unsigned short mask, unsigned char shift) const {
     unsigned int const length = t->getLength();
     if (off < length) {
         return static_cast<unsigned int>(t->getWord(off) & mask) >> shift;
@@ -183,7 +183,7 @@ unsigned int SmBiosMI::getEnumValue16(SD::SmBios::Table const* t, unsigned char 
     return 0;
 }
 
-bool SmBiosMI::getBool8(SD::SmBios::Table const* t, unsigned char off, unsigned char mask) {
+bool SmBiosMI::getBool8(SD::SmBios::Table const* t, unsigned char off, unsigned char mask) const {
     unsigned int const length = t->getLength();
     if (off < length) {
         return (t->getByte(off) & mask) != 0;
@@ -192,7 +192,7 @@ bool SmBiosMI::getBool8(SD::SmBios::Table const* t, unsigned char off, unsigned 
     return false;
 }
 
-unsigned int SmBiosMI::getNumber8(SD::SmBios::Table const* t, unsigned char off) {
+unsigned int SmBiosMI::getNumber8(SD::SmBios::Table const* t, unsigned char off) const {
     unsigned int const length = t->getLength();
     if (off < length) {
         return t->getByte(off);
@@ -202,7 +202,7 @@ unsigned int SmBiosMI::getNumber8(SD::SmBios::Table const* t, unsigned char off)
 }
 
 unsigned int SmBiosMI::getEnumValue(SD::SmBios::Table const* t, unsigned char off,
-                                    unsigned char mask) {
+                                    unsigned char mask) const {
     unsigned int const length = t->getLength();
     if (off < length) {
         return static_cast<unsigned int>(t->getByte(off) & mask);
@@ -211,16 +211,16 @@ unsigned int SmBiosMI::getEnumValue(SD::SmBios::Table const* t, unsigned char of
     return 0;
 }
 
-unsigned int SmBiosMI::getNumber8Unprot(SD::SmBios::Table const* t, unsigned int off) {
+unsigned int SmBiosMI::getNumber8Unprot(SD::SmBios::Table const* t, unsigned int off) const {
     return t->getByteUnprot(off);
 }
 
-std::string SmBiosMI::getStrByIdx(SD::SmBios::Table const* t, unsigned char index) {
+std::string SmBiosMI::getStrByIdx(SD::SmBios::Table const* t, unsigned char index) const {
     SD::SmBios::String const s = t->getString(index);
     return s != nullptr ? std::string(s) : std::string();
 }
 
-std::string SmBiosMI::getString(SD::SmBios::Table const* t, unsigned char off) {
+std::string SmBiosMI::getString(SD::SmBios::Table const* t, unsigned char off) const {
     unsigned int const length = t->getLength();
     if (off < length) {
         return getStrByIdx(t, t->getByte(off));
@@ -230,7 +230,7 @@ std::string SmBiosMI::getString(SD::SmBios::Table const* t, unsigned char off) {
 }
 
 std::vector<unsigned char> SmBiosMI::getBuffer(SD::SmBios::Table const* t, unsigned char off,
-                                               unsigned char count) {
+                                               unsigned char count) const {
     unsigned int const length = t->getLength();
     std::vector<unsigned char> bytes;
     if (static_cast<unsigned int>(off) + count <= length) {
@@ -244,7 +244,7 @@ std::vector<unsigned char> SmBiosMI::getBuffer(SD::SmBios::Table const* t, unsig
 }
 
 std::vector<unsigned char> SmBiosMI::getBufferUnprot(SD::SmBios::Table const* t, unsigned int off,
-                                                     unsigned int count) {
+                                                     unsigned int count) const {
     std::vector<unsigned char> bytes;
     bytes.reserve(count);
     for (unsigned int i = 0; i < count; ++i) {
@@ -253,126 +253,108 @@ std::vector<unsigned char> SmBiosMI::getBufferUnprot(SD::SmBios::Table const* t,
     return bytes;
 }
 
-void SmBiosMI::propBool64(SD::SmBios::Table const* t, unsigned char off, unsigned long long mask,
-                          unsigned int id, MutableNode* node) {
+namespace {
+
+// The one body of every property writer: when the field of `width` bytes at
+// off lies inside the formatted area, property id is set to what read()
+// makes of it; otherwise nothing is set and "<name>offset=... length=..." is
+// logged. read() runs only after the check, so a field outside the area is
+// never read.
+template <typename Read>
+void writeField(SD::SmBios::Table const* t, unsigned char off, unsigned int width, char const* name,
+                unsigned int id, MutableNode* node, Read read) {
     unsigned int const length = t->getLength();
-    if (off + 7u < length) {
-        node->setProperty(id, PropertyValue(Number((t->getByte(off) & mask) != 0), true));
+    if (static_cast<unsigned int>(off) + width <= length) {
+        node->setProperty(id, PropertyValue(read(), true));
         return;
     }
-    SMBIOSMI_FAIL("propBool64 offset=", off, length);
+    SMBIOSMI_FAIL(name, off, length);
+}
+
+// The wide boolean writers check the whole field but test only its first
+// byte against the mask.
+template <typename Mask>
+Number firstByteBit(SD::SmBios::Table const* t, unsigned char off, Mask mask) {
+    return Number((t->getByte(off) & mask) != 0);
+}
+
+}  // namespace
+
+void SmBiosMI::propBool64(SD::SmBios::Table const* t, unsigned char off, unsigned long long mask,
+                          unsigned int id, MutableNode* node) {
+    writeField(t, off, 8, "propBool64 offset=", id, node,
+               [&] { return firstByteBit(t, off, mask); });
 }
 
 void SmBiosMI::propBool32(SD::SmBios::Table const* t, unsigned char off, unsigned int mask,
                           unsigned int id, MutableNode* node) {
-    unsigned int const length = t->getLength();
-    if (off + 3u < length) {
-        node->setProperty(id, PropertyValue(Number((t->getByte(off) & mask) != 0), true));
-        return;
-    }
-    SMBIOSMI_FAIL("propBool32 offset=", off, length);
+    writeField(t, off, 4, "propBool32 offset=", id, node,
+               [&] { return firstByteBit(t, off, mask); });
 }
 
 void SmBiosMI::propBool16(SD::SmBios::Table const* t, unsigned char off, unsigned short mask,
                           unsigned int id, MutableNode* node) {
-    unsigned int const length = t->getLength();
-    if (off + 1u < length) {
-        node->setProperty(id, PropertyValue(Number((t->getByte(off) & mask) != 0), true));
-        return;
-    }
-    SMBIOSMI_FAIL("propBool16 offset=", off, length);
+    writeField(t, off, 2, "propBool16 offset=", id, node,
+               [&] { return firstByteBit(t, off, mask); });
 }
 
 void SmBiosMI::propBool8(SD::SmBios::Table const* t, unsigned char off, unsigned char mask,
                          unsigned int id, MutableNode* node) {
-    unsigned int const length = t->getLength();
-    if (off < length) {
-        node->setProperty(id, PropertyValue(Number((t->getByte(off) & mask) != 0), true));
-        return;
-    }
-    SMBIOSMI_FAIL("propBool8 offset=", off, length);
+    writeField(t, off, 1, "propBool8 offset=", id, node,
+               [&] { return firstByteBit(t, off, mask); });
 }
 
 void SmBiosMI::propNumber16(SD::SmBios::Table const* t, unsigned char off, unsigned int id,
                             MutableNode* node) {
-    unsigned int const length = t->getLength();
-    if (off + 1u < length) {
-        unsigned int const value = t->getWord(off);
-        node->setProperty(id, PropertyValue(Number(value), true));
-        return;
-    }
-    SMBIOSMI_FAIL("propNumber16 offset=", off, length);
+    writeField(t, off, 2, "propNumber16 offset=", id, node,
+               [&] { return Number(static_cast<unsigned int>(t->getWord(off))); });
 }
 
 void SmBiosMI::propNumber8(SD::SmBios::Table const* t, unsigned char off, unsigned int id,
                            MutableNode* node) {
-    unsigned int const length = t->getLength();
-    if (off < length) {
-        unsigned int const value = t->getByte(off);
-        node->setProperty(id, PropertyValue(Number(value), true));
-        return;
-    }
-    SMBIOSMI_FAIL("propNumber8 offset=", off, length);
+    writeField(t, off, 1, "propNumber8 offset=", id, node,
+               [&] { return Number(static_cast<unsigned int>(t->getByte(off))); });
 }
 
 void SmBiosMI::propEnumValue16(SD::SmBios::Table const* t, unsigned char off, unsigned short mask,
                                unsigned char shift, unsigned int id, MutableNode* node) {
-    unsigned int const length = t->getLength();
-    if (off + 1u < length) {
-        unsigned short const value =
-            static_cast<unsigned short>(static_cast<unsigned int>(t->getWord(off) & mask) >> shift);
-        node->setProperty(id, PropertyValue(EnumValue(value), true));
-        return;
-    }
-    SMBIOSMI_FAIL("propEnumValue16 offset=", off, length);
+    writeField(t, off, 2, "propEnumValue16 offset=", id, node, [&] {
+        return EnumValue(static_cast<unsigned short>(
+            static_cast<unsigned int>(t->getWord(off) & mask) >> shift));
+    });
 }
 
 void SmBiosMI::propEnumValue(SD::SmBios::Table const* t, unsigned char off, unsigned char mask,
                              unsigned int id, MutableNode* node) {
-    unsigned int const length = t->getLength();
-    if (off < length) {
-        unsigned char const value = static_cast<unsigned char>(t->getByte(off) & mask);
-        node->setProperty(id, PropertyValue(EnumValue(value), true));
-        return;
-    }
-    SMBIOSMI_FAIL("propEnumValue offset=", off, length);
+    writeField(t, off, 1, "propEnumValue offset=", id, node,
+               [&] { return EnumValue(static_cast<unsigned char>(t->getByte(off) & mask)); });
 }
 
 void SmBiosMI::propEnumValue(SD::SmBios::Table const* t, unsigned char off, unsigned int id,
                              MutableNode* node) {
-    unsigned int const length = t->getLength();
-    if (off < length) {
-        node->setProperty(id, PropertyValue(EnumValue(t->getByte(off)), true));
-        return;
-    }
-    SMBIOSMI_FAIL("propEnumValue offset=", off, length);
+    writeField(t, off, 1, "propEnumValue offset=", id, node,
+               [&] { return EnumValue(t->getByte(off)); });
 }
 
 void SmBiosMI::propString(SD::SmBios::Table const* t, unsigned char off, unsigned int id,
                           MutableNode* node) {
-    unsigned int const length = t->getLength();
-    if (off < length) {
+    writeField(t, off, 1, "propString offset=", id, node, [&] {
         SD::SmBios::String const s = t->getString(t->getByte(off));
-        node->setProperty(id, PropertyValue(s != nullptr ? s : "", true));
-        return;
-    }
-    SMBIOSMI_FAIL("propString offset=", off, length);
+        return std::string(s != nullptr ? s : "");
+    });
 }
 
 void SmBiosMI::propBuffer(SD::SmBios::Table const* t, unsigned char off, unsigned char count,
                           unsigned int id, MutableNode* node) {
-    unsigned int const length = t->getLength();
-    if (static_cast<unsigned int>(off) + count <= length) {
+    writeField(t, off, count, "propBuffer offset=", id, node, [&] {
         // Stored backwards, deliberately unlike getBuffer: a little-endian
         // field becomes its big-endian bytes, which the agent shows as is.
         std::vector<unsigned char> bytes;
         for (unsigned int i = count; i-- > 0;) {
             bytes.push_back(t->getByte(static_cast<unsigned char>(off + i)));
         }
-        node->setProperty(id, PropertyValue(bytes, true));
-        return;
-    }
-    SMBIOSMI_FAIL("propBuffer offset=", off, length);
+        return bytes;
+    });
 }
 
 std::string SmBiosMI::pB(unsigned char b) {

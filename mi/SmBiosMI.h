@@ -87,20 +87,21 @@ public:
 
     // Readers: a field of the structure, or 0, false or empty when the
     // offset fails the check against the formatted-area length (logged).
-    bool getBool16(SD::SmBios::Table const* t, unsigned char off, unsigned short mask);
-    unsigned int getNumber16(SD::SmBios::Table const* t, unsigned char off);
+    bool getBool16(SD::SmBios::Table const* t, unsigned char off, unsigned short mask) const;
+    unsigned int getNumber16(SD::SmBios::Table const* t, unsigned char off) const;
     unsigned int getEnumValue16(SD::SmBios::Table const* t, unsigned char off, unsigned short mask,
-                                unsigned char shift);
-    bool getBool8(SD::SmBios::Table const* t, unsigned char off, unsigned char mask);
-    unsigned int getNumber8(SD::SmBios::Table const* t, unsigned char off);
-    unsigned int getEnumValue(SD::SmBios::Table const* t, unsigned char off, unsigned char mask);
-    unsigned int getNumber8Unprot(SD::SmBios::Table const* t, unsigned int off);
-    std::string getStrByIdx(SD::SmBios::Table const* t, unsigned char index);
-    std::string getString(SD::SmBios::Table const* t, unsigned char off);
+                                unsigned char shift) const;
+    bool getBool8(SD::SmBios::Table const* t, unsigned char off, unsigned char mask) const;
+    unsigned int getNumber8(SD::SmBios::Table const* t, unsigned char off) const;
+    unsigned int getEnumValue(SD::SmBios::Table const* t, unsigned char off,
+                              unsigned char mask) const;
+    unsigned int getNumber8Unprot(SD::SmBios::Table const* t, unsigned int off) const;
+    std::string getStrByIdx(SD::SmBios::Table const* t, unsigned char index) const;
+    std::string getString(SD::SmBios::Table const* t, unsigned char off) const;
     std::vector<unsigned char> getBuffer(SD::SmBios::Table const* t, unsigned char off,
-                                         unsigned char count);
+                                         unsigned char count) const;
     std::vector<unsigned char> getBufferUnprot(SD::SmBios::Table const* t, unsigned int off,
-                                               unsigned int count);
+                                               unsigned int count) const;
 
     // Writers: set property id on node from a field, or set nothing when the
     // field fails the check against the formatted-area length (logged).
