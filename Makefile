@@ -62,9 +62,13 @@ check-asan: packages-check
 	ASAN_OPTIONS=detect_leaks=1 UBSAN_OPTIONS=print_stacktrace=1:halt_on_error=1 \
 	  $(CTEST) --test-dir $(ASAN_BUILD) --output-on-failure -j $(JOBS)
 
+# On a kernel that cannot run 32-bit programs, tools/m32-runner names
+# qemu-i386 and the tests run the built programs under it.
 check-m32: packages-check
+	runner=$$(sh tools/m32-runner $(M32_BUILD)) && \
 	$(CMAKE) -S . -B $(M32_BUILD) $(GENERATOR) -DCMAKE_BUILD_TYPE=RelWithDebInfo \
-	  -DCMAKE_C_FLAGS=-m32 -DCMAKE_CXX_FLAGS=-m32 -DSMBIOS_BENCH=OFF
+	  -DCMAKE_C_FLAGS=-m32 -DCMAKE_CXX_FLAGS=-m32 -DSMBIOS_BENCH=OFF \
+	  -DSMBIOS_TEST_EMULATOR="$$runner"
 	$(CMAKE) --build $(M32_BUILD) -j $(JOBS)
 	$(CTEST) --test-dir $(M32_BUILD) --output-on-failure -j $(JOBS)
 

@@ -30,8 +30,10 @@ std::string checkedInPath() {
 
 // Runs the program with its arguments; returns its exit status, or -1.
 int run(std::vector<std::string> const& args, std::string& error) {
+    std::vector<std::string> const line =
+        smbiostest::commandLine(args[0], std::vector<std::string>(args.begin() + 1, args.end()));
     std::vector<char*> argv;
-    for (std::string const& arg : args) {
+    for (std::string const& arg : line) {
         argv.push_back(const_cast<char*>(arg.c_str()));
     }
     argv.push_back(nullptr);

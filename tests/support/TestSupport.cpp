@@ -157,6 +157,35 @@ std::string corpusDir() {
     return isDirectory(path) ? path : "";
 }
 
+std::vector<std::string> folderEntries(std::string const& folder) {
+    std::vector<std::string> names;
+    DIR* handle = ::opendir(folder.c_str());
+    if (handle == nullptr) {
+        return names;
+    }
+    while (dirent* entry = ::readdir(handle)) {
+        std::string const name = entry->d_name;
+        if (name != "." && name != "..") {
+            names.push_back(name);
+        }
+    }
+    ::closedir(handle);
+    std::sort(names.begin(), names.end());
+    return names;
+}
+
+std::vector<std::string> commandLine(std::string const& program,
+                                     std::vector<std::string> const& args) {
+    std::vector<std::string> line;
+    char const* emulator = std::getenv("SMBIOS_TEST_EMULATOR");
+    if (emulator != nullptr && *emulator != '\0') {
+        line.push_back(emulator);
+    }
+    line.push_back(program);
+    line.insert(line.end(), args.begin(), args.end());
+    return line;
+}
+
 std::vector<std::string> corpusNames() {
     std::vector<std::string> names;
     std::string const dir = corpusDir();

@@ -85,6 +85,16 @@ std::vector<std::string> corpusNames();
 // false when the file has no such line.
 bool dmidecodeVersion(std::string const& name, unsigned int& major, unsigned int& minor);
 
+// The names in a folder (without "." and ".."), sorted; empty when it cannot
+// be read.
+std::vector<std::string> folderEntries(std::string const& folder);
+
+// The command line that starts PROGRAM with ARGS in a test: PROGRAM first,
+// or, when SMBIOS_TEST_EMULATOR names a program (qemu-i386 for a 32-bit build
+// on a kernel that cannot run it), that program first.
+std::vector<std::string> commandLine(std::string const& program,
+                                     std::vector<std::string> const& args);
+
 // Writes dataDir/SmBiosOverride/smbios.txt (creating the folder) with the
 // override text of the entry point and table. dataDir may end with '/'.
 void writeOverrideDir(std::string const& dataDir, std::vector<uint8_t> const& header,
