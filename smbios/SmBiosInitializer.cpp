@@ -374,6 +374,39 @@ int readHead(std::vector<unsigned char>& bytes, std::vector<std::string> const& 
     return result;
 }
 
+namespace {
+
+// Where a walk of the table section stopped.
+struct TableWalk {
+    bool endSeen = false;      // at </SHOWSMBIOS>
+    bool inSizeBlock = false;  // inside a <SIZE> block that never ended
+};
+
+// Walks the table section's tokens as the acquisition reads them: <SIZE>
+// blocks are skipped, every other data run goes to run(token), which
+// returns false to stop the walk; </SHOWSMBIOS> ends it.
+template <typename Run>
+TableWalk walkTableRuns(std::vector<std::string> const& tables, Run run) {
+    TableWalk walk;
+    for (std::string const& token : tables) {
+        if (walk.inSizeBlock) {
+            walk.inSizeBlock = token != "</SIZE>";
+        } else if (token == "<SIZE>") {
+            walk.inSizeBlock = true;
+        } else if (token.empty() || token[0] != '<') {
+            if (!run(token)) {
+                break;
+            }
+        } else if (token == "</SHOWSMBIOS>") {
+            walk.endSeen = true;
+            break;
+        }
+    }
+    return walk;
+}
+
+}  // namespace
+
 int readTables(std::vector<unsigned char>& bytes, std::vector<std::string> const& tables) {
     // Room for every data run at once (size blocks included, an overestimate
     // of a few bytes at most), so that the bytes are not copied as they grow.
@@ -384,35 +417,37 @@ int readTables(std::vector<unsigned char>& bytes, std::vector<std::string> const
         }
     }
     bytes.reserve(bytes.size() + hexDigits / 2);
-    bool inSizeBlock = false;
-    bool endSeen = false;
-    for (std::string const& token : tables) {
-        if (inSizeBlock) {
-            inSizeBlock = token != "</SIZE>";
-        } else if (token == "<SIZE>") {
-            inSizeBlock = true;
-        } else if (token.empty() || token[0] != '<') {
-            if (byteHex(token, bytes) != 0) {
-                break;
-            }
-        } else if (token == "</SHOWSMBIOS>") {
-            endSeen = true;
-            break;
-        }
-    }
-    if (inSizeBlock) {
+    TableWalk const walk = walkTableRuns(
+        tables, [&bytes](std::string const& run) { return byteHex(run, bytes) == 0; });
+    if (walk.inSizeBlock) {
         SMBIOS_WARNING(loggerSmBiosInitializer,
                        "readTables() terminating </SIZE> was not found " << 53);
     }
-    if (!endSeen) {
+    if (!walk.endSeen) {
         SMBIOS_WARNING(loggerSmBiosInitializer,
                        "readTables() terminating </SHOWSMBIOS> was not found " << 55);
     }
     // Kept: an unterminated size block and a bad digit end with 55 too, the
     // one code the acquisition tests for.
-    int const result = endSeen ? 0 : 55;
+    int const result = walk.endSeen ? 0 : 55;
     SMBIOS_DETAIL(loggerSmBiosInitializer, "readTables() exit" << result);
     return result;
+}
+
+// The same walk as readTables, up to the first run with a bad digit (where
+// readTables stops too).
+size_t oddHexRun(std::vector<std::string> const& tables) {
+    size_t odd = 0;
+    walkTableRuns(tables, [&odd](std::string const& run) {
+        bool const allHex = std::all_of(run.begin(), run.end(), [](char c) {
+            return std::isxdigit(static_cast<unsigned char>(c)) != 0;
+        });
+        if (allHex && run.size() % 2 != 0) {
+            odd = run.size();
+        }
+        return allHex && odd == 0;
+    });
+    return odd;
 }
 
 int byteHex(std::string const& text, std::vector<unsigned char>& bytes) {

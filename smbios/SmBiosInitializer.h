@@ -44,4 +44,10 @@ int readHead(std::vector<unsigned char>& bytes, std::vector<std::string> const& 
 int readTables(std::vector<unsigned char>& bytes, std::vector<std::string> const& tables);
 int byteHex(std::string const& text, std::vector<unsigned char>& bytes);
 
+// The digit count of the first data run of the table section that readTables
+// decodes with an odd number of hex digits (byteHex drops its last digit, so
+// every byte after it shifts); 0 when there is none. The host uses it to
+// refuse such a dump file; the acquisition itself never calls it.
+size_t oddHexRun(std::vector<std::string> const& tables);
+
 }  // namespace SD

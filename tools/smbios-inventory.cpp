@@ -3,10 +3,13 @@
 // inventory tree that it builds, as a tree for people or as JSON.
 //
 // Exit status: 0 after printing, 1 when the plug-in cannot be loaded or
-// fails, 2 for a wrong command line.
+// fails, 2 for a wrong command line or a dump file that is not usable, and
+// 128 + the signal's number when SIGINT, SIGTERM or SIGHUP ends the run.
 
 #include <dlfcn.h>
+#include <signal.h>
 #include <stdlib.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include <CLI/CLI.hpp>
@@ -28,7 +31,9 @@
 #include "IC/Node.h"
 #include "IC/Number.h"
 #include "QNLog/QNLogger.h"
+#include "SD/RegularFile.h"
 #include "ToolSupport.h"
+#include "inventory/DumpCheck.h"
 #include "inventory/Inventory.h"
 
 namespace {
@@ -107,6 +112,80 @@ private:
     std::string path_;
 };
 
+// The signals that end a run early; the temporary data directory must not
+// outlive them.
+int const kEndSignals[] = {SIGINT, SIGTERM, SIGHUP};
+
+// What the signal handler removes: the override copy, its folder and the
+// temporary data directory, made before the handler is installed so that the
+// handler itself only calls unlink and rmdir.
+struct SignalCleanup {
+    std::string file;
+    std::string folder;
+    std::string dataDir;
+};
+SignalCleanup gSignalCleanup;
+volatile sig_atomic_t gSignalCleanupReady = 0;
+
+extern "C" void removeTemporaryDataDirAndEnd(int signalNumber) {
+    if (gSignalCleanupReady != 0) {
+        unlink(gSignalCleanup.file.c_str());
+        rmdir(gSignalCleanup.folder.c_str());
+        rmdir(gSignalCleanup.dataDir.c_str());
+    }
+    // The handler was reset to the default on entry and the signal is not
+    // blocked inside it: raising it again ends the process as the signal
+    // would have, with the status 128 + its number that a shell reports.
+    raise(signalNumber);
+}
+
+// Holds the end signals back while the temporary data directory is made and
+// its cleanup prepared; a signal that came meanwhile is delivered at the end.
+class EndSignalsHeld {
+public:
+    EndSignalsHeld() {
+        sigset_t held;
+        sigemptyset(&held);
+        for (int signalNumber : kEndSignals) {
+            sigaddset(&held, signalNumber);
+        }
+        active_ = sigprocmask(SIG_BLOCK, &held, &saved_) == 0;
+    }
+    EndSignalsHeld(EndSignalsHeld const&) = delete;
+    EndSignalsHeld& operator=(EndSignalsHeld const&) = delete;
+    ~EndSignalsHeld() {
+        if (active_) {
+            sigprocmask(SIG_SETMASK, &saved_, nullptr);
+        }
+    }
+
+private:
+    sigset_t saved_;
+    bool active_ = false;
+};
+
+// From here on an end signal removes the temporary data directory first.
+// Signals that the caller ignores (a background job's SIGINT) stay ignored.
+void removeOnEndSignals(std::string const& dataDir, std::string const& folder,
+                        std::string const& file) {
+    gSignalCleanup.dataDir = dataDir;
+    gSignalCleanup.folder = folder;
+    gSignalCleanup.file = file;
+    gSignalCleanupReady = 1;
+    for (int signalNumber : kEndSignals) {
+        struct sigaction previous;
+        if (sigaction(signalNumber, nullptr, &previous) == 0 && previous.sa_handler == SIG_IGN) {
+            continue;
+        }
+        struct sigaction action;
+        std::memset(&action, 0, sizeof action);
+        action.sa_handler = removeTemporaryDataDirAndEnd;
+        sigemptyset(&action.sa_mask);
+        action.sa_flags = SA_RESETHAND | SA_NODEFER;
+        sigaction(signalNumber, &action, nullptr);
+    }
+}
+
 // Sends whatever is written to standard output to standard error until it is
 // ended: standard output carries nothing but the inventory.
 class StdoutToStderr {
@@ -150,26 +229,33 @@ std::string defaultPluginPath() {
     return smbiostool::installedLibrary(smbiostool::ownFolder(), kPluginName);
 }
 
-bool readWholeFile(std::string const& path, std::string& content, std::string& why) {
-    std::FILE* file = std::fopen(path.c_str(), "rb");
-    if (file == nullptr) {
-        why = "cannot read " + path + ": " + std::strerror(errno);
+// Reads a --dump or --from-bin file: a regular file of at most 16 MiB,
+// never waiting on a FIFO or reading a device.
+bool readInput(char const* option, std::string const& path, std::string& content) {
+    std::vector<std::uint8_t> bytes;
+    std::string why;
+    if (!smbiostool::readInputFile(path, bytes, why)) {
+        complain(std::string(option) + ": " + path + ": " + why);
         return false;
     }
-    content.clear();
-    char buffer[65536];
-    size_t count = 0;
-    while ((count = std::fread(buffer, 1, sizeof buffer, file)) > 0) {
-        content.append(buffer, count);
-    }
-    bool const failed = std::ferror(file) != 0;
-    int const readErrno = errno;
-    std::fclose(file);
-    if (failed) {
-        why = "cannot read " + path + ": " + std::strerror(readErrno);
-        return false;
-    }
+    content.assign(bytes.begin(), bytes.end());
     return true;
+}
+
+// The --log file is appended to: a regular file (made when it is not
+// there) or a character device such as /dev/null or a terminal. Anything
+// else (a FIFO would wait for a reader, a directory cannot take lines) is
+// refused before the logger opens it.
+bool usableLogFile(std::string const& path, std::string& why) {
+    struct stat status;
+    if (stat(path.c_str(), &status) != 0) {
+        return true;
+    }
+    if (S_ISREG(status.st_mode) || S_ISCHR(status.st_mode)) {
+        return true;
+    }
+    why = std::string(SD::fileKind(status.st_mode)) + ", not a regular file";
+    return false;
 }
 
 bool writeWholeFile(std::string const& path, std::string const& content, std::string& why) {
@@ -457,6 +543,13 @@ int run(int argc, char** argv) {
         !applyLevel("--trace-level", traceLevel, &QNLog::QNLogger::setTraceLevel)) {
         return smbiostool::EXIT_USAGE;
     }
+    if (!logFile.empty()) {
+        std::string why;
+        if (!usableLogFile(logFile, why)) {
+            complain("--log: " + logFile + ": " + why);
+            return smbiostool::EXIT_USAGE;
+        }
+    }
     if (!logFile.empty() && !QNLog::QNLogger::setLogFile(logFile)) {
         complain("--log: cannot open " + logFile + " for appending");
         return smbiostool::EXIT_USAGE;
@@ -482,16 +575,13 @@ int run(int argc, char** argv) {
     // override file, as --dump would have given it.
     std::string dumpContent;
     if (!dumpFile.empty()) {
-        std::string why;
-        if (!readWholeFile(dumpFile, dumpContent, why)) {
-            complain("--dump: " + why);
+        if (!readInput("--dump", dumpFile, dumpContent)) {
             return smbiostool::EXIT_USAGE;
         }
     } else if (!binFile.empty()) {
         std::string bytes;
         std::string why;
-        if (!readWholeFile(binFile, bytes, why)) {
-            complain("--from-bin: " + why);
+        if (!readInput("--from-bin", binFile, bytes)) {
             return smbiostool::EXIT_USAGE;
         }
         smbiosdump::DumpImage image;
@@ -515,6 +605,7 @@ int run(int argc, char** argv) {
     // of it; the real data directory is left alone.
     TemporaryDataDir temporary;
     if (onDump) {
+        EndSignalsHeld held;
         std::string why;
         if (!temporary.create(why)) {
             complain(why);
@@ -526,9 +617,22 @@ int run(int argc, char** argv) {
             complain("cannot create " + overrideDir + ": " + error.message());
             return smbiostool::EXIT_FAILED;
         }
-        if (!writeWholeFile(overrideDir + "/smbios.txt", dumpContent, why)) {
+        std::string const overrideFile = overrideDir + "/smbios.txt";
+        removeOnEndSignals(temporary.path(), overrideDir, overrideFile);
+        if (!writeWholeFile(overrideFile, dumpContent, why)) {
             complain(why);
             return smbiostool::EXIT_FAILED;
+        }
+        // The copy is what the plug-in reads: check it with the plug-in's
+        // own grammar, so that the host never answers about another table.
+        inventory::DumpCheck const check = inventory::checkOverrideFile(overrideFile, dumpContent);
+        if (!check.refusal.empty()) {
+            complain((dumpFile.empty() ? "--from-bin: " + binFile : "--dump: " + dumpFile) + ": " +
+                     check.refusal);
+            return smbiostool::EXIT_USAGE;
+        }
+        if (!check.warning.empty()) {
+            complain(check.warning);
         }
         if (!setEnvironment("KESTREL_DATA_DIR", temporary.path() + "/")) {
             return smbiostool::EXIT_FAILED;

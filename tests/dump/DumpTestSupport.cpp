@@ -72,23 +72,6 @@ ReadBack readBackThroughPlugin(std::string const& path) {
     return result;
 }
 
-std::vector<std::string> folderEntries(std::string const& folder) {
-    std::vector<std::string> names;
-    DIR* handle = opendir(folder.c_str());
-    if (handle == nullptr) {
-        return names;
-    }
-    while (dirent* entry = readdir(handle)) {
-        std::string const name = entry->d_name;
-        if (name != "." && name != "..") {
-            names.push_back(name);
-        }
-    }
-    closedir(handle);
-    std::sort(names.begin(), names.end());
-    return names;
-}
-
 bool exists(std::string const& path) {
     struct stat info;
     return lstat(path.c_str(), &info) == 0;

@@ -10,6 +10,7 @@
 #include <vector>
 
 #include "HostRunner.h"
+#include "TestSupport.h"
 
 namespace dumptest {
 
@@ -54,7 +55,7 @@ struct ReadBack {
 ReadBack readBackThroughPlugin(std::string const& path);
 
 // The names in a folder (without "." and ".."), sorted.
-std::vector<std::string> folderEntries(std::string const& folder);
+using smbiostest::folderEntries;
 
 bool exists(std::string const& path);
 

@@ -10,8 +10,10 @@
 //   FAKE_MI_OPEN=fail   OpenMI returns 5
 //   FAKE_MI_OPEN=null   OpenMI returns 0 but hands out no interface
 //   FAKE_MI_CYCLE=1     two more nodes whose linked ids point at each other
+//   FAKE_MI_SLEEP=1     initialize waits 60 s first, for the host's signal tests
 
 #include <dlfcn.h>
+#include <unistd.h>
 
 #include <cstdio>
 #include <cstdlib>
@@ -147,6 +149,11 @@ public:
         traceText << kTraceText;
         QNLog::QNLogger::traceLevelMessage(__func__, __FILE__, __LINE__, logger, 5000, traceText);
 
+        if (envIs("FAKE_MI_SLEEP", "1")) {
+            for (int tenth = 0; tenth < 600; ++tenth) {
+                usleep(100000);
+            }
+        }
         if (envIs("FAKE_MI_FAIL", "1")) {
             return IC::Error(3, IC::Number(7u), kFailMessage);
         }

@@ -2,12 +2,14 @@
 
 #include <errno.h>
 #include <fcntl.h>
+#include <signal.h>
 #include <spawn.h>
 #include <stdlib.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
 #include <algorithm>
+#include <chrono>
 #include <cstdint>
 #include <cstring>
 #include <exception>
@@ -54,8 +56,13 @@ std::string sourceDir() {
 
 std::string hostPath() { return outDir() + "/smbios-inventory"; }
 
-RunResult runProgram(std::string const& program, std::vector<std::string> const& args,
-                     Environment const& environment) {
+namespace {
+
+// Runs the program; while it runs, once ready() says so, sends it the
+// signal (0: none).
+RunResult runChild(std::string const& program, std::vector<std::string> const& args,
+                   Environment const& environment, int signalNumber,
+                   std::function<bool()> const& ready, double timeLimit = 0) {
     RunResult result;
     // The child's outputs go to two files of a private folder.
     std::unique_ptr<smbiostest::TempDir> captures;
@@ -68,9 +75,7 @@ RunResult runProgram(std::string const& program, std::vector<std::string> const&
     std::string const outPath = captures->file("stdout");
     std::string const errPath = captures->file("stderr");
 
-    std::vector<std::string> argStrings;
-    argStrings.push_back(program);
-    argStrings.insert(argStrings.end(), args.begin(), args.end());
+    std::vector<std::string> argStrings = smbiostest::commandLine(program, args);
     std::vector<char*> argv;
     for (std::string& arg : argStrings) {
         argv.push_back(&arg[0]);
@@ -93,18 +98,59 @@ RunResult runProgram(std::string const& program, std::vector<std::string> const&
                                      O_WRONLY | O_CREAT | O_TRUNC, 0600);
 
     pid_t pid = 0;
-    int spawned = posix_spawn(&pid, program.c_str(), &actions, nullptr, argv.data(), envp.data());
+    int spawned =
+        posix_spawn(&pid, argStrings[0].c_str(), &actions, nullptr, argv.data(), envp.data());
     posix_spawn_file_actions_destroy(&actions);
     if (spawned != 0) {
         result.startError = "cannot start " + program + ": " + std::strerror(spawned);
         return result;
     }
 
+    if (signalNumber != 0) {
+        int const tries = 30 * 50;
+        int tried = 0;
+        while (tried < tries && !ready()) {
+            usleep(20000);
+            ++tried;
+        }
+        if (tried == tries) {
+            result.startError = "the child was never ready for the signal; killed";
+            signalNumber = SIGKILL;
+        }
+        kill(pid, signalNumber);
+    }
+
     int status = 0;
     pid_t waited = 0;
-    do {
-        waited = waitpid(pid, &status, 0);
-    } while (waited < 0 && errno == EINTR);
+    bool reaped = false;
+    if (timeLimit > 0) {
+        // Polled every millisecond: a child that ends is seen at once, one
+        // that hangs is killed at the limit.
+        auto const deadline = std::chrono::steady_clock::now() +
+                              std::chrono::duration_cast<std::chrono::steady_clock::duration>(
+                                  std::chrono::duration<double>(timeLimit));
+        for (;;) {
+            waited = waitpid(pid, &status, WNOHANG);
+            if (waited == pid) {
+                reaped = true;
+                break;
+            }
+            if (waited < 0 && errno != EINTR) {
+                break;
+            }
+            if (std::chrono::steady_clock::now() >= deadline) {
+                result.timedOut = true;
+                kill(pid, SIGKILL);
+                break;
+            }
+            usleep(1000);
+        }
+    }
+    if (!reaped) {
+        do {
+            waited = waitpid(pid, &status, 0);
+        } while (waited < 0 && errno == EINTR);
+    }
     if (waited < 0) {
         result.startError = std::string("cannot wait for the child: ") + std::strerror(errno);
         return result;
@@ -117,6 +163,24 @@ RunResult runProgram(std::string const& program, std::vector<std::string> const&
     result.out = smbiostest::fileText(outPath);
     result.err = smbiostest::fileText(errPath);
     return result;
+}
+
+}  // namespace
+
+RunResult runProgram(std::string const& program, std::vector<std::string> const& args,
+                     Environment const& environment) {
+    return runChild(program, args, environment, 0, std::function<bool()>());
+}
+
+RunResult runProgramAndSignal(std::string const& program, std::vector<std::string> const& args,
+                              Environment const& environment, int signalNumber,
+                              std::function<bool()> const& ready) {
+    return runChild(program, args, environment, signalNumber, ready);
+}
+
+RunResult runProgramWithin(std::string const& program, std::vector<std::string> const& args,
+                           Environment const& environment, double seconds) {
+    return runChild(program, args, environment, 0, std::function<bool()>(), seconds);
 }
 
 RunResult runHost(std::vector<std::string> const& args, Environment const& environment) {

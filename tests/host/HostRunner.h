@@ -3,6 +3,7 @@
 // it to run smbios-inventory; it serves any test that runs a built program.
 #pragma once
 
+#include <functional>
 #include <map>
 #include <string>
 #include <vector>
@@ -18,6 +19,8 @@ struct RunResult {
     std::string err;
     // Why the child could not be started; empty when it was.
     std::string startError;
+    // The child ran past its time limit and was killed (runProgramWithin).
+    bool timedOut = false;
 };
 
 // Changes to the environment of the child: variables to set (or replace)
@@ -41,6 +44,18 @@ std::string hostPath();
 // for it to end.
 RunResult runProgram(std::string const& program, std::vector<std::string> const& args,
                      Environment const& environment = Environment());
+
+// Runs program with args, waits until ready() says so (it is asked every
+// 20 ms, for at most 30 s), sends it the signal and waits for it to end.
+// When ready() never says so, the child is killed and startError says why.
+RunResult runProgramAndSignal(std::string const& program, std::vector<std::string> const& args,
+                              Environment const& environment, int signalNumber,
+                              std::function<bool()> const& ready);
+
+// Runs program with args; kills it (SIGKILL) and sets timedOut when it runs
+// longer than `seconds`.
+RunResult runProgramWithin(std::string const& program, std::vector<std::string> const& args,
+                           Environment const& environment, double seconds);
 
 // Runs the built smbios-inventory.
 RunResult runHost(std::vector<std::string> const& args,

@@ -45,16 +45,6 @@ size_t countOccurrences(std::string const& text, std::string const& part) {
     return count;
 }
 
-// The names of the entries of a folder.
-std::vector<std::string> folderEntries(std::string const& folder) {
-    std::vector<std::string> names;
-    std::error_code error;
-    for (auto const& entry : std::filesystem::directory_iterator(folder, error)) {
-        names.push_back(entry.path().filename().string());
-    }
-    return names;
-}
-
 class HostTest : public ::testing::Test {
 protected:
     void SetUp() override {
@@ -378,7 +368,7 @@ TEST_F(HostTest, DumpWithDataDirExitsTwo) {
     smbiostest::writeFile(dump, "<SHOWSMBIOS>\n</SHOWSMBIOS>\n");
     expectUsageError({"--plugin", fakePlugin(), "--dump", dump, "--data-dir", folder.path()},
                      "--data-dir");
-    EXPECT_EQ(folderEntries(folder.path()), std::vector<std::string>{"smbios.txt"});
+    EXPECT_EQ(smbiostest::folderEntries(folder.path()), std::vector<std::string>{"smbios.txt"});
 }
 
 TEST_F(HostTest, BadLogLevelExitsTwo) {
@@ -437,7 +427,7 @@ TEST_F(HostTest, FromBinWithDumpOrDataDirExitsTwo) {
                          excluded);
     }
     // Nothing was written beside the file.
-    EXPECT_EQ(folderEntries(folder.path()), std::vector<std::string>{"machine.bin"});
+    EXPECT_EQ(smbiostest::folderEntries(folder.path()), std::vector<std::string>{"machine.bin"});
 }
 
 TEST_F(HostTest, MissingFromBinFileExitsTwo) {
@@ -560,8 +550,8 @@ TEST_F(HostTest, DumpRunsOnACopyInAPrivateDataDirThatIsRemovedAfterwards) {
 
     // Gone after the run; the real data directory was never touched.
     EXPECT_FALSE(std::filesystem::exists(dir)) << dir;
-    EXPECT_TRUE(folderEntries(temporary.path()).empty());
-    EXPECT_TRUE(folderEntries(realData.path()).empty());
+    EXPECT_TRUE(smbiostest::folderEntries(temporary.path()).empty());
+    EXPECT_TRUE(smbiostest::folderEntries(realData.path()).empty());
     EXPECT_EQ(smbiostest::fileText(dump), content);
 }
 
@@ -569,14 +559,14 @@ TEST_F(HostTest, DumpTemporaryFolderIsRemovedWhenThePluginFails) {
     smbiostest::TempDir input;
     smbiostest::TempDir temporary;
     std::string const dump = input.file("machine.txt");
-    smbiostest::writeFile(dump, "<SHOWSMBIOS>\n</SHOWSMBIOS>\n");
+    smbiostest::writeFile(dump, "<SHOWSMBIOS>\n<EPHEADER>\n5F534D5F\n</EPHEADER>\n</SHOWSMBIOS>\n");
 
     Environment environment;
     environment.set["TMPDIR"] = temporary.path();
     environment.set["FAKE_MI_FAIL"] = "1";
     RunResult run = hosttest::runHost({"--plugin", fakePlugin(), "--dump", dump}, environment);
     EXPECT_EQ(run.exitStatus, 1) << hosttest::describe(run);
-    EXPECT_TRUE(folderEntries(temporary.path()).empty());
+    EXPECT_TRUE(smbiostest::folderEntries(temporary.path()).empty());
 }
 
 TEST_F(HostTest, DataDirAndCodeDirReachThePlugin) {

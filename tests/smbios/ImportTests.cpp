@@ -540,3 +540,33 @@ TEST(SmBiosByteHex, EmptyTextAppendsNothing) {
     EXPECT_EQ(SD::byteHex("", bytes), 0);
     EXPECT_EQ(bytes, (Bytes{0x42}));
 }
+
+// ---- odd hex runs: the host refuses a file that has one --------------------
+
+TEST(SmBiosOddHexRun, EvenRunsGiveZero) {
+    EXPECT_EQ(SD::oddHexRun({"0102", "<SIZE>", "3", "</SIZE>", "AABB", "</SHOWSMBIOS>"}), 0u);
+    EXPECT_EQ(SD::oddHexRun({}), 0u);
+}
+
+TEST(SmBiosOddHexRun, GivesTheDigitCountOfTheFirstOddRun) {
+    EXPECT_EQ(SD::oddHexRun({"0102", "ABC", "12345", "</SHOWSMBIOS>"}), 3u);
+}
+
+TEST(SmBiosOddHexRun, SizeBlockContentIsNotTableText) {
+    EXPECT_EQ(SD::oddHexRun({"<SIZE>", "123", "</SIZE>", "0102", "</SHOWSMBIOS>"}), 0u);
+    // An unterminated size block swallows the rest, as readTables does.
+    EXPECT_EQ(SD::oddHexRun({"<SIZE>", "0102", "ABC"}), 0u);
+}
+
+TEST(SmBiosOddHexRun, NothingAfterTheEndTagOrABadDigitCounts) {
+    EXPECT_EQ(SD::oddHexRun({"0102", "</SHOWSMBIOS>", "ABC"}), 0u);
+    // readTables stops at the run with a bad digit: the table is empty anyway.
+    EXPECT_EQ(SD::oddHexRun({"01G2", "ABC", "</SHOWSMBIOS>"}), 0u);
+}
+
+TEST(SmBiosOddHexRun, AnOddRunReallyLosesItsLastDigit) {
+    // What the refusal protects against: byteHex drops the odd digit.
+    std::vector<unsigned char> bytes;
+    ASSERT_EQ(SD::byteHex("ABC", bytes), 0);
+    EXPECT_EQ(bytes, std::vector<unsigned char>{0xAB});
+}

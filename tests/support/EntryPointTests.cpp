@@ -91,6 +91,7 @@ TEST(TableStats, CountsStructuresAndFindsLargestOnBuiltTable) {
     smbiosdump::TableStats const stats = smbiosdump::tableStats(table.build());
     EXPECT_EQ(stats.count, 4);
     EXPECT_EQ(stats.maxSize, large.build().size());
+    EXPECT_FALSE(stats.cut);
 }
 
 TEST(TableStats, StopsAfterEndOfTableStructure) {
@@ -99,12 +100,14 @@ TEST(TableStats, StopsAfterEndOfTableStructure) {
     smbiosdump::TableStats const stats = smbiosdump::tableStats(table.build());
     EXPECT_EQ(stats.count, 2);
     EXPECT_EQ(stats.maxSize, 6);
+    EXPECT_FALSE(stats.cut) << "what follows the end-of-table structure is not read";
 }
 
 TEST(TableStats, CountsWholeTableWithoutEndOfTable) {
     TableBuilder table;
     table.add(Structure(0, 0)).add(Structure(1, 1).str("A")).add(Structure(2, 2));
     EXPECT_EQ(smbiosdump::tableStats(table.build()).count, 3);
+    EXPECT_FALSE(smbiosdump::tableStats(table.build()).cut);
 }
 
 TEST(TableStats, StopsBeforeUnterminatedStructure) {
@@ -113,18 +116,21 @@ TEST(TableStats, StopsBeforeUnterminatedStructure) {
     smbiosdump::TableStats const stats = smbiosdump::tableStats(table.build());
     EXPECT_EQ(stats.count, 1);
     EXPECT_EQ(stats.maxSize, 9);
+    EXPECT_TRUE(stats.cut);
 }
 
 TEST(TableStats, StopsBeforeStructureWhoseLengthPassesTheEnd) {
     TableBuilder table;
     table.add(Structure(0, 0)).add(Structure(1, 1).byte(0).length(0x40));
     EXPECT_EQ(smbiosdump::tableStats(table.build()).count, 1);
+    EXPECT_TRUE(smbiosdump::tableStats(table.build()).cut);
 }
 
 TEST(TableStats, StopsAtLengthBelowFour) {
     TableBuilder table;
     table.add(Structure(0, 0)).add(Structure(1, 1).length(3)).add(Structure(2, 2));
     EXPECT_EQ(smbiosdump::tableStats(table.build()).count, 1);
+    EXPECT_TRUE(smbiosdump::tableStats(table.build()).cut);
 }
 
 TEST(TableStats, EmptyAndTinyTablesCountNothing) {
@@ -132,4 +138,18 @@ TEST(TableStats, EmptyAndTinyTablesCountNothing) {
     EXPECT_EQ(smbiosdump::tableStats({0x00, 0x04, 0x00}).count, 0);
     EXPECT_EQ(smbiosdump::tableStats({0x00, 0x04, 0x00, 0x00, 0x00}).count, 0);
     EXPECT_EQ(smbiosdump::tableStats({0x00, 0x04, 0x00, 0x00, 0x00, 0x00}).count, 1);
+    EXPECT_FALSE(smbiosdump::tableStats({}).cut);
+    EXPECT_TRUE(smbiosdump::tableStats({0x00, 0x04, 0x00}).cut);
+    EXPECT_TRUE(smbiosdump::tableStats({0x00, 0x04, 0x00, 0x00, 0x00}).cut);
+    EXPECT_FALSE(smbiosdump::tableStats({0x00, 0x04, 0x00, 0x00, 0x00, 0x00}).cut);
+}
+
+TEST(TableStats, OneToThreeBytesAfterTheLastStructureAreACutOne) {
+    std::vector<uint8_t> table = TableBuilder().add(Structure(0, 0).str("ok")).build();
+    for (uint8_t extra = 1; extra <= 3; ++extra) {
+        table.push_back(0x01);
+        smbiosdump::TableStats const stats = smbiosdump::tableStats(table);
+        EXPECT_EQ(stats.count, 1) << int(extra);
+        EXPECT_TRUE(stats.cut) << int(extra);
+    }
 }

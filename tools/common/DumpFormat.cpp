@@ -364,10 +364,12 @@ TableStats tableStats(std::vector<uint8_t> const& table) {
     TableStats stats;
     size_t const size = table.size();
     size_t pos = 0;
+    bool ended = false;
     while (size - pos >= 4) {
         uint8_t const type = table[pos];
         uint8_t const length = table[pos + 1];
         if (length < 4 || length > size - pos) {
+            stats.cut = true;
             break;
         }
         // The string set ends with two NULs; with no strings those two NULs
@@ -377,6 +379,7 @@ TableStats tableStats(std::vector<uint8_t> const& table) {
             ++end;
         }
         if (end + 1 >= size) {
+            stats.cut = true;
             break;
         }
         end += 2;
@@ -389,8 +392,13 @@ TableStats tableStats(std::vector<uint8_t> const& table) {
         }
         pos = end;
         if (type == 127) {
+            ended = true;
             break;
         }
+    }
+    // One to three bytes after the last whole structure start one more.
+    if (!ended && pos < size && size - pos < 4) {
+        stats.cut = true;
     }
     return stats;
 }

@@ -52,13 +52,15 @@ std::vector<uint8_t> makeDmiEntryPoint(uint8_t bcdRevision, uint16_t tableLength
 struct TableStats {
     uint16_t count = 0;    // structures, up to and including the end-of-table one
     uint16_t maxSize = 0;  // the largest structure: formatted area plus string set
+    bool cut = false;      // the data ends inside a structure, or at a malformed one
 };
 
 // Walks the structures of a table from its first byte. The walk ends after
 // the end-of-table structure (type 127), at the end of the data, or at the
 // first structure that is malformed (length below 4) or truncated (its
 // formatted area or string set runs past the end); such a structure is not
-// counted. Both results saturate at 0xFFFF.
+// counted, and the walk says the table is cut. Both counts saturate at
+// 0xFFFF.
 TableStats tableStats(std::vector<uint8_t> const& table);
 
 struct DumpImage {
