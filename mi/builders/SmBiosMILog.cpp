@@ -27,8 +27,11 @@ std::string bytesText(std::vector<unsigned char> const& bytes) {
 
 }  // namespace
 
-// One event-log node per System Event Log structure under the given parent
-// (every firmware node, and every BMC node, gets its own).
+// One event-log node per System Event Log structure under the given parent.
+// Kept: every firmware node and every BMC node gets its own node for the same
+// structure, so a machine with three firmware images shows the log three
+// times; the inventories agents have stored hold a log under each firmware
+// node, and dropping the repeats would read as logs removed.
 void SmBiosMI::makeLogNodes(TableLists tables, unsigned int parentId) {
     SMBIOS_DETAIL(logger, "make"
                               << "Log"

@@ -12,6 +12,8 @@ QNLog::QNLogger logger("Quillon.IC.MI.SmBiosMI.SmBiosMIPlnr");
 unsigned char const HANDLE = 0x02;
 unsigned char const MANUFACTURER = 0x04;
 unsigned char const PRODUCT = 0x05;
+// Kept: the Version string (0x06) is deliberately not read; the planar nodes
+// that agents have stored carry no version, and adding one would change them.
 unsigned char const SERIAL = 0x07;
 unsigned char const ASSET_TAG = 0x08;
 unsigned char const FEATURE_FLAGS = 0x09;
@@ -22,7 +24,9 @@ unsigned char const CONTAINED_COUNT = 0x0E;
 unsigned int const CONTAINED_HANDLES = 0x0F;
 
 // Which baseboard becomes the planar: the first of these board types found
-// in the list, in this order of preference.
+// in the list, in this order of preference. Kept: the preference order, not
+// the list order, decides (a motherboard listed after a server blade wins),
+// and the other baseboards get no node; the agent expects one planar.
 unsigned int const BOARD_PRIORITY[] = {0x0A, 0x03, 0x0B, 0x0C, 0x06, 0x02, 0x09,
                                        0x05, 0x08, 0x07, 0x04, 0x0D, 0x01};
 
@@ -71,6 +75,8 @@ void SmBiosMI::makePlanarNodes(TableLists tables, unsigned int parentNodeId) {
             node->setStatus(1);
             node->setDescription("Planar");
             unsigned int const planarId = node->getNodeId();
+            // Kept: this order differs from the one with a baseboard below;
+            // node ids, and so the agent's stored inventory, follow it.
             makeCpuNodes(tables, planarId);
             makeSlotNodes(tables, planarId);
             makeConnectorNodes(tables, planarId);
