@@ -195,7 +195,7 @@ std::vector<uint8_t> uuidTable() {
 // makeComputerNodes
 
 TEST(ComputerSystemBuilder, FullStructureGivesOneComputerSystemNodeWithEveryProperty) {
-    SKIP_IF_TABLE_ACQUIRED();
+    REQUIRE_FRESH_TABLE();
     TableBuilder table;
     table.add(systemInformation(0x0100));
     table.endOfTable(0xFEFF);
@@ -284,7 +284,7 @@ TEST(ComputerSystemBuilder, NoSystemInformationStructureMakesNoNodeAndNothingBel
 
 TEST(ComputerSystemBuilder,
      TwoSystemStructuresWithoutBaseboardGetIndexesZeroAndOneEachWithItsOwnChassis) {
-    SKIP_IF_TABLE_ACQUIRED();
+    REQUIRE_FRESH_TABLE();
     TableBuilder table;
     table.add(systemInformation(0x0100, "First [1111AB1]"));
     table.add(systemInformation(0x0101, "Second [2222AB2]"));
@@ -323,7 +323,7 @@ TEST(ComputerSystemBuilder,
 }
 
 TEST(ComputerSystemBuilder, WithBaseboardOnlyTheFirstOfTwoSystemStructuresGetsANode) {
-    SKIP_IF_TABLE_ACQUIRED();
+    REQUIRE_FRESH_TABLE();
     TableBuilder table;
     table.add(systemInformation(0x0100, "First [1111AB1]"));
     table.add(systemInformation(0x0101, "Second [2222AB2]"));
@@ -347,7 +347,7 @@ TEST(ComputerSystemBuilder, WithBaseboardOnlyTheFirstOfTwoSystemStructuresGetsAN
 }
 
 TEST(ComputerSystemBuilder, Smbios21StructureOfLength0x19LacksSkuAndFamily) {
-    SKIP_IF_TABLE_ACQUIRED();
+    REQUIRE_FRESH_TABLE();
     TableBuilder table;
     table.add(Structure(1, 0x0100)
                   .str("Corvane")
@@ -427,7 +427,7 @@ TEST(ComputerSystemBuilder, StructureTooShortForTheUuidGetsNoUuidProperty) {
 }
 
 TEST(ComputerSystemBuilder, StructureEndingRightAfterTheUuidGetsTheUuidButNoWakeUpType) {
-    SKIP_IF_TABLE_ACQUIRED();
+    REQUIRE_FRESH_TABLE();
     TableBuilder table;
     table.add(Structure(1, 0x0100)
                   .str("Corvane")
@@ -449,7 +449,7 @@ TEST(ComputerSystemBuilder, StructureEndingRightAfterTheUuidGetsTheUuidButNoWake
 }
 
 TEST(ComputerSystemBuilder, Smbios24TableSetsTheUuidAsFormatted) {
-    SKIP_IF_TABLE_ACQUIRED();
+    REQUIRE_FRESH_TABLE();
     TableBuilder table;
     table.add(systemInformation(0x0100));
     table.endOfTable(0xFEFF);
@@ -466,7 +466,7 @@ TEST(ComputerSystemBuilder, Smbios24TableSetsTheUuidAsFormatted) {
 }
 
 TEST(ComputerSystemBuilder, Smbios26TableSetsTheUuidWithItsFirstThreeFieldsByteReversed) {
-    SKIP_IF_TABLE_ACQUIRED();
+    REQUIRE_FRESH_TABLE();
     TableBuilder table;
     table.add(systemInformation(0x0100));
     table.endOfTable(0xFEFF);
@@ -482,7 +482,7 @@ TEST(ComputerSystemBuilder, Smbios26TableSetsTheUuidWithItsFirstThreeFieldsByteR
 }
 
 TEST(ComputerSystemBuilder, ProductWithoutPartNumberAndEmptyTextsAreStillSet) {
-    SKIP_IF_TABLE_ACQUIRED();
+    REQUIRE_FRESH_TABLE();
     TableBuilder table;
     table.add(Structure(1, 0x0100)
                   .str("")
@@ -509,7 +509,7 @@ TEST(ComputerSystemBuilder, ProductWithoutPartNumberAndEmptyTextsAreStillSet) {
 }
 
 TEST(ComputerSystemBuilder, GroupMembersAreWrittenToStandardOutput) {
-    SKIP_IF_TABLE_ACQUIRED();
+    REQUIRE_FRESH_TABLE();
     TableBuilder table;
     table.add(systemInformation(0x0100));
     table.add(group(0x0E00, "Cluster", {{3, 0x0300}, {1, 0x0100}, {4, 0x0400}}));
@@ -536,7 +536,7 @@ TEST(ComputerSystemBuilder, GroupMembersAreWrittenToStandardOutput) {
 }
 
 TEST(ComputerSystemBuilder, WithBaseboardTheGroupLookupSeesTheEmptiedListsAndWritesNothing) {
-    SKIP_IF_TABLE_ACQUIRED();
+    REQUIRE_FRESH_TABLE();
     TableBuilder table;
     table.add(systemInformation(0x0100));
     table.add(chassis(0x0300, 0x17));
@@ -559,7 +559,7 @@ TEST(ComputerSystemBuilder, WithBaseboardTheGroupLookupSeesTheEmptiedListsAndWri
 }
 
 TEST(ComputerSystemBuilder, TimeZoneOffsetIsStoredAtBuildTime) {
-    SKIP_IF_TABLE_ACQUIRED();
+    REQUIRE_FRESH_TABLE();
     TableBuilder table;
     table.add(systemInformation(0x0100));
     table.endOfTable(0xFEFF);
@@ -749,7 +749,7 @@ TEST(ComputerSystemPartNumber, EntryIsLogged) {
 // 2.60, and from 3.0 on.
 
 TEST(ComputerSystemUuid, Version24KeepsTheTextAsFormatted) {
-    SKIP_IF_TABLE_ACQUIRED();
+    REQUIRE_FRESH_TABLE();
     OverrideTable override(uuidTable(), 2, 4);
     smbiostest::LogCapture log;
     EXPECT_EQ(UUID_AS_FORMATTED, rewritten(UUID_AS_FORMATTED));
@@ -761,13 +761,13 @@ TEST(ComputerSystemUuid, Version24KeepsTheTextAsFormatted) {
 }
 
 TEST(ComputerSystemUuid, Version25KeepsTheTextAsFormatted) {
-    SKIP_IF_TABLE_ACQUIRED();
+    REQUIRE_FRESH_TABLE();
     OverrideTable override(uuidTable(), 2, 5);
     EXPECT_EQ(UUID_AS_FORMATTED, rewritten(UUID_AS_FORMATTED));
 }
 
 TEST(ComputerSystemUuid, Version26ReordersTheFirstThreeFields) {
-    SKIP_IF_TABLE_ACQUIRED();
+    REQUIRE_FRESH_TABLE();
     OverrideTable override(uuidTable(), 2, 6);
     smbiostest::LogCapture log;
     EXPECT_EQ(UUID_REORDERED, rewritten(UUID_AS_FORMATTED));
@@ -776,49 +776,49 @@ TEST(ComputerSystemUuid, Version26ReordersTheFirstThreeFields) {
 }
 
 TEST(ComputerSystemUuid, Version27ReordersTheFirstThreeFields) {
-    SKIP_IF_TABLE_ACQUIRED();
+    REQUIRE_FRESH_TABLE();
     OverrideTable override(uuidTable(), 2, 7);
     EXPECT_EQ(UUID_REORDERED, rewritten(UUID_AS_FORMATTED));
 }
 
 TEST(ComputerSystemUuid, Version28ReordersTheFirstThreeFields) {
-    SKIP_IF_TABLE_ACQUIRED();
+    REQUIRE_FRESH_TABLE();
     OverrideTable override(uuidTable(), 2, 8);
     EXPECT_EQ(UUID_REORDERED, rewritten(UUID_AS_FORMATTED));
 }
 
 TEST(ComputerSystemUuid, Version29KeepsTheTextAsFormatted) {
-    SKIP_IF_TABLE_ACQUIRED();
+    REQUIRE_FRESH_TABLE();
     OverrideTable override(uuidTable(), 2, 9);
     EXPECT_EQ(UUID_AS_FORMATTED, rewritten(UUID_AS_FORMATTED));
 }
 
 TEST(ComputerSystemUuid, Version260KeepsTheTextAsFormatted) {
-    SKIP_IF_TABLE_ACQUIRED();
+    REQUIRE_FRESH_TABLE();
     OverrideTable override(uuidTable(), 2, 60);
     EXPECT_EQ(UUID_AS_FORMATTED, rewritten(UUID_AS_FORMATTED));
 }
 
 TEST(ComputerSystemUuid, Version261ReordersTheFirstThreeFields) {
-    SKIP_IF_TABLE_ACQUIRED();
+    REQUIRE_FRESH_TABLE();
     OverrideTable override(uuidTable(), 2, 61);
     EXPECT_EQ(UUID_REORDERED, rewritten(UUID_AS_FORMATTED));
 }
 
 TEST(ComputerSystemUuid, Version30ReordersTheFirstThreeFields) {
-    SKIP_IF_TABLE_ACQUIRED();
+    REQUIRE_FRESH_TABLE();
     OverrideTable override(uuidTable(), 3, 0);
     EXPECT_EQ(UUID_REORDERED, rewritten(UUID_AS_FORMATTED));
 }
 
 TEST(ComputerSystemUuid, Version1KeepsTheTextAsFormatted) {
-    SKIP_IF_TABLE_ACQUIRED();
+    REQUIRE_FRESH_TABLE();
     OverrideTable override(uuidTable(), 1, 9);
     EXPECT_EQ(UUID_AS_FORMATTED, rewritten(UUID_AS_FORMATTED));
 }
 
 TEST(ComputerSystemUuid, RewriteStoresTheTableVersionInThePlugIn) {
-    SKIP_IF_TABLE_ACQUIRED();
+    REQUIRE_FRESH_TABLE();
     OverrideTable override(uuidTable(), 3, 2);
     TestMI mi;
     EXPECT_EQ(0u, mi.getSmBiosMajorVersion());
@@ -829,20 +829,20 @@ TEST(ComputerSystemUuid, RewriteStoresTheTableVersionInThePlugIn) {
 }
 
 TEST(ComputerSystemUuid, TextOf19CharactersIsNotRewritten) {
-    SKIP_IF_TABLE_ACQUIRED();
+    REQUIRE_FRESH_TABLE();
     OverrideTable override(uuidTable(), 3, 0);
     EXPECT_EQ("00112233-4455-6677-", rewritten("00112233-4455-6677-"));
     EXPECT_EQ("", rewritten(""));
 }
 
 TEST(ComputerSystemUuid, TextOf20CharactersIsRewritten) {
-    SKIP_IF_TABLE_ACQUIRED();
+    REQUIRE_FRESH_TABLE();
     OverrideTable override(uuidTable(), 3, 0);
     EXPECT_EQ("33221100-5544-7766-8", rewritten("00112233-4455-6677-8"));
 }
 
 TEST(ComputerSystemUuid, LowerCaseTextIsRewrittenTheSameWay) {
-    SKIP_IF_TABLE_ACQUIRED();
+    REQUIRE_FRESH_TABLE();
     OverrideTable override(uuidTable(), 2, 7);
     EXPECT_EQ("d4c3b2a1-f6e5-0807-090a-0b0c0d0e0f10",
               rewritten("a1b2c3d4-e5f6-0708-090a-0b0c0d0e0f10"));

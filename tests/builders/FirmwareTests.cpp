@@ -588,10 +588,7 @@ TEST(FirmwareBiosNodes, BracketedVersionSetsEveryProperty) {
 }
 
 TEST(FirmwareBiosNodes, SmbiosVersionComesFromTheAcquiredTable) {
-    if (frametest::tableAlreadyAcquired()) {
-        GTEST_SKIP() << "the SMBIOS table of this process was acquired by an earlier test; run "
-                        "each test case in a process of its own (ctest)";
-    }
+    REQUIRE_FRESH_TABLE();
     TableBuilder builder;
     builder.add(biosInformation(0x0000, "Corvane", "C1 [B1-1.0]", "03/14/2021"));
     builder.endOfTable(0xFEFF);

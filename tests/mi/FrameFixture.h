@@ -285,12 +285,16 @@ inline std::string firstLogged(std::string const& text) {
 // every test case in a process of its own.
 inline bool tableAlreadyAcquired() { return SD::SMBIOS_CLASS::_smbios != nullptr; }
 
-// Skips the test when an earlier test of this process acquired the table.
-#define SKIP_IF_TABLE_ACQUIRED()                                                           \
+// Fails the test when an earlier test of this process acquired the table:
+// it could not see its own table, and a skip would hide that it did not run.
+// Run the test binary through ctest, or one test case at a time
+// (--gtest_filter).
+#define REQUIRE_FRESH_TABLE()                                                              \
     do {                                                                                   \
         if (frametest::tableAlreadyAcquired()) {                                           \
-            GTEST_SKIP() << "the SMBIOS table of this process was acquired by an earlier " \
-                            "test; run each test case in a process of its own (ctest)";    \
+            GTEST_FAIL() << "the SMBIOS table of this process was acquired by an earlier " \
+                            "test; run each test case in a process of its own (ctest, or " \
+                            "--gtest_filter with one test)";                               \
         }                                                                                  \
     } while (0)
 

@@ -101,7 +101,7 @@ TEST(FrameOpenMI, CalledTwiceHandsOutTheSameInterfaceAndErrorRecord) {
 }
 
 TEST(FrameInitialize, EmptyTableLogsSizeZeroAndStillMakesInterfaceAndRootNodes) {
-    SKIP_IF_TABLE_ACQUIRED();
+    REQUIRE_FRESH_TABLE();
     // A table section of two zero bytes: too short for any structure.
     OverrideTable override({0x00, 0x00}, 2, 7);
     smbiostest::LogCapture log;
@@ -133,7 +133,7 @@ TEST(FrameInitialize, EmptyTableLogsSizeZeroAndStillMakesInterfaceAndRootNodes) 
 }
 
 TEST(FrameInitialize, ZeroRevisionSetsNoProperty307AndLogsIt) {
-    SKIP_IF_TABLE_ACQUIRED();
+    REQUIRE_FRESH_TABLE();
     // The acquisition stores a revision of 0 whatever the entry point says.
     OverrideTable override(smallTable(), 3, 2);
     smbiostest::LogCapture log;
@@ -154,7 +154,7 @@ TEST(FrameInitialize, ZeroRevisionSetsNoProperty307AndLogsIt) {
 }
 
 TEST(FrameInitialize, TwoStructuresOfOneTypeAreListedInTableOrderWithTheirLengths) {
-    SKIP_IF_TABLE_ACQUIRED();
+    REQUIRE_FRESH_TABLE();
     // Written with the larger handle first; the acquired table is in
     // ascending handle order, and that is the order of the type's list.
     TableBuilder table;
@@ -200,7 +200,7 @@ TEST(FrameInitialize, TwoStructuresOfOneTypeAreListedInTableOrderWithTheirLength
 }
 
 TEST(FrameInitialize, NodeIdsFollowCreationOrderFromTheInterfaceNode) {
-    SKIP_IF_TABLE_ACQUIRED();
+    REQUIRE_FRESH_TABLE();
     TableBuilder table;
     table.add(Structure(0, 0x0000)
                   .str("Corvane")
@@ -237,7 +237,7 @@ TEST(FrameInitialize, NodeIdsFollowCreationOrderFromTheInterfaceNode) {
 }
 
 TEST(FrameInitialize, ReturnsStatusZeroAndCopiesItIntoTheErrorRecord) {
-    SKIP_IF_TABLE_ACQUIRED();
+    REQUIRE_FRESH_TABLE();
     OverrideTable override(smallTable(), 2, 6);
     smbiostest::LogCapture log;
     IC::ManagementInterface* mi = nullptr;
@@ -260,7 +260,7 @@ TEST(FrameInitialize, ReturnsStatusZeroAndCopiesItIntoTheErrorRecord) {
 }
 
 TEST(FrameInitialize, SecondInitializeRebuildsTheNodeList) {
-    SKIP_IF_TABLE_ACQUIRED();
+    REQUIRE_FRESH_TABLE();
     OverrideTable override(smallTable(), 2, 6);
     smbiostest::LogCapture log;
     IC::ManagementInterface* mi = openPlugin();
