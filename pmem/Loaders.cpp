@@ -9,8 +9,8 @@
 #include <cstring>
 #include <utility>
 
-#include "DumpFormat.h"
 #include "SD/RegularFile.h"
+#include "format/EntryPoint.h"
 
 namespace pmem {
 
@@ -60,36 +60,12 @@ bool startsWith(std::vector<unsigned char> const& bytes, char const* anchor) {
     return bytes.size() >= n && std::memcmp(bytes.data(), anchor, n) == 0;
 }
 
-uint32_t dword(std::vector<unsigned char> const& bytes, size_t at) {
-    uint32_t value = 0;
-    for (size_t i = 0; i < 4; ++i) {
-        value |= static_cast<uint32_t>(bytes[at + i]) << (8 * i);
-    }
-    return value;
-}
-
-uint64_t qword(std::vector<unsigned char> const& bytes, size_t at) {
-    return static_cast<uint64_t>(dword(bytes, at)) |
-           (static_cast<uint64_t>(dword(bytes, at + 4)) << 32);
-}
-
-void putDword(std::vector<unsigned char>& bytes, size_t at, uint32_t value) {
-    for (size_t i = 0; i < 4; ++i) {
-        bytes[at + i] = static_cast<unsigned char>((value >> (8 * i)) & 0xFF);
-    }
-}
-
 // Sets bytes[at] so that the 8-bit sum of bytes[begin, end) is zero; `at`
 // lies in that range and the range is cut at the end of the bytes (what the
 // entry point lacks is presented as zero, which adds nothing).
 void setChecksum(std::vector<unsigned char>& bytes, size_t at, size_t begin, size_t end) {
-    end = std::min(end, bytes.size());
     bytes[at] = 0;
-    unsigned char sum = 0;
-    for (size_t i = begin; i < end; ++i) {
-        sum = static_cast<unsigned char>(sum + bytes[i]);
-    }
-    bytes[at] = static_cast<unsigned char>(0x100 - sum);
+    bytes[at] = smbiosformat::checksumFor(bytes, begin, std::min(end, bytes.size()));
 }
 
 // Whether a table of `size` bytes (size >= 1) can be served at `address`:
@@ -207,17 +183,17 @@ bool loadSysfsTables(std::string const& folder, RegionMemory& memory) {
     if (startsWith(entryPoint, "_SM3_")) {
         // 0x06 length, 0x07 major, 0x08 minor, 0x0C maximum table size,
         // 0x10 the 64-bit table address.
-        if (entryPoint.size() < smbiosdump::SM3_ENTRY_POINT_SIZE ||
-            entryPoint[6] < smbiosdump::SM3_ENTRY_POINT_SIZE || table.size() > 0xFFFF) {
+        if (entryPoint.size() < smbiosformat::SM3_ENTRY_POINT_SIZE ||
+            entryPoint[6] < smbiosformat::SM3_ENTRY_POINT_SIZE || table.size() > 0xFFFF) {
             return false;
         }
-        uint64_t const stated = qword(entryPoint, 0x10);
+        uint64_t const stated = smbiosformat::getQword(entryPoint, 0x10);
         if (canServeAt(stated, table.size(), std::min(below4GiB, lastAddress),
-                       smbiosdump::SM_ENTRY_POINT_SIZE)) {
+                       smbiosformat::SM_ENTRY_POINT_SIZE)) {
             address = static_cast<unsigned long>(stated);
         }
-        smbiosdump::TableStats const stats = smbiosdump::tableStats(table);
-        presented = smbiosdump::makeSmEntryPoint(
+        smbiosformat::TableStats const stats = smbiosformat::tableStats(table);
+        presented = smbiosformat::makeSmEntryPoint(
             entryPoint[7], entryPoint[8], static_cast<uint16_t>(table.size()),
             static_cast<uint32_t>(address), stats.count, stats.maxSize);
     } else if (startsWith(entryPoint, "_SM_")) {
@@ -227,26 +203,26 @@ bool loadSysfsTables(std::string const& folder, RegionMemory& memory) {
             return false;
         }
         presented = entryPoint;
-        uint32_t const stated = dword(presented, 0x18);
+        uint32_t const stated = smbiosformat::getDword(presented, 0x18);
         if (canServeAt(stated, table.size(), lastAddress, presented.size())) {
             address = static_cast<unsigned long>(stated);
         } else {
-            putDword(presented, 0x18, static_cast<uint32_t>(address));
+            smbiosformat::putDword(presented, 0x18, static_cast<uint32_t>(address));
             setChecksum(presented, 0x15, 0x10, 0x1F);
             setChecksum(presented, 0x04, 0, presented[5]);
         }
     } else if (startsWith(entryPoint, "_DMI_")) {
         // 15 bytes: 0x05 checksum, 0x08 the 32-bit table address.
-        if (entryPoint.size() < smbiosdump::DMI_ENTRY_POINT_SIZE) {
+        if (entryPoint.size() < smbiosformat::DMI_ENTRY_POINT_SIZE) {
             return false;
         }
         presented = entryPoint;
-        uint32_t const stated = dword(presented, 0x08);
+        uint32_t const stated = smbiosformat::getDword(presented, 0x08);
         if (canServeAt(stated, table.size(), lastAddress, presented.size())) {
             address = static_cast<unsigned long>(stated);
         } else {
-            putDword(presented, 0x08, static_cast<uint32_t>(address));
-            setChecksum(presented, 0x05, 0, smbiosdump::DMI_ENTRY_POINT_SIZE);
+            smbiosformat::putDword(presented, 0x08, static_cast<uint32_t>(address));
+            setChecksum(presented, 0x05, 0, smbiosformat::DMI_ENTRY_POINT_SIZE);
         }
     } else {
         return false;

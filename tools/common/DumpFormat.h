@@ -25,43 +25,22 @@
 #include <string>
 #include <vector>
 
+#include "format/EntryPoint.h"
+
 namespace smbiosdump {
 
-// Sizes of the entry points and the offset at which a --dump-bin image
-// holds its structure table.
-constexpr size_t SM_ENTRY_POINT_SIZE = 0x1F;
-constexpr size_t DMI_ENTRY_POINT_SIZE = 0x0F;
-constexpr size_t SM3_ENTRY_POINT_SIZE = 0x18;
-constexpr uint32_t DUMP_BIN_TABLE_OFFSET = 0x20;
-
-// The little-endian 16- and 32-bit values at offset; the caller keeps the
-// field inside bytes.
-uint16_t getWord(std::vector<uint8_t> const& bytes, size_t offset);
-uint32_t getDword(std::vector<uint8_t> const& bytes, size_t offset);
-
-// The 31-byte "_SM_" entry point, both checksums set, entry-point revision
-// 0. Its BCD revision is major*16+minor when both are below 10, else 0.
-std::vector<uint8_t> makeSmEntryPoint(uint8_t major, uint8_t minor, uint16_t tableLength,
-                                      uint32_t tableAddress, uint16_t structureCount,
-                                      uint16_t maxStructureSize);
-
-// The 15-byte legacy "_DMI_" entry point, checksum set.
-std::vector<uint8_t> makeDmiEntryPoint(uint8_t bcdRevision, uint16_t tableLength,
-                                       uint32_t tableAddress, uint16_t structureCount);
-
-struct TableStats {
-    uint16_t count = 0;    // structures, up to and including the end-of-table one
-    uint16_t maxSize = 0;  // the largest structure: formatted area plus string set
-    bool cut = false;      // the data ends inside a structure, or at a malformed one
-};
-
-// Walks the structures of a table from its first byte. The walk ends after
-// the end-of-table structure (type 127), at the end of the data, or at the
-// first structure that is malformed (length below 4) or truncated (its
-// formatted area or string set runs past the end); such a structure is not
-// counted, and the walk says the table is cut. Both counts saturate at
-// 0xFFFF.
-TableStats tableStats(std::vector<uint8_t> const& table);
+// The entry-point layouts, little-endian fields and table walk live in the
+// format library; the tools and tests keep calling them by these names.
+using smbiosformat::DMI_ENTRY_POINT_SIZE;
+using smbiosformat::DUMP_BIN_TABLE_OFFSET;
+using smbiosformat::getDword;
+using smbiosformat::getWord;
+using smbiosformat::makeDmiEntryPoint;
+using smbiosformat::makeSmEntryPoint;
+using smbiosformat::SM3_ENTRY_POINT_SIZE;
+using smbiosformat::SM_ENTRY_POINT_SIZE;
+using smbiosformat::TableStats;
+using smbiosformat::tableStats;
 
 struct DumpImage {
     std::vector<uint8_t> header;  // a "_SM_" or "_DMI_" entry point
