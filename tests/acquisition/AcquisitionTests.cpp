@@ -50,6 +50,7 @@ public:
         setInitialized_ = fn<void (*)(int)>("FakePMemSetInitialized");
         setOpenResult_ = fn<void (*)(int)>("FakePMemSetOpenResult");
         failRead_ = fn<void (*)(int)>("FakePMemFailRead");
+        setReadFailure_ = fn<void (*)(int)>("FakePMemSetReadFailure");
         setOpenDelay_ = fn<void (*)(int)>("FakePMemSetOpenDelay");
         counts_ = fn<void (*)(int*, int*, int*, int*)>("FakePMemCounts");
         reset_();
@@ -66,6 +67,7 @@ public:
     void setInitialized(int value) { setInitialized_(value); }
     void setOpenResult(int value) { setOpenResult_(value); }
     void failRead(int nth) { failRead_(nth); }
+    void setReadFailure(int code) { setReadFailure_(code); }
     void setOpenDelay(int ms) { setOpenDelay_(ms); }
     int opens() const { return count(0); }
     int closes() const { return count(1); }
@@ -88,6 +90,7 @@ private:
     void (*setInitialized_)(int) = nullptr;
     void (*setOpenResult_)(int) = nullptr;
     void (*failRead_)(int) = nullptr;
+    void (*setReadFailure_)(int) = nullptr;
     void (*setOpenDelay_)(int) = nullptr;
     void (*counts_)(int*, int*, int*, int*) = nullptr;
 };
@@ -245,6 +248,11 @@ TEST_F(Acquisition, PMemReadPassesTheLibraryResultThroughUnchanged) {
     EXPECT_EQ(pmem.read(buffer, 0x1000, 4), 0);
     EXPECT_EQ(buffer[3], 4);
     EXPECT_EQ(pmem.read(buffer, 0x2000, 4), -1);
+    // Not mapped to a failure value of its own: the library's code arrives.
+    fake.setReadFailure(-7);
+    EXPECT_EQ(pmem.read(buffer, 0x2000, 4), -7);
+    fake.setReadFailure(3);
+    EXPECT_EQ(pmem.read(buffer, 0x2000, 4), 3);
     EXPECT_EQ(pmem.search("\x03\x04", 0x1000, 0x1010, 1), 0x1002ul);
     EXPECT_EQ(pmem.search("\x09", 0x1000, 0x1010, 1), 0ul);
     EXPECT_TRUE(pmem.close());

@@ -18,7 +18,8 @@ struct FakeMemory {
     std::map<unsigned long, std::vector<unsigned char>> regions;
     int initialized = 1;
     int openResult = 1;
-    int failRead = 0;  // the n-th read (1-based) fails; 0: none
+    int failRead = 0;      // the n-th read (1-based) fails; 0: none
+    int readFailure = -1;  // what a failed read returns
     int openDelayMs = 0;
     int opens = 0;
     int closes = 0;
@@ -55,6 +56,7 @@ FAKE_EXPORT void FakePMemReset() {
     fake.initialized = 1;
     fake.openResult = 1;
     fake.failRead = 0;
+    fake.readFailure = -1;
     fake.openDelayMs = 0;
     fake.opens = fake.closes = fake.reads = fake.searches = 0;
 }
@@ -68,6 +70,9 @@ FAKE_EXPORT void FakePMemMap(unsigned long base, unsigned char const* bytes, uns
 FAKE_EXPORT void FakePMemSetInitialized(int value) { memory().initialized = value; }
 FAKE_EXPORT void FakePMemSetOpenResult(int value) { memory().openResult = value; }
 FAKE_EXPORT void FakePMemFailRead(int nth) { memory().failRead = nth; }
+// A distinctive result for failed reads, so that a test sees the library's
+// own code arrive rather than any failure value.
+FAKE_EXPORT void FakePMemSetReadFailure(int code) { memory().readFailure = code; }
 FAKE_EXPORT void FakePMemSetOpenDelay(int ms) { memory().openDelayMs = ms; }
 
 FAKE_EXPORT void FakePMemCounts(int* opens, int* closes, int* reads, int* searches) {
@@ -103,12 +108,12 @@ FAKE_EXPORT int PMemRead(void* buffer, unsigned long address, long count) {
     std::lock_guard<std::mutex> lock(fake.mutex);
     ++fake.reads;
     if (fake.failRead == fake.reads || count < 0) {
-        return -1;
+        return fake.readFailure;
     }
     unsigned char* out = static_cast<unsigned char*>(buffer);
     for (long i = 0; i < count; ++i) {
         if (!byteAt(fake, address + static_cast<unsigned long>(i), out[i])) {
-            return -1;
+            return fake.readFailure;
         }
     }
     return 0;
