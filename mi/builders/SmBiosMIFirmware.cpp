@@ -108,6 +108,9 @@ void SmBiosMI::parseFirmwareOemString(std::string const& s, MutableNode* node) {
 // processor image), then one per BIOS Information structure, named "UEFI"
 // when an OEM string says so; an event-log node hangs under each.
 void SmBiosMI::makeFirmwareNodes(TableLists tables, unsigned int parentId) {
+    // Kept: the entry and exit texts are composed from three pieces, as in
+    // every builder; the line written is the one text "makeFirmwareNodes
+    // entry" that log readers search for, and the pieces must stay joined.
     SMBIOS_DETAIL(logger, "make"
                               << "Firmware"
                               << "Nodes entry");
