@@ -51,6 +51,8 @@ public:
         setOpenResult_ = fn<void (*)(int)>("FakePMemSetOpenResult");
         failRead_ = fn<void (*)(int)>("FakePMemFailRead");
         setReadFailure_ = fn<void (*)(int)>("FakePMemSetReadFailure");
+        peekAfterReadAt_ = fn<void (*)(unsigned long)>("FakePMemPeekAfterReadAt");
+        peeked_ = fn<void (*)(long*, int*, int*)>("FakePMemPeeked");
         setOpenDelay_ = fn<void (*)(int)>("FakePMemSetOpenDelay");
         counts_ = fn<void (*)(int*, int*, int*, int*)>("FakePMemCounts");
         reset_();
@@ -68,6 +70,10 @@ public:
     void setOpenResult(int value) { setOpenResult_(value); }
     void failRead(int nth) { failRead_(nth); }
     void setReadFailure(int code) { setReadFailure_(code); }
+    void peekAfterReadAt(unsigned long address) { peekAfterReadAt_(address); }
+    // The count of the read at the peeked address and the two bytes after it
+    // in the caller's buffer (-1 each before such a read).
+    void peeked(long& count, int& tail0, int& tail1) const { peeked_(&count, &tail0, &tail1); }
     void setOpenDelay(int ms) { setOpenDelay_(ms); }
     int opens() const { return count(0); }
     int closes() const { return count(1); }
@@ -91,6 +97,8 @@ private:
     void (*setOpenResult_)(int) = nullptr;
     void (*failRead_)(int) = nullptr;
     void (*setReadFailure_)(int) = nullptr;
+    void (*peekAfterReadAt_)(unsigned long) = nullptr;
+    void (*peeked_)(long*, int*, int*) = nullptr;
     void (*setOpenDelay_)(int) = nullptr;
     void (*counts_)(int*, int*, int*, int*) = nullptr;
 };
@@ -324,8 +332,19 @@ TEST_F(Acquisition, TableReadOfLengthLGivesTheParserTwoMoreZeroBytes) {
     FakePMem fake(kFakeFull);
     fake.map(0xF0000, biosAreaWith(smEntryPoint(table, 2, 7), kSmAnchor));
     fake.map(kTableAddress, memoryBytes);
+    fake.peekAfterReadAt(kTableAddress);
     useCodeDir(kFakeFull);
     SD::SmBios smbios;
+    // What the acquisition hands the parser: L bytes read from memory into a
+    // buffer of L + 2 whose last two bytes are zero (the sanitizer build
+    // reports a buffer of only L bytes).
+    long count = 0;
+    int tail0 = 0;
+    int tail1 = 0;
+    fake.peeked(count, tail0, tail1);
+    EXPECT_EQ(count, static_cast<long>(table.size()));
+    EXPECT_EQ(tail0, 0);
+    EXPECT_EQ(tail1, 0);
     ASSERT_EQ(smbios.getTables().size(), 2u);
     SD::SmBios::Table const& board = smbios.getTables()[1];
     EXPECT_EQ(std::string(board.getString(1)), "Board");

@@ -20,6 +20,12 @@ struct FakeMemory {
     int openResult = 1;
     int failRead = 0;      // the n-th read (1-based) fails; 0: none
     int readFailure = -1;  // what a failed read returns
+    // A read at peekAddress records its count and the two bytes that follow
+    // the count in the caller's buffer (0: no peeking). Only for a caller
+    // whose buffer is known to be longer: the table read.
+    unsigned long peekAddress = 0;
+    long peekedCount = -1;
+    int peekedTail[2] = {-1, -1};
     int openDelayMs = 0;
     int opens = 0;
     int closes = 0;
@@ -57,6 +63,9 @@ FAKE_EXPORT void FakePMemReset() {
     fake.openResult = 1;
     fake.failRead = 0;
     fake.readFailure = -1;
+    fake.peekAddress = 0;
+    fake.peekedCount = -1;
+    fake.peekedTail[0] = fake.peekedTail[1] = -1;
     fake.openDelayMs = 0;
     fake.opens = fake.closes = fake.reads = fake.searches = 0;
 }
@@ -73,6 +82,16 @@ FAKE_EXPORT void FakePMemFailRead(int nth) { memory().failRead = nth; }
 // A distinctive result for failed reads, so that a test sees the library's
 // own code arrive rather than any failure value.
 FAKE_EXPORT void FakePMemSetReadFailure(int code) { memory().readFailure = code; }
+
+FAKE_EXPORT void FakePMemPeekAfterReadAt(unsigned long address) { memory().peekAddress = address; }
+
+FAKE_EXPORT void FakePMemPeeked(long* count, int* tail0, int* tail1) {
+    FakeMemory& fake = memory();
+    std::lock_guard<std::mutex> lock(fake.mutex);
+    *count = fake.peekedCount;
+    *tail0 = fake.peekedTail[0];
+    *tail1 = fake.peekedTail[1];
+}
 FAKE_EXPORT void FakePMemSetOpenDelay(int ms) { memory().openDelayMs = ms; }
 
 FAKE_EXPORT void FakePMemCounts(int* opens, int* closes, int* reads, int* searches) {
@@ -115,6 +134,11 @@ FAKE_EXPORT int PMemRead(void* buffer, unsigned long address, long count) {
         if (!byteAt(fake, address + static_cast<unsigned long>(i), out[i])) {
             return fake.readFailure;
         }
+    }
+    if (fake.peekAddress != 0 && address == fake.peekAddress) {
+        fake.peekedCount = count;
+        fake.peekedTail[0] = out[count];
+        fake.peekedTail[1] = out[count + 1];
     }
     return 0;
 }
