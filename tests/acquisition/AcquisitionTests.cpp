@@ -208,8 +208,11 @@ TEST_F(Acquisition, BrokenLibraryFileIsReportedAsNotLoadable) {
 }
 
 TEST_F(Acquisition, LibraryThatDoesNotInitializeIsUnloadedAndReported) {
-    FakePMem fake(kFakeFull);
-    fake.setInitialized(0);
+    // No handle of the test's own on the library: its unload must be seen.
+    std::string const library = kFakeFull + "libpmem.so";
+    ASSERT_EQ(dlopen(library.c_str(), RTLD_NOW | RTLD_NOLOAD), nullptr)
+        << "the library is loaded before the test";
+    ScopedEnv const notInitialized("FAKE_PMEM_INITIALIZED", "0");
     useCodeDir(kFakeFull);
     LogCapture log;
     SD::SmBios smbios;
@@ -220,7 +223,11 @@ TEST_F(Acquisition, LibraryThatDoesNotInitializeIsUnloadedAndReported) {
     EXPECT_TRUE(log.contains("Constructor library '" + kFakeFull +
                              "libpmem.so' did not initialize - exception return"))
         << log.dump();
-    EXPECT_EQ(fake.opens(), 0);
+    void* const still = dlopen(library.c_str(), RTLD_NOW | RTLD_NOLOAD);
+    EXPECT_EQ(still, nullptr) << "the library stayed loaded";
+    if (still != nullptr) {
+        dlclose(still);
+    }
 }
 
 TEST_F(Acquisition, LibraryLackingPMemSearchCannotExportAllSymbols) {

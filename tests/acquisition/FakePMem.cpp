@@ -3,6 +3,7 @@
 // regions that the test maps, and control functions through which the test
 // (which loads the same file) sets it up and reads what was called.
 #include <chrono>
+#include <cstdlib>
 #include <cstring>
 #include <map>
 #include <mutex>
@@ -103,7 +104,12 @@ FAKE_EXPORT void FakePMemCounts(int* opens, int* closes, int* reads, int* search
     *searches = fake.searches;
 }
 
-FAKE_EXPORT int PMemIsInitialized() { return memory().initialized; }
+// FAKE_PMEM_INITIALIZED, when set, answers instead of FakePMemSetInitialized:
+// a test that must see the library unloaded cannot hold a handle on it.
+FAKE_EXPORT int PMemIsInitialized() {
+    char const* value = std::getenv("FAKE_PMEM_INITIALIZED");
+    return value != nullptr ? std::atoi(value) : memory().initialized;
+}
 
 FAKE_EXPORT int PMemOpen() {
     FakeMemory& fake = memory();
