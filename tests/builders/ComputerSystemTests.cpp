@@ -14,6 +14,7 @@
 #include <cstdlib>
 #include <ctime>
 #include <memory>
+#include <ostream>
 #include <sstream>
 #include <string>
 #include <thread>
@@ -760,12 +761,6 @@ TEST(ComputerSystemUuid, Version24KeepsTheTextAsFormatted) {
     EXPECT_EQ(2u, log.count("SmBios Minor Version = 4")) << log.dump();
 }
 
-TEST(ComputerSystemUuid, Version25KeepsTheTextAsFormatted) {
-    REQUIRE_FRESH_TABLE();
-    OverrideTable override(uuidTable(), 2, 5);
-    EXPECT_EQ(UUID_AS_FORMATTED, rewritten(UUID_AS_FORMATTED));
-}
-
 TEST(ComputerSystemUuid, Version26ReordersTheFirstThreeFields) {
     REQUIRE_FRESH_TABLE();
     OverrideTable override(uuidTable(), 2, 6);
@@ -775,47 +770,37 @@ TEST(ComputerSystemUuid, Version26ReordersTheFirstThreeFields) {
     EXPECT_EQ(2u, log.count("Exiting if condition UUID = " + UUID_REORDERED)) << log.dump();
 }
 
-TEST(ComputerSystemUuid, Version27ReordersTheFirstThreeFields) {
-    REQUIRE_FRESH_TABLE();
-    OverrideTable override(uuidTable(), 2, 7);
-    EXPECT_EQ(UUID_REORDERED, rewritten(UUID_AS_FORMATTED));
+// The table's version, and whether the UUID's first three fields are
+// reordered at it.
+struct UuidVersionCase {
+    uint8_t major;
+    uint8_t minor;
+    bool reordered;
+};
+
+void PrintTo(UuidVersionCase const& c, std::ostream* out) {
+    *out << "SMBIOS " << int(c.major) << "." << int(c.minor)
+         << (c.reordered ? " reorders" : " keeps the text");
 }
 
-TEST(ComputerSystemUuid, Version28ReordersTheFirstThreeFields) {
+class ComputerSystemUuidVersion : public ::testing::TestWithParam<UuidVersionCase> {};
+
+TEST_P(ComputerSystemUuidVersion, ReordersTheFirstThreeFieldsOnlyWhereTheVersionSaysSo) {
     REQUIRE_FRESH_TABLE();
-    OverrideTable override(uuidTable(), 2, 8);
-    EXPECT_EQ(UUID_REORDERED, rewritten(UUID_AS_FORMATTED));
+    OverrideTable override(uuidTable(), GetParam().major, GetParam().minor);
+    EXPECT_EQ(GetParam().reordered ? UUID_REORDERED : UUID_AS_FORMATTED,
+              rewritten(UUID_AS_FORMATTED));
 }
 
-TEST(ComputerSystemUuid, Version29KeepsTheTextAsFormatted) {
-    REQUIRE_FRESH_TABLE();
-    OverrideTable override(uuidTable(), 2, 9);
-    EXPECT_EQ(UUID_AS_FORMATTED, rewritten(UUID_AS_FORMATTED));
-}
-
-TEST(ComputerSystemUuid, Version260KeepsTheTextAsFormatted) {
-    REQUIRE_FRESH_TABLE();
-    OverrideTable override(uuidTable(), 2, 60);
-    EXPECT_EQ(UUID_AS_FORMATTED, rewritten(UUID_AS_FORMATTED));
-}
-
-TEST(ComputerSystemUuid, Version261ReordersTheFirstThreeFields) {
-    REQUIRE_FRESH_TABLE();
-    OverrideTable override(uuidTable(), 2, 61);
-    EXPECT_EQ(UUID_REORDERED, rewritten(UUID_AS_FORMATTED));
-}
-
-TEST(ComputerSystemUuid, Version30ReordersTheFirstThreeFields) {
-    REQUIRE_FRESH_TABLE();
-    OverrideTable override(uuidTable(), 3, 0);
-    EXPECT_EQ(UUID_REORDERED, rewritten(UUID_AS_FORMATTED));
-}
-
-TEST(ComputerSystemUuid, Version1KeepsTheTextAsFormatted) {
-    REQUIRE_FRESH_TABLE();
-    OverrideTable override(uuidTable(), 1, 9);
-    EXPECT_EQ(UUID_AS_FORMATTED, rewritten(UUID_AS_FORMATTED));
-}
+INSTANTIATE_TEST_SUITE_P(
+    Versions, ComputerSystemUuidVersion,
+    ::testing::Values(UuidVersionCase{1, 9, false}, UuidVersionCase{2, 5, false},
+                      UuidVersionCase{2, 7, true}, UuidVersionCase{2, 8, true},
+                      UuidVersionCase{2, 9, false}, UuidVersionCase{2, 60, false},
+                      UuidVersionCase{2, 61, true}, UuidVersionCase{3, 0, true}),
+    [](::testing::TestParamInfo<UuidVersionCase> const& info) {
+        return "V" + std::to_string(info.param.major) + "_" + std::to_string(info.param.minor);
+    });
 
 TEST(ComputerSystemUuid, RewriteStoresTheTableVersionInThePlugIn) {
     REQUIRE_FRESH_TABLE();
