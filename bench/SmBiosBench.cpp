@@ -90,9 +90,8 @@ class BenchMI : public IC::SmBiosMI {
 public:
     size_t build(SD::SmBios const& parsed) {
         IC::ManagementInterface::initialize(1, IC::Number(0u), IC::Number(0u));
-        std::unique_ptr<std::vector<IC::TableData>> owners[256];
-        std::vector<IC::TableData>* lists[256];
-        groupStructures(parsed, owners, lists);
+        IC::StructureGroups groups(parsed);
+        IC::TableLists const lists = groups.lists();
         makeRootNode(lists);
         return nodeList.size();
     }

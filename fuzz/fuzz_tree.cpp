@@ -29,9 +29,8 @@ public:
     std::string build(std::vector<unsigned char> const& raw) {
         SD::SmBios const parsed(raw);
         IC::ManagementInterface::initialize(1, IC::Number(0u), IC::Number(0u));
-        std::unique_ptr<std::vector<IC::TableData>> owners[256];
-        std::vector<IC::TableData>* lists[256];
-        groupStructures(parsed, owners, lists);
+        IC::StructureGroups groups(parsed);
+        IC::TableLists const lists = groups.lists();
         makeRootNode(lists);
         makeBMCNodes(lists, 2);
         makeTemperatureSensorNodes(lists, 2, 3);

@@ -65,9 +65,8 @@ Error SmBiosMI::initialize(unsigned int id, Number const& a, Number const& b) {
         SMBIOS_DETAIL(logger, "SmBiosMI Revision is 0 or NULL");
     }
 
-    std::unique_ptr<std::vector<TableData>> owners[256];
-    std::vector<TableData>* lists[256];
-    groupStructures(smbios, owners, lists);
+    StructureGroups groups(smbios);
+    TableLists const lists = groups.lists();
 
     makeRootNode(lists);
 
@@ -79,8 +78,6 @@ Error SmBiosMI::initialize(unsigned int id, Number const& a, Number const& b) {
                                                       << " length = " << entry.length);
             }
         }
-        owners[t].reset();
-        lists[t] = nullptr;
     }
 
     Error const result = myerr;
@@ -88,19 +85,27 @@ Error SmBiosMI::initialize(unsigned int id, Number const& a, Number const& b) {
     return result;
 }
 
-void SmBiosMI::groupStructures(SD::SmBios const& smbios,
-                               std::unique_ptr<std::vector<TableData>> (&owners)[256],
-                               std::vector<TableData>* (&lists)[256]) {
-    for (unsigned int t = 0; t < 256; ++t) {
-        owners[t].reset(new std::vector<TableData>());
-        lists[t] = owners[t].get();
+StructureGroups::StructureGroups() {
+    for (unsigned int type = 0; type < 256; ++type) {
+        lists_[type] = &groups_[type];
     }
+}
+
+StructureGroups::StructureGroups(SD::SmBios const& smbios) : StructureGroups() { file(smbios); }
+
+StructureGroups::StructureGroups(std::unique_ptr<SD::SmBios const> held) : StructureGroups(*held) {
+    held_ = std::move(held);
+}
+
+StructureGroups::~StructureGroups() = default;
+
+void StructureGroups::file(SD::SmBios const& smbios) {
     unsigned int type = 0;
     for (SD::SmBios::Table const& structure : smbios.getTables()) {
         try {
             type = structure.getType();
             unsigned int const length = structure.getLength();
-            lists[type]->push_back(TableData(&structure, length));
+            groups_[type].push_back(TableData(&structure, length));
         } catch (std::exception const& e) {
             SMBIOS_ERROR(logger, "Exception=" << e.what() << " Type=" << typeid(e).name()
                                               << "Table " << type);
@@ -112,37 +117,16 @@ void SmBiosMI::groupStructures(SD::SmBios const& smbios,
     }
 }
 
-bool SmBiosMI::makeRequestedNodes(unsigned int parentId, unsigned int const* locations,
-                                  unsigned int locationCount, bool bmc) {
-    std::lock_guard<std::recursive_mutex> const guard(operationLock());
-    SMBIOS_DETAIL(logger, "makeRequestedNodes entry");
-    bool parentFound = false;
-    for (Node const* node : nodeList) {
-        if (node != nullptr && node->getNodeId() == parentId) {
-            parentFound = true;
-            break;
-        }
+void StructureGroups::takeOver(TableLists tables) {
+    for (unsigned int type = 0; type < 256; ++type) {
+        groups_[type].swap(*tables[type]);
     }
-    if (!parentFound) {
-        SMBIOS_ERROR(logger, "makeRequestedNodes: no node with id " << parentId);
-        return false;
-    }
+}
 
+std::unique_ptr<StructureGroups> SmBiosMI::groupAcquiredTable() const {
     // The table initialize acquired: this copy reads nothing again.
-    SD::SmBios smbios;
-    std::unique_ptr<std::vector<TableData>> owners[256];
-    std::vector<TableData>* lists[256];
-    groupStructures(smbios, owners, lists);
-
-    for (unsigned int i = 0; i < locationCount; ++i) {
-        makeTemperatureSensorNodes(lists, parentId, locations[i]);
-        makeVoltageSensorNodes(lists, parentId, locations[i]);
-    }
-    if (bmc) {
-        makeBMCNodes(lists, parentId);
-    }
-    SMBIOS_DETAIL(logger, "makeRequestedNodes exit");
-    return true;
+    return std::unique_ptr<StructureGroups>(
+        new StructureGroups(std::unique_ptr<SD::SmBios const>(new SD::SmBios())));
 }
 
 // Readers and writers. Offsets are checked against the formatted-area
@@ -381,19 +365,4 @@ extern "C" int OpenMI(IC::ManagementInterface** mi, IC::Error** err) {
     *err = &IC::myerr;
     SMBIOS_DETAIL(IC::logger, "OpenMI exit");
     return 0;
-}
-
-extern "C" int SmBiosMIExtraNodes(unsigned int parentId, unsigned int const* locations,
-                                  unsigned int locationCount, int bmc) {
-    if (locations == nullptr) {
-        locationCount = 0;
-    }
-    try {
-        bool const made =
-            IC::mysmbiosmi.makeRequestedNodes(parentId, locations, locationCount, bmc != 0);
-        return made ? 0 : 1;
-    } catch (...) {
-        SMBIOS_ERROR(IC::logger, "SmBiosMIExtraNodes: the nodes could not be made");
-        return 2;
-    }
 }

@@ -45,6 +45,40 @@ struct TableData {
 // The structure lists: 256 lists, one per SMBIOS type, indexed by type.
 typedef std::vector<TableData>** TableLists;
 
+// What the plug-in hands the host program beyond OpenMI: C++ members it
+// calls directly, never a C entry point. The agent calls none of them.
+#define SMBIOSMI_HOST_API __attribute__((visibility("default")))
+
+// The structures of a table grouped by SMBIOS type: 256 lists, one per type,
+// each in table order, owned here; lists() is the builders' view of them.
+class StructureGroups {
+public:
+    // 256 empty lists.
+    StructureGroups();
+    // Files every structure of smbios in the list of its type; a structure
+    // that cannot be read is logged and left out. smbios must outlive the
+    // groups.
+    explicit StructureGroups(SD::SmBios const& smbios);
+    // The same over a table the groups hold themselves.
+    explicit StructureGroups(std::unique_ptr<SD::SmBios const> held);
+    SMBIOSMI_HOST_API ~StructureGroups();
+    StructureGroups(StructureGroups const&) = delete;
+    StructureGroups& operator=(StructureGroups const&) = delete;
+
+    TableLists lists() { return lists_; }
+
+    // Takes every list of tables over, whole and in order, leaving those
+    // lists empty.
+    void takeOver(TableLists tables);
+
+private:
+    void file(SD::SmBios const& smbios);
+
+    std::unique_ptr<SD::SmBios const> held_;
+    std::vector<TableData> groups_[256];
+    std::vector<TableData>* lists_[256];
+};
+
 class SmBiosMI : public ManagementInterface {
 public:
     SmBiosMI();
@@ -52,12 +86,11 @@ public:
 
     Error initialize(unsigned int id, Number const& a, Number const& b) override;
 
-    // After initialize: the temperature and voltage sensor nodes of the
-    // probes at each location, in the order given, then, with bmc, the BMC
-    // nodes, all under parentId, from the table initialize acquired. False
-    // (logged) when parentId names no node.
-    bool makeRequestedNodes(unsigned int parentId, unsigned int const* locations,
-                            unsigned int locationCount, bool bmc);
+    // After initialize: the structures of the table initialize acquired,
+    // grouped, holding their own copy of it. Nothing in the plug-in makes
+    // the sensor and BMC nodes; the host program that asks for them calls
+    // their builders on these groups.
+    SMBIOSMI_HOST_API std::unique_ptr<StructureGroups> groupAcquiredTable() const;
 
     // Builders.
     void makeRootNode(TableLists lists);
@@ -73,10 +106,11 @@ public:
     void makeFirmwareNodes(TableLists tables, unsigned int parentId);
     void makeLogNodes(TableLists tables, unsigned int parentId);
     void makeKVDNode(TableLists tables, unsigned int parentId);
-    void makeTemperatureSensorNodes(TableLists tables, unsigned int parentId,
-                                    unsigned int location);
-    void makeVoltageSensorNodes(TableLists tables, unsigned int parentId, unsigned int location);
-    void makeBMCNodes(TableLists tables, unsigned int parentId);
+    SMBIOSMI_HOST_API void makeTemperatureSensorNodes(TableLists tables, unsigned int parentId,
+                                                      unsigned int location);
+    SMBIOSMI_HOST_API void makeVoltageSensorNodes(TableLists tables, unsigned int parentId,
+                                                  unsigned int location);
+    SMBIOSMI_HOST_API void makeBMCNodes(TableLists tables, unsigned int parentId);
     void makeSMBIOSTableNodes(TableLists lists, unsigned int parentId);
     std::vector<std::pair<unsigned char, unsigned int>> findGroup(TableLists lists,
                                                                   unsigned int type,
@@ -175,14 +209,6 @@ protected:
 
     unsigned int smbiosMajorVersion = 0;
     unsigned int smbiosMinorVersion = 0;
-
-    // Makes the structure lists, one new list per SMBIOS type in owners
-    // (lists holds the same lists for the builders), and files every
-    // structure of smbios in the list of its type; a structure that cannot
-    // be read is logged and left out.
-    void groupStructures(SD::SmBios const& smbios,
-                         std::unique_ptr<std::vector<TableData>> (&owners)[256],
-                         std::vector<TableData>* (&lists)[256]);
 };
 
 // A copy of s without its trailing blanks, or, when s starts with blanks,
@@ -205,14 +231,6 @@ extern unsigned int tablecount[256];
 // error record, and returns 0.
 extern "C" __attribute__((visibility("default"))) int OpenMI(IC::ManagementInterface** mi,
                                                              IC::Error** err);
-
-// The optional entry point for a host that wants the nodes nothing in the
-// plug-in makes (see SmBiosMI::makeRequestedNodes): sensor nodes for the
-// probes at each of the locationCount locations, and the BMC nodes when bmc
-// is not 0, under the node parentId. Call it after initialize. Returns 0,
-// 1 when parentId names no node, 2 when the nodes could not be made.
-extern "C" __attribute__((visibility("default"))) int SmBiosMIExtraNodes(
-    unsigned int parentId, unsigned int const* locations, unsigned int locationCount, int bmc);
 
 // The three handlers that guard the handling of one structure in a builder:
 // the failure is logged and the builder goes on with the next structure.

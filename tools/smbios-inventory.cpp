@@ -6,8 +6,6 @@
 // fails, 2 for a wrong command line or a dump file that is not usable, and
 // 128 + the signal's number when SIGINT, SIGTERM or SIGHUP ends the run.
 
-#include <dlfcn.h>
-#include <signal.h>
 #include <stdlib.h>
 #include <sys/stat.h>
 #include <unistd.h>
@@ -18,38 +16,24 @@
 #include <cstdint>
 #include <cstdio>
 #include <cstring>
-#include <filesystem>
-#include <fstream>
 #include <iostream>
 #include <string>
 #include <vector>
 
 #include "DumpFormat.h"
-#include "IC/Error.h"
-#include "IC/ManagementInterface.h"
-#include "IC/MutableNode.h"
 #include "IC/Node.h"
-#include "IC/Number.h"
 #include "QNLog/QNLogger.h"
 #include "SD/RegularFile.h"
 #include "ToolSupport.h"
 #include "inventory/DumpCheck.h"
 #include "inventory/Inventory.h"
+#include "inventory/PluginHost.h"
+#include "inventory/PrivateDataDir.h"
 
 namespace {
 
 char const kProgram[] = "smbios-inventory";
 char const kPluginName[] = "libsmbiosmi.so";
-// The plug-in's optional entry point that makes the nodes its initialize
-// does not: sensor nodes for the probes at given locations, and BMC nodes.
-char const kExtraNodesEntry[] = "SmBiosMIExtraNodes";
-typedef int (*ExtraNodesFunction)(unsigned int parentId, unsigned int const* locations,
-                                  unsigned int locationCount, int bmc);
-
-// Node types of the nodes the extra nodes hang under: the planar, else the
-// root.
-unsigned int const kPlanarNodeType = 41;
-unsigned int const kRootNodeType = 59;
 
 // The SMBIOS probe location codes by name, for --sensors.
 struct NamedLocation {
@@ -63,128 +47,7 @@ NamedLocation const kLocations[] = {
 };
 unsigned int const kLastLocation = 31;
 
-// The plug-in, its management interface and the error record it handed out
-// stay alive until the process ends: the nodes belong to the plug-in, and it
-// is never unloaded.
-void* gPlugin = nullptr;
-IC::ManagementInterface* gInterface = nullptr;
-IC::Error* gOpenError = nullptr;
-
 void complain(std::string const& message) { smbiostool::complain(kProgram, message); }
-
-// The private folder that stands in for the data directory when the host
-// runs on a dump file; it is removed with everything in it when the run
-// ends, whichever way it ends.
-class TemporaryDataDir {
-public:
-    TemporaryDataDir() = default;
-    TemporaryDataDir(TemporaryDataDir const&) = delete;
-    TemporaryDataDir& operator=(TemporaryDataDir const&) = delete;
-    ~TemporaryDataDir() {
-        if (!path_.empty()) {
-            std::error_code ignored;
-            std::filesystem::remove_all(path_, ignored);
-        }
-    }
-
-    // Creates the folder under $TMPDIR (or /tmp). Returns false and sets
-    // why when it cannot.
-    bool create(std::string& why) {
-        char const* base = std::getenv("TMPDIR");
-        std::string pattern = (base != nullptr && *base != '\0') ? base : "/tmp";
-        if (pattern.back() != '/') {
-            pattern += '/';
-        }
-        pattern += "smbios-inventory.XXXXXX";
-        std::vector<char> buffer(pattern.begin(), pattern.end());
-        buffer.push_back('\0');
-        if (mkdtemp(buffer.data()) == nullptr) {
-            why = "cannot create a temporary folder from " + pattern + ": " + std::strerror(errno);
-            return false;
-        }
-        path_ = buffer.data();
-        return true;
-    }
-
-    std::string const& path() const { return path_; }
-
-private:
-    std::string path_;
-};
-
-// The signals that end a run early; the temporary data directory must not
-// outlive them.
-int const kEndSignals[] = {SIGINT, SIGTERM, SIGHUP};
-
-// What the signal handler removes: the override copy, its folder and the
-// temporary data directory, made before the handler is installed so that the
-// handler itself only calls unlink and rmdir.
-struct SignalCleanup {
-    std::string file;
-    std::string folder;
-    std::string dataDir;
-};
-SignalCleanup gSignalCleanup;
-volatile sig_atomic_t gSignalCleanupReady = 0;
-
-extern "C" void removeTemporaryDataDirAndEnd(int signalNumber) {
-    if (gSignalCleanupReady != 0) {
-        unlink(gSignalCleanup.file.c_str());
-        rmdir(gSignalCleanup.folder.c_str());
-        rmdir(gSignalCleanup.dataDir.c_str());
-    }
-    // The handler was reset to the default on entry and the signal is not
-    // blocked inside it: raising it again ends the process as the signal
-    // would have, with the status 128 + its number that a shell reports.
-    raise(signalNumber);
-}
-
-// Holds the end signals back while the temporary data directory is made and
-// its cleanup prepared; a signal that came meanwhile is delivered at the end.
-class EndSignalsHeld {
-public:
-    EndSignalsHeld() {
-        sigset_t held;
-        sigemptyset(&held);
-        for (int signalNumber : kEndSignals) {
-            sigaddset(&held, signalNumber);
-        }
-        active_ = sigprocmask(SIG_BLOCK, &held, &saved_) == 0;
-    }
-    EndSignalsHeld(EndSignalsHeld const&) = delete;
-    EndSignalsHeld& operator=(EndSignalsHeld const&) = delete;
-    ~EndSignalsHeld() {
-        if (active_) {
-            sigprocmask(SIG_SETMASK, &saved_, nullptr);
-        }
-    }
-
-private:
-    sigset_t saved_;
-    bool active_ = false;
-};
-
-// From here on an end signal removes the temporary data directory first.
-// Signals that the caller ignores (a background job's SIGINT) stay ignored.
-void removeOnEndSignals(std::string const& dataDir, std::string const& folder,
-                        std::string const& file) {
-    gSignalCleanup.dataDir = dataDir;
-    gSignalCleanup.folder = folder;
-    gSignalCleanup.file = file;
-    gSignalCleanupReady = 1;
-    for (int signalNumber : kEndSignals) {
-        struct sigaction previous;
-        if (sigaction(signalNumber, nullptr, &previous) == 0 && previous.sa_handler == SIG_IGN) {
-            continue;
-        }
-        struct sigaction action;
-        std::memset(&action, 0, sizeof action);
-        action.sa_handler = removeTemporaryDataDirAndEnd;
-        sigemptyset(&action.sa_mask);
-        action.sa_flags = SA_RESETHAND | SA_NODEFER;
-        sigaction(signalNumber, &action, nullptr);
-    }
-}
 
 // Sends whatever is written to standard output to standard error until it is
 // ended: standard output carries nothing but the inventory.
@@ -222,52 +85,6 @@ private:
 
     int saved_ = -1;
 };
-
-// The plug-in beside this program, else the one in ../lib from it (an
-// installed program in PREFIX/bin and the plug-in in PREFIX/lib).
-std::string defaultPluginPath() {
-    return smbiostool::installedLibrary(smbiostool::ownFolder(), kPluginName);
-}
-
-// Reads a --dump or --from-bin file: a regular file of at most 16 MiB,
-// never waiting on a FIFO or reading a device.
-bool readInput(char const* option, std::string const& path, std::string& content) {
-    std::vector<std::uint8_t> bytes;
-    std::string why;
-    if (!smbiostool::readInputFile(path, bytes, why)) {
-        complain(std::string(option) + ": " + path + ": " + why);
-        return false;
-    }
-    content.assign(bytes.begin(), bytes.end());
-    return true;
-}
-
-// The --log file is appended to: a regular file (made when it is not
-// there) or a character device such as /dev/null or a terminal. Anything
-// else (a FIFO would wait for a reader, a directory cannot take lines) is
-// refused before the logger opens it.
-bool usableLogFile(std::string const& path, std::string& why) {
-    struct stat status;
-    if (stat(path.c_str(), &status) != 0) {
-        return true;
-    }
-    if (S_ISREG(status.st_mode) || S_ISCHR(status.st_mode)) {
-        return true;
-    }
-    why = std::string(SD::fileKind(status.st_mode)) + ", not a regular file";
-    return false;
-}
-
-bool writeWholeFile(std::string const& path, std::string const& content, std::string& why) {
-    std::ofstream out(path, std::ios::binary | std::ios::trunc);
-    out.write(content.data(), static_cast<std::streamsize>(content.size()));
-    out.close();
-    if (!out) {
-        why = "cannot write " + path;
-        return false;
-    }
-    return true;
-}
 
 // An SMBIOS probe location: a name of kLocations, or a code from 0 to 31 in
 // decimal or with 0x in hexadecimal.
@@ -313,23 +130,177 @@ std::string locationNames() {
     return names;
 }
 
-// What the user asked for beyond what initialize makes.
-struct ExtraNodes {
-    std::vector<unsigned int> locations;  // each once, in the order given
-    bool bmc = false;
+// --sensors: a location name or code, turned into its decimal code.
+CLI::Validator locationValidator() {
+    return CLI::Validator(
+        [](std::string& text) {
+            unsigned int code = 0;
+            if (!parseLocation(text, code)) {
+                return "bad location '" + text + "' (a number from 0 to " +
+                       std::to_string(kLastLocation) + ", or one of " + locationNames() + ")";
+            }
+            text = std::to_string(code);
+            return std::string();
+        },
+        "");
+}
 
-    bool requested() const { return bmc || !locations.empty(); }
+// --log-level and --trace-level: a decimal number or "off".
+CLI::Validator levelValidator() {
+    return CLI::Validator(
+        [](std::string& text) {
+            int threshold = 0;
+            return QNLog::QNLogger::parseLevel(text, threshold)
+                       ? std::string()
+                       : "bad level '" + text + "' (a decimal number or \"off\" expected)";
+        },
+        "");
+}
+
+// --log: appended to, so a regular file (made when it is not there) or a
+// character device such as /dev/null or a terminal. Anything else (a FIFO
+// would wait for a reader, a directory cannot take lines) is refused before
+// the logger opens it.
+CLI::Validator logFileValidator() {
+    return CLI::Validator(
+        [](std::string& path) {
+            struct stat status;
+            if (stat(path.c_str(), &status) != 0 || S_ISREG(status.st_mode) ||
+                S_ISCHR(status.st_mode)) {
+                return std::string();
+            }
+            return path + ": " + SD::fileKind(status.st_mode) + ", not a regular file";
+        },
+        "");
+}
+
+// A validator that adds nothing to the value's name in the help text; the
+// option's own type name says it all.
+CLI::Validator quiet(CLI::Validator validator) {
+    validator.description("");
+    return validator;
+}
+
+// The command line.
+struct Options {
+    std::string dumpFile;
+    std::string binFile;
+    std::string dataDir;
+    std::string codeDir;
+    std::string pluginPath;
+    std::string format = "tree";
+    std::string logFile;
+    std::string logLevel;
+    std::string traceLevel;
+    std::vector<unsigned int> sensorLocations;
+    bool bmc = false;
 };
 
-// The id of the first node of the given type, or 0 when there is none.
-unsigned int firstNodeOfType(std::vector<IC::Node*> const& nodes, unsigned int type) {
-    for (IC::Node const* node : nodes) {
-        auto const* mutableNode = dynamic_cast<IC::MutableNode const*>(node);
-        if (mutableNode != nullptr && mutableNode->getNodeType() == type) {
-            return mutableNode->getNodeId();
-        }
+// The table's sources: the machine (through the data directory), --dump or
+// --from-bin, one at a time.
+void addSourceOptions(CLI::App& app, Options& options) {
+    auto* dump = app.add_option("--dump", options.dumpFile,
+                                "Run the plug-in on this dump file instead of the machine's own "
+                                "table")
+                     ->type_name("FILE")
+                     ->check(quiet(CLI::ExistingFile));
+    auto* dataDir = app.add_option("--data-dir", options.dataDir,
+                                   "Data directory of the agent (KESTREL_DATA_DIR)")
+                        ->type_name("DIR");
+    auto* bin = app.add_option("--from-bin", options.binFile,
+                               "Run the plug-in on this dmidecode --dump-bin file instead of the "
+                               "machine's own table")
+                    ->type_name("FILE")
+                    ->check(quiet(CLI::ExistingFile));
+    dump->excludes(dataDir);
+    bin->excludes(dump);
+    bin->excludes(dataDir);
+}
+
+void addOptions(CLI::App& app, Options& options) {
+    addSourceOptions(app, options);
+    app.add_option("--code-dir", options.codeDir, "Code directory of the agent (KESTREL_CODE_DIR)")
+        ->type_name("DIR");
+    app.add_option("--plugin", options.pluginPath,
+                   std::string("The plug-in to load (default: ") + kPluginName +
+                       " beside this program, else in ../lib from it)")
+        ->type_name("PATH");
+    app.add_option("--format", options.format, "Output format: tree (default) or json")
+        ->type_name("tree|json")
+        ->check(quiet(CLI::IsMember({"tree", "json"})));
+    app.add_option("--log", options.logFile,
+                   "Append log messages to this file instead of standard error")
+        ->type_name("FILE")
+        ->check(logFileValidator());
+    app.add_option("--log-level", options.logLevel, "Log threshold: a decimal number or \"off\"")
+        ->type_name("N")
+        ->check(levelValidator());
+    app.add_option("--trace-level", options.traceLevel,
+                   "Trace threshold: a decimal number or \"off\"")
+        ->type_name("N")
+        ->check(levelValidator());
+    app.add_option("--sensors", options.sensorLocations,
+                   "Also make the temperature and voltage sensor nodes of the probes at this "
+                   "location (repeatable): a code from 0 to 31 or one of " +
+                       locationNames())
+        ->type_name("LOCATION")
+        ->expected(1)
+        ->multi_option_policy(CLI::MultiOptionPolicy::TakeAll)
+        ->transform(locationValidator());
+    app.add_flag("--bmc", options.bmc, "Also make the BMC nodes");
+    app.set_version_flag("--version", std::string(kProgram) + " " + PROJECT_VERSION,
+                         "Print the version and exit");
+}
+
+// The logger's thresholds and file, as the options ask. Returns 0, or the
+// exit status after saying why.
+int applyLogOptions(Options const& options) {
+    int threshold = 0;
+    if (QNLog::QNLogger::parseLevel(options.logLevel, threshold)) {
+        QNLog::QNLogger::setLogLevel(threshold);
+    }
+    if (QNLog::QNLogger::parseLevel(options.traceLevel, threshold)) {
+        QNLog::QNLogger::setTraceLevel(threshold);
+    }
+    if (!options.logFile.empty() && !QNLog::QNLogger::setLogFile(options.logFile)) {
+        complain("--log: cannot open " + options.logFile + " for appending");
+        return smbiostool::EXIT_USAGE;
     }
     return 0;
+}
+
+// Reads a --dump or --from-bin file: a regular file of at most 16 MiB,
+// never waiting on a FIFO or reading a device.
+bool readInput(char const* option, std::string const& path, std::string& content) {
+    std::vector<std::uint8_t> bytes;
+    std::string why;
+    if (!smbiostool::readInputFile(path, bytes, why)) {
+        complain(std::string(option) + ": " + path + ": " + why);
+        return false;
+    }
+    content.assign(bytes.begin(), bytes.end());
+    return true;
+}
+
+// The text of the override file the plug-in is to read: the --dump file, or
+// a --dump-bin file as --dump would have given it. False after saying why.
+bool readDumpContent(Options const& options, std::string& content) {
+    if (!options.dumpFile.empty()) {
+        return readInput("--dump", options.dumpFile, content);
+    }
+    std::string bytes;
+    if (!readInput("--from-bin", options.binFile, bytes)) {
+        return false;
+    }
+    smbiosdump::DumpImage image;
+    std::string why;
+    if (!smbiosdump::readDumpBin(std::vector<std::uint8_t>(bytes.begin(), bytes.end()), image,
+                                 why)) {
+        complain("--from-bin: " + options.binFile + ": " + why);
+        return false;
+    }
+    content = smbiosdump::formatOverride(image.header, image.table);
+    return true;
 }
 
 bool setEnvironment(char const* name, std::string const& value) {
@@ -340,57 +311,44 @@ bool setEnvironment(char const* name, std::string const& value) {
     return true;
 }
 
-// A validator that adds nothing to the value's name in the help text; the
-// option's own type name says it all.
-CLI::Validator quiet(CLI::Validator validator) {
-    validator.description("");
-    return validator;
-}
-
-bool applyLevel(char const* option, std::string const& text, void (*apply)(int)) {
-    int threshold = 0;
-    if (!QNLog::QNLogger::parseLevel(text, threshold)) {
-        complain(std::string(option) + ": bad level '" + text +
-                 "' (a decimal number or \"off\" expected)");
-        return false;
-    }
-    apply(threshold);
-    return true;
-}
-
-// Asks the plug-in for the extra nodes under the planar node, else the root.
-// Returns 0, or 1 after saying why.
-int makeExtraNodes(ExtraNodesFunction extraNodes, ExtraNodes const& extra) {
-    std::vector<IC::Node*> nodes;
-    IC::Error mapped = gInterface->getMap(nodes);
-    if (mapped.getStatus() != 0) {
-        complain("getMap failed with status " + std::to_string(mapped.getStatus()) + ": " +
-                 mapped.getMessage());
+// A dump runs in a private data directory whose override file is a copy of
+// it; the real data directory is left alone. The copy is checked with the
+// plug-in's own grammar, so that the host never answers about another
+// table. Returns 0, or the exit status after saying why.
+int prepareDumpRun(Options const& options, std::string const& content,
+                   inventory::PrivateDataDir& folder) {
+    std::string why;
+    if (!folder.create(content, why)) {
+        complain(why);
         return smbiostool::EXIT_FAILED;
     }
-    unsigned int parentId = firstNodeOfType(nodes, kPlanarNodeType);
-    if (parentId == 0) {
-        parentId = firstNodeOfType(nodes, kRootNodeType);
+    inventory::DumpCheck const check = inventory::checkOverrideFile(folder.overrideFile(), content);
+    if (!check.refusal.empty()) {
+        complain((options.dumpFile.empty() ? "--from-bin: " + options.binFile
+                                           : "--dump: " + options.dumpFile) +
+                 ": " + check.refusal);
+        return smbiostool::EXIT_USAGE;
     }
-    if (parentId == 0) {
-        complain("the inventory has neither a planar nor a root node for the sensor and BMC nodes");
-        return smbiostool::EXIT_FAILED;
+    if (!check.warning.empty()) {
+        complain(check.warning);
     }
-    int const made =
-        extraNodes(parentId, extra.locations.data(),
-                   static_cast<unsigned int>(extra.locations.size()), extra.bmc ? 1 : 0);
-    if (made != 0) {
-        complain(std::string(kExtraNodesEntry) + " returned " + std::to_string(made) +
-                 " for the parent node " + std::to_string(parentId));
-        return smbiostool::EXIT_FAILED;
-    }
-    return 0;
+    return setEnvironment("KESTREL_DATA_DIR", folder.dataDir()) ? 0 : smbiostool::EXIT_FAILED;
 }
 
-// Loads the plug-in, opens and initializes its management interface, makes
-// the extra nodes when asked to and fills nodes. Returns 0, or 1 after
-// saying why.
-int loadInventory(std::string const& pluginPath, ExtraNodes const& extra,
+// The plug-in to load: --plugin, where a bare file name means the file in
+// the current folder (not a search of the library path), else the one
+// beside this program, else in ../lib from it (an installed program in
+// PREFIX/bin and the plug-in in PREFIX/lib).
+std::string pluginPath(std::string const& option) {
+    if (option.empty()) {
+        return smbiostool::installedLibrary(smbiostool::ownFolder(), kPluginName);
+    }
+    return option.find('/') == std::string::npos ? "./" + option : option;
+}
+
+// Loads the plug-in, initializes it, makes the extra nodes when asked to
+// and fills nodes. Returns 0, or 1 after saying why.
+int loadInventory(inventory::PluginHost& host, Options const& options,
                   std::vector<IC::Node*>& nodes) {
     // The plug-in and the framework may print while they start; that output
     // goes to standard error.
@@ -399,76 +357,27 @@ int loadInventory(std::string const& pluginPath, ExtraNodes const& extra,
         complain(std::string("cannot redirect standard output: ") + std::strerror(errno));
         return smbiostool::EXIT_FAILED;
     }
-
-    dlerror();
-    gPlugin = dlopen(pluginPath.c_str(), RTLD_NOW | RTLD_LOCAL);
-    if (gPlugin == nullptr) {
-        char const* why = dlerror();
-        complain("cannot load the plug-in " + pluginPath + ": " +
-                 (why != nullptr ? why : "unknown error"));
-        return smbiostool::EXIT_FAILED;
-    }
-    dlerror();
-    void* symbol = dlsym(gPlugin, "OpenMI");
-    if (symbol == nullptr) {
-        char const* why = dlerror();
-        complain("the plug-in " + pluginPath + " has no OpenMI entry point" +
-                 (why != nullptr ? std::string(": ") + why : std::string()));
-        return smbiostool::EXIT_FAILED;
-    }
-    IC::OpenMIFunction openMI = nullptr;
-    static_assert(sizeof openMI == sizeof symbol, "function and data pointers differ in size");
-    std::memcpy(&openMI, &symbol, sizeof openMI);
-
-    // The extra entry point is looked for only when it is needed: a
-    // plug-in without it serves every other run.
-    ExtraNodesFunction extraNodes = nullptr;
-    if (extra.requested()) {
-        dlerror();
-        void* extraSymbol = dlsym(gPlugin, kExtraNodesEntry);
-        if (extraSymbol == nullptr) {
-            complain("the plug-in " + pluginPath + " has no " + kExtraNodesEntry +
-                     " entry point, which --sensors and --bmc need");
-            return smbiostool::EXIT_FAILED;
-        }
-        static_assert(sizeof extraNodes == sizeof extraSymbol,
-                      "function and data pointers differ in size");
-        std::memcpy(&extraNodes, &extraSymbol, sizeof extraNodes);
-    }
-
-    int opened = openMI(&gInterface, &gOpenError);
-    if (opened != 0) {
-        std::string message = "OpenMI of " + pluginPath + " returned " + std::to_string(opened);
-        if (gOpenError != nullptr && !gOpenError->getMessage().empty()) {
-            message += ": " + gOpenError->getMessage();
-        }
-        complain(message);
-        return smbiostool::EXIT_FAILED;
-    }
-    if (gInterface == nullptr) {
-        complain("OpenMI of " + pluginPath + " gave no management interface");
-        return smbiostool::EXIT_FAILED;
-    }
-
-    IC::Error initialized = gInterface->initialize(1, IC::Number(0u), IC::Number(0u));
-    if (initialized.getStatus() != 0) {
-        complain("initialize failed with status " + std::to_string(initialized.getStatus()) + ": " +
-                 initialized.getMessage());
-        return smbiostool::EXIT_FAILED;
-    }
-    if (extraNodes != nullptr) {
-        int const status = makeExtraNodes(extraNodes, extra);
-        if (status != 0) {
-            return status;
+    inventory::ExtraNodes extra;
+    extra.bmc = options.bmc;
+    for (unsigned int code : options.sensorLocations) {
+        if (std::find(extra.locations.begin(), extra.locations.end(), code) ==
+            extra.locations.end()) {
+            extra.locations.push_back(code);
         }
     }
-    IC::Error mapped = gInterface->getMap(nodes);
-    if (mapped.getStatus() != 0) {
-        complain("getMap failed with status " + std::to_string(mapped.getStatus()) + ": " +
-                 mapped.getMessage());
+    std::string why;
+    bool done = host.load(why);
+    if (done && extra.requested() && !host.isLinkedSmBiosPlugin()) {
+        why = "--sensors and --bmc need the SMBIOS plug-in this program is built with (" +
+              std::string(kPluginName) + " beside it); " + host.path() + " is another one";
+        done = false;
+    }
+    done = done && host.initialize(why) &&
+           (!extra.requested() || host.makeExtraNodes(extra, why)) && host.getNodes(nodes, why);
+    if (!done) {
+        complain(why);
         return smbiostool::EXIT_FAILED;
     }
-    redirect.end();
     return 0;
 }
 
@@ -477,185 +386,35 @@ int run(int argc, char** argv) {
         "Loads a management-interface plug-in the way the inventory agent does and prints "
         "the inventory tree that it builds.",
         kProgram};
-    std::string dumpFile;
-    std::string binFile;
-    std::string dataDir;
-    std::string codeDir;
-    std::string pluginPath;
-    std::string format = "tree";
-    std::string logFile;
-    std::string logLevel;
-    std::string traceLevel;
-    std::vector<std::string> sensorLocations;
-    bool bmc = false;
-
-    auto* dumpOption = app.add_option("--dump", dumpFile,
-                                      "Run the plug-in on this dump file instead of the "
-                                      "machine's own table")
-                           ->type_name("FILE")
-                           ->check(quiet(CLI::ExistingFile));
-    auto* dataDirOption =
-        app.add_option("--data-dir", dataDir, "Data directory of the agent (KESTREL_DATA_DIR)")
-            ->type_name("DIR");
-    dumpOption->excludes(dataDirOption);
-    auto* binOption = app.add_option("--from-bin", binFile,
-                                     "Run the plug-in on this dmidecode --dump-bin file instead "
-                                     "of the machine's own table")
-                          ->type_name("FILE")
-                          ->check(quiet(CLI::ExistingFile));
-    binOption->excludes(dumpOption);
-    binOption->excludes(dataDirOption);
-    app.add_option("--code-dir", codeDir, "Code directory of the agent (KESTREL_CODE_DIR)")
-        ->type_name("DIR");
-    app.add_option("--plugin", pluginPath,
-                   std::string("The plug-in to load (default: ") + kPluginName +
-                       " beside this program, else in ../lib from it)")
-        ->type_name("PATH");
-    app.add_option("--format", format, "Output format: tree (default) or json")
-        ->type_name("tree|json")
-        ->check(quiet(CLI::IsMember({"tree", "json"})));
-    app.add_option("--log", logFile, "Append log messages to this file instead of standard error")
-        ->type_name("FILE");
-    app.add_option("--log-level", logLevel, "Log threshold: a decimal number or \"off\"")
-        ->type_name("N");
-    app.add_option("--trace-level", traceLevel, "Trace threshold: a decimal number or \"off\"")
-        ->type_name("N");
-    app.add_option("--sensors", sensorLocations,
-                   "Also make the temperature and voltage sensor nodes of the probes at this "
-                   "location (repeatable): a code from 0 to 31 or one of " +
-                       locationNames())
-        ->type_name("LOCATION")
-        ->expected(1)
-        ->multi_option_policy(CLI::MultiOptionPolicy::TakeAll);
-    app.add_flag("--bmc", bmc, "Also make the BMC nodes");
-    app.set_version_flag("--version", std::string(kProgram) + " " + PROJECT_VERSION,
-                         "Print the version and exit");
-
-    int exitStatus = 0;
-    if (!smbiostool::parseCommandLine(app, argc, argv, kProgram, exitStatus)) {
-        return exitStatus;
-    }
-
-    if (!logLevel.empty() && !applyLevel("--log-level", logLevel, &QNLog::QNLogger::setLogLevel)) {
-        return smbiostool::EXIT_USAGE;
-    }
-    if (!traceLevel.empty() &&
-        !applyLevel("--trace-level", traceLevel, &QNLog::QNLogger::setTraceLevel)) {
-        return smbiostool::EXIT_USAGE;
-    }
-    if (!logFile.empty()) {
-        std::string why;
-        if (!usableLogFile(logFile, why)) {
-            complain("--log: " + logFile + ": " + why);
-            return smbiostool::EXIT_USAGE;
-        }
-    }
-    if (!logFile.empty() && !QNLog::QNLogger::setLogFile(logFile)) {
-        complain("--log: cannot open " + logFile + " for appending");
-        return smbiostool::EXIT_USAGE;
-    }
-
-    ExtraNodes extra;
-    extra.bmc = bmc;
-    for (std::string const& text : sensorLocations) {
-        unsigned int code = 0;
-        if (!parseLocation(text, code)) {
-            complain("--sensors: bad location '" + text + "' (a number from 0 to " +
-                     std::to_string(kLastLocation) + ", or one of " + locationNames() + ")");
-            return smbiostool::EXIT_USAGE;
-        }
-        if (std::find(extra.locations.begin(), extra.locations.end(), code) ==
-            extra.locations.end()) {
-            extra.locations.push_back(code);
-        }
-    }
-
-    // Read the dump before anything is created, so that an unreadable file
-    // is a command-line error. A --dump-bin file becomes the text of an
-    // override file, as --dump would have given it.
-    std::string dumpContent;
-    if (!dumpFile.empty()) {
-        if (!readInput("--dump", dumpFile, dumpContent)) {
-            return smbiostool::EXIT_USAGE;
-        }
-    } else if (!binFile.empty()) {
-        std::string bytes;
-        std::string why;
-        if (!readInput("--from-bin", binFile, bytes)) {
-            return smbiostool::EXIT_USAGE;
-        }
-        smbiosdump::DumpImage image;
-        if (!smbiosdump::readDumpBin(std::vector<std::uint8_t>(bytes.begin(), bytes.end()), image,
-                                     why)) {
-            complain("--from-bin: " + binFile + ": " + why);
-            return smbiostool::EXIT_USAGE;
-        }
-        dumpContent = smbiosdump::formatOverride(image.header, image.table);
-    }
-    bool const onDump = !dumpFile.empty() || !binFile.empty();
-
-    if (!dataDir.empty() && !setEnvironment("KESTREL_DATA_DIR", dataDir)) {
-        return smbiostool::EXIT_FAILED;
-    }
-    if (!codeDir.empty() && !setEnvironment("KESTREL_CODE_DIR", codeDir)) {
-        return smbiostool::EXIT_FAILED;
-    }
-
-    // A dump runs in a private data directory whose override file is a copy
-    // of it; the real data directory is left alone.
-    TemporaryDataDir temporary;
-    if (onDump) {
-        EndSignalsHeld held;
-        std::string why;
-        if (!temporary.create(why)) {
-            complain(why);
-            return smbiostool::EXIT_FAILED;
-        }
-        std::string const overrideDir = temporary.path() + "/SmBiosOverride";
-        std::error_code error;
-        if (!std::filesystem::create_directory(overrideDir, error)) {
-            complain("cannot create " + overrideDir + ": " + error.message());
-            return smbiostool::EXIT_FAILED;
-        }
-        std::string const overrideFile = overrideDir + "/smbios.txt";
-        removeOnEndSignals(temporary.path(), overrideDir, overrideFile);
-        if (!writeWholeFile(overrideFile, dumpContent, why)) {
-            complain(why);
-            return smbiostool::EXIT_FAILED;
-        }
-        // The copy is what the plug-in reads: check it with the plug-in's
-        // own grammar, so that the host never answers about another table.
-        inventory::DumpCheck const check = inventory::checkOverrideFile(overrideFile, dumpContent);
-        if (!check.refusal.empty()) {
-            complain((dumpFile.empty() ? "--from-bin: " + binFile : "--dump: " + dumpFile) + ": " +
-                     check.refusal);
-            return smbiostool::EXIT_USAGE;
-        }
-        if (!check.warning.empty()) {
-            complain(check.warning);
-        }
-        if (!setEnvironment("KESTREL_DATA_DIR", temporary.path() + "/")) {
-            return smbiostool::EXIT_FAILED;
-        }
-    }
-
-    if (pluginPath.empty()) {
-        pluginPath = defaultPluginPath();
-    } else if (pluginPath.find('/') == std::string::npos) {
-        // A bare file name means the file in the current folder, not a
-        // search of the library path.
-        pluginPath = "./" + pluginPath;
-    }
-
-    std::vector<IC::Node*> nodes;
-    int status = loadInventory(pluginPath, extra, nodes);
-    if (status != 0) {
+    Options options;
+    addOptions(app, options);
+    int status = 0;
+    if (!smbiostool::parseCommandLine(app, argc, argv, kProgram, status) ||
+        (status = applyLogOptions(options)) != 0) {
         return status;
     }
-
-    std::string const text =
-        format == "json" ? inventory::renderJson(nodes) : inventory::renderTree(nodes);
-    std::cout << text;
+    // Read the dump before anything is created, so that an unreadable file
+    // is a command-line error.
+    bool const onDump = !options.dumpFile.empty() || !options.binFile.empty();
+    std::string dumpContent;
+    if (onDump && !readDumpContent(options, dumpContent)) {
+        return smbiostool::EXIT_USAGE;
+    }
+    if ((!options.dataDir.empty() && !setEnvironment("KESTREL_DATA_DIR", options.dataDir)) ||
+        (!options.codeDir.empty() && !setEnvironment("KESTREL_CODE_DIR", options.codeDir))) {
+        return smbiostool::EXIT_FAILED;
+    }
+    inventory::PrivateDataDir folder;
+    if (onDump && (status = prepareDumpRun(options, dumpContent, folder)) != 0) {
+        return status;
+    }
+    inventory::PluginHost host(pluginPath(options.pluginPath));
+    std::vector<IC::Node*> nodes;
+    if ((status = loadInventory(host, options, nodes)) != 0) {
+        return status;
+    }
+    std::cout << (options.format == "json" ? inventory::renderJson(nodes)
+                                           : inventory::renderTree(nodes));
     std::cout.flush();
     if (!std::cout) {
         complain("cannot write the inventory to standard output");

@@ -105,7 +105,7 @@ void SmBiosMI::makePlanarNodes(TableLists tables, unsigned int parentNodeId) {
         }
     }
 
-    std::unique_ptr<std::vector<TableData>> owners[256];
+    StructureGroups owned;
     try {
         TableData& entry = (*tables[2])[chosen];
         SD::SmBios::Table const* t = entry.table;
@@ -140,12 +140,8 @@ void SmBiosMI::makePlanarNodes(TableLists tables, unsigned int parentNodeId) {
 
         // The planar takes every structure over into groups of its own; the
         // shared groups are left empty. Each group moves whole, in its order.
-        std::vector<TableData>* groups[256];
-        for (unsigned int type = 0; type < 256; ++type) {
-            owners[type].reset(new std::vector<TableData>());
-            groups[type] = owners[type].get();
-            groups[type]->swap(*tables[type]);
-        }
+        owned.takeOver(tables);
+        TableLists const groups = owned.lists();
 
         unsigned int const count = getNumber8(t, CONTAINED_COUNT);
         SMBIOS_DETAIL(logger, "Count of contained object handles=" << count);

@@ -451,18 +451,18 @@ TEST_F(HostTest, FromBinFileThatIsNoDumpBinExitsTwoWithItsReason) {
               std::string::npos);
 }
 
-TEST_F(HostTest, SensorsWithPluginLackingTheExtraEntryPointExitsOne) {
+TEST_F(HostTest, SensorsWithAnotherPluginExitsOne) {
     RunResult run = hosttest::runHost({"--plugin", fakePlugin(), "--sensors", "processor"});
     EXPECT_EQ(run.exitStatus, 1) << hosttest::describe(run);
-    EXPECT_NE(run.err.find("no SmBiosMIExtraNodes entry point"), std::string::npos)
+    EXPECT_NE(run.err.find("need the SMBIOS plug-in this program is built with"), std::string::npos)
         << hosttest::describe(run);
     EXPECT_EQ(run.out, "");
 }
 
-TEST_F(HostTest, BmcWithPluginLackingTheExtraEntryPointExitsOne) {
+TEST_F(HostTest, BmcWithAnotherPluginExitsOne) {
     RunResult run = hosttest::runHost({"--plugin", fakePlugin(), "--format", "json", "--bmc"});
     EXPECT_EQ(run.exitStatus, 1) << hosttest::describe(run);
-    EXPECT_NE(run.err.find("no SmBiosMIExtraNodes entry point"), std::string::npos)
+    EXPECT_NE(run.err.find("need the SMBIOS plug-in this program is built with"), std::string::npos)
         << hosttest::describe(run);
     EXPECT_EQ(run.out, "");
 }

@@ -1,0 +1,145 @@
+#include "inventory/PrivateDataDir.h"
+
+#include <signal.h>
+#include <stdlib.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <cstring>
+#include <filesystem>
+#include <fstream>
+#include <vector>
+
+namespace inventory {
+
+namespace {
+
+// The signals that end a run early; the folder must not outlive them.
+int const kEndSignals[] = {SIGINT, SIGTERM, SIGHUP};
+
+// What the signal handler removes: the override copy, its folder and the
+// data directory, set before the handler is installed so that the handler
+// itself only calls unlink and rmdir. A signal handler reaches nothing but
+// static data.
+struct SignalCleanup {
+    std::string file;
+    std::string folder;
+    std::string dataDir;
+};
+SignalCleanup gSignalCleanup;
+volatile sig_atomic_t gSignalCleanupReady = 0;
+
+extern "C" void removeDataDirAndEnd(int signalNumber) {
+    if (gSignalCleanupReady != 0) {
+        unlink(gSignalCleanup.file.c_str());
+        rmdir(gSignalCleanup.folder.c_str());
+        rmdir(gSignalCleanup.dataDir.c_str());
+    }
+    // The handler was reset to the default on entry and the signal is not
+    // blocked inside it: raising it again ends the process as the signal
+    // would have, with the status 128 + its number that a shell reports.
+    raise(signalNumber);
+}
+
+// Holds the end signals back while the folder is made and its cleanup
+// prepared; a signal that came meanwhile is delivered at the end.
+class EndSignalsHeld {
+public:
+    EndSignalsHeld() {
+        sigset_t held;
+        sigemptyset(&held);
+        for (int signalNumber : kEndSignals) {
+            sigaddset(&held, signalNumber);
+        }
+        active_ = sigprocmask(SIG_BLOCK, &held, &saved_) == 0;
+    }
+    EndSignalsHeld(EndSignalsHeld const&) = delete;
+    EndSignalsHeld& operator=(EndSignalsHeld const&) = delete;
+    ~EndSignalsHeld() {
+        if (active_) {
+            sigprocmask(SIG_SETMASK, &saved_, nullptr);
+        }
+    }
+
+private:
+    sigset_t saved_;
+    bool active_ = false;
+};
+
+// From here on an end signal removes the folder first. Signals that the
+// caller ignores (a background job's SIGINT) stay ignored.
+void removeOnEndSignals(std::string const& dataDir, std::string const& folder,
+                        std::string const& file) {
+    gSignalCleanup.dataDir = dataDir;
+    gSignalCleanup.folder = folder;
+    gSignalCleanup.file = file;
+    gSignalCleanupReady = 1;
+    for (int signalNumber : kEndSignals) {
+        struct sigaction previous;
+        if (sigaction(signalNumber, nullptr, &previous) == 0 && previous.sa_handler == SIG_IGN) {
+            continue;
+        }
+        struct sigaction action;
+        std::memset(&action, 0, sizeof action);
+        action.sa_handler = removeDataDirAndEnd;
+        sigemptyset(&action.sa_mask);
+        action.sa_flags = SA_RESETHAND | SA_NODEFER;
+        sigaction(signalNumber, &action, nullptr);
+    }
+}
+
+// A new folder from $TMPDIR (or /tmp); "" and why when it cannot be made.
+std::string makeTemporaryFolder(std::string& why) {
+    char const* base = std::getenv("TMPDIR");
+    std::string pattern = (base != nullptr && *base != '\0') ? base : "/tmp";
+    if (pattern.back() != '/') {
+        pattern += '/';
+    }
+    pattern += "smbios-inventory.XXXXXX";
+    std::vector<char> buffer(pattern.begin(), pattern.end());
+    buffer.push_back('\0');
+    if (mkdtemp(buffer.data()) == nullptr) {
+        why = "cannot create a temporary folder from " + pattern + ": " + std::strerror(errno);
+        return "";
+    }
+    return buffer.data();
+}
+
+bool writeWholeFile(std::string const& path, std::string const& content, std::string& why) {
+    std::ofstream out(path, std::ios::binary | std::ios::trunc);
+    out.write(content.data(), static_cast<std::streamsize>(content.size()));
+    out.close();
+    if (!out) {
+        why = "cannot write " + path;
+        return false;
+    }
+    return true;
+}
+
+}  // namespace
+
+PrivateDataDir::~PrivateDataDir() {
+    if (!path_.empty()) {
+        std::error_code ignored;
+        std::filesystem::remove_all(path_, ignored);
+    }
+}
+
+bool PrivateDataDir::create(std::string const& content, std::string& why) {
+    EndSignalsHeld held;
+    path_ = makeTemporaryFolder(why);
+    if (path_.empty()) {
+        return false;
+    }
+    std::string const overrideDir = path_ + "/SmBiosOverride";
+    std::error_code error;
+    if (!std::filesystem::create_directory(overrideDir, error)) {
+        why = "cannot create " + overrideDir + ": " + error.message();
+        return false;
+    }
+    overrideFile_ = overrideDir + "/smbios.txt";
+    removeOnEndSignals(path_, overrideDir, overrideFile_);
+    return writeWholeFile(overrideFile_, content, why);
+}
+
+}  // namespace inventory
