@@ -79,7 +79,10 @@ private:
     std::vector<TableData>* lists_[256];
 };
 
-class SmBiosMI : public ManagementInterface {
+// The class itself is visible too: the host program holds the interface
+// OpenMI hands out as an SmBiosMI, and its type information must resolve
+// (UBSan's vptr checks look it up on every member call).
+class SMBIOSMI_HOST_API SmBiosMI : public ManagementInterface {
 public:
     SmBiosMI();
     ~SmBiosMI() override;
