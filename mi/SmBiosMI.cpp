@@ -5,6 +5,7 @@
 
 #include "IC/PropertyValue.h"
 #include "IC/Version2.h"
+#include "mi/BuilderSkeleton.h"
 
 namespace IC {
 
@@ -21,15 +22,9 @@ SmBiosMI::SmBiosMI() = default;
 
 SmBiosMI::~SmBiosMI() = default;
 
-MutableNode* SmBiosMI::addNode(MutableNode* node) {
-    Node* added = node;
-    addNewNode(added);
-    return node;
-}
-
 MutableNode* SmBiosMI::newNode(unsigned int parentId, unsigned int nodeType, unsigned int index) {
     unsigned int const nodeId = takeNodeId();
-    return addNode(new MutableNode(nodeId, parentId, miIdList, nodeType, index));
+    return addNode(std::make_unique<MutableNode>(nodeId, parentId, miIdList, nodeType, index));
 }
 
 Error SmBiosMI::initialize(unsigned int id, Number const& a, Number const& b) {
@@ -48,7 +43,7 @@ Error SmBiosMI::initialize(unsigned int id, Number const& a, Number const& b) {
         SMBIOS_WARNING(logger, "smbios table size zero");
     }
 
-    MutableNode* miNode = addNode(new MutableNode(miId, 0, miIdList, 15, 0));
+    MutableNode* miNode = addNode(std::make_unique<MutableNode>(miId, 0, miIdList, 15, 0));
     miNode->setStatus(1);
     miNode->setDescription("Corvane SMBIOS Management Interface");
 
@@ -69,16 +64,7 @@ Error SmBiosMI::initialize(unsigned int id, Number const& a, Number const& b) {
     TableLists const lists = groups.lists();
 
     makeRootNode(lists);
-
-    for (unsigned int t = 0; t < 256; ++t) {
-        if (!lists[t]->empty()) {
-            SMBIOS_DETAIL(logger, "Table(s) for index " << t);
-            for (TableData const& entry : *lists[t]) {
-                SMBIOS_DETAIL(logger, "   Pointer = " << static_cast<void const*>(entry.table)
-                                                      << " length = " << entry.length);
-            }
-        }
-    }
+    logStructureLists(logger, lists);
 
     Error const result = myerr;
     SMBIOS_DETAIL(logger, "initialize exit");
@@ -100,19 +86,42 @@ StructureGroups::StructureGroups(std::unique_ptr<SD::SmBios const> held) : Struc
 StructureGroups::~StructureGroups() = default;
 
 void StructureGroups::file(SD::SmBios const& smbios) {
+    SD::SourcePlace const here = SMBIOS_HERE;
     unsigned int type = 0;
     for (SD::SmBios::Table const& structure : smbios.getTables()) {
-        try {
-            type = structure.getType();
-            unsigned int const length = structure.getLength();
-            groups_[type].push_back(TableData(&structure, length));
-        } catch (std::exception const& e) {
-            SMBIOS_ERROR(logger, "Exception=" << e.what() << " Type=" << typeid(e).name()
-                                              << "Table " << type);
-        } catch (ICException const& e) {
-            SMBIOS_ERROR(logger, "ICException=" << e.what() << "Table=" << type);
-        } catch (...) {
-            SMBIOS_ERROR(logger, "Error in table " << type);
+        guarded(
+            [&] {
+                type = structure.getType();
+                unsigned int const length = structure.getLength();
+                groups_[type].push_back(TableData(&structure, length));
+            },
+            // Filing names the type alone: a structure has no index yet.
+            [&](Failure kind, char const* what, char const* typeName) {
+                switch (kind) {
+                    case Failure::STD_EXCEPTION:
+                        SMBIOS_ERROR_AT(
+                            here, logger,
+                            "Exception=" << what << " Type=" << typeName << "Table " << type);
+                        break;
+                    case Failure::IC_EXCEPTION:
+                        SMBIOS_ERROR_AT(here, logger, "ICException=" << what << "Table=" << type);
+                        break;
+                    case Failure::OTHER:
+                        SMBIOS_ERROR_AT(here, logger, "Error in table " << type);
+                        break;
+                }
+            });
+    }
+}
+
+void logStructureLists(QNLog::QNLogger const& logger, TableLists lists) {
+    for (unsigned int t = 0; t < 256; ++t) {
+        if (!lists[t]->empty()) {
+            SMBIOS_DETAIL(logger, "Table(s) for index " << t);
+            for (TableData const& entry : *lists[t]) {
+                SMBIOS_DETAIL(logger, "   Pointer = " << static_cast<void const*>(entry.table)
+                                                      << " length = " << entry.length);
+            }
         }
     }
 }

@@ -199,13 +199,43 @@ public:
 protected:
     // Takes the next node id.
     unsigned int takeNodeId() { return nextNodeId++; }
-    // Appends a node made by a builder to the node list and returns it.
-    IC::MutableNode* addNode(IC::MutableNode* node);
+    // Hands a node made by a builder to the node list, which owns it from
+    // then on (also when the list cannot take it), and returns it.
+    template <typename NodeType>
+    NodeType* addNode(std::unique_ptr<NodeType> node) {
+        IC::Node* added = node.get();
+        addNewNode(added);
+        return node.release();
+    }
     // Makes a node with the next node id under parentId and appends it.
     IC::MutableNode* newNode(unsigned int parentId, unsigned int nodeType, unsigned int index);
     // Sets the identification, build id and version properties of a
     // firmware node from its OEM string.
     void parseFirmwareOemString(std::string const& s, IC::MutableNode* node);
+    // The diagnostics node of one OEM Strings structure when one of its
+    // strings is accepted; ix is the string index reached.
+    void makeKVDNodeOf(TableData& entry, unsigned int parentId, unsigned int index,
+                       unsigned int& ix);
+    // One raw node: the structure's header fields, formatted bytes and
+    // non-empty strings.
+    void makeSMBIOSTableNode(SD::SmBios::Table const* t, unsigned int parentId, unsigned int index);
+    // Steps of the planar builder: the planar without a baseboard
+    // structure, the baseboard that becomes the planar, the planar from it
+    // (taking the structures over into owned), and what it logs of its
+    // contained handles and group associations.
+    void makeBarePlanarNode(TableLists tables, unsigned int parentNodeId);
+    size_t chooseBaseboard(TableLists tables) const;
+    void makeBaseboardPlanarNode(TableLists tables, TableData& entry, Node* parent,
+                                 unsigned int parentNodeId, StructureGroups& owned);
+    void logContainedHandles(SD::SmBios::Table const* t, TableLists groups) const;
+    void logGroupAssociations(TableLists groups, unsigned int handle);
+    // Steps of the firmware builder: the nodes of the images one OEM
+    // Strings structure names (uefi set when one names UEFI), and the
+    // properties of a BIOS Information structure's node.
+    void makeOemFirmwareNodes(TableLists tables, TableData& entry, unsigned int parentId,
+                              unsigned int& ordinal, bool& uefi);
+    void setBiosFirmwareProperties(TableData const& entry, std::string const& name,
+                                   IC::MutableNode* node);
     // Sensor nodes of one kind of probe at a location.
     void makeProbeNodes(TableLists tables, unsigned int parentId, unsigned int location,
                         ProbeKind const& kind, QNLog::QNLogger const& probeLogger);
@@ -234,18 +264,3 @@ extern unsigned int tablecount[256];
 // error record, and returns 0.
 extern "C" __attribute__((visibility("default"))) int OpenMI(IC::ManagementInterface** mi,
                                                              IC::Error** err);
-
-// The three handlers that guard the handling of one structure in a builder:
-// the failure is logged and the builder goes on with the next structure.
-#define SMBIOSMI_CATCH_STRUCTURE(logger, tableType, index)                                        \
-    catch (IC::ICException const& e) {                                                            \
-        SMBIOS_ERROR(logger, "ICException=" << e.what() << "Table " << (tableType)                \
-                                            << " index =" << (index));                            \
-    }                                                                                             \
-    catch (std::exception const& e) {                                                             \
-        SMBIOS_ERROR(logger, "Exception=" << e.what() << " Type=" << typeid(e).name() << "Table " \
-                                          << (tableType) << " index =" << (index));               \
-    }                                                                                             \
-    catch (...) {                                                                                 \
-        SMBIOS_ERROR(logger, "Error in table " << (tableType) << " index " << (index));           \
-    }

@@ -1,3 +1,4 @@
+#include "mi/BuilderSkeleton.h"
 #include "mi/SmBiosMI.h"
 
 namespace IC {
@@ -20,45 +21,40 @@ std::vector<std::pair<unsigned char, unsigned int>> SmBiosMI::findGroup(TableLis
                                                                         unsigned int handle) {
     SMBIOS_DETAIL(logger, "findGroup entry");
     std::vector<std::pair<unsigned char, unsigned int>> result;
-    std::vector<TableData> const& groups = *lists[14];
-    for (size_t p = 0; p < groups.size(); ++p) {
-        try {
-            SD::SmBios::Table const* t = groups[p].table;
-            unsigned int const length = t->getLength();
-            unsigned int const groupHandle = getNumber16(t, GROUP_HANDLE);
-            std::string const name = getString(t, GROUP_NAME);
-            SMBIOS_DETAIL(logger, "Table 14 length = " << length << " entries="
-                                                       << (static_cast<int>(length) - 5) / 3);
-            bool containsTarget = false;
-            std::vector<std::pair<unsigned char, unsigned int>> members;
-            if (length > FIRST_ITEM) {
-                for (unsigned int off = FIRST_ITEM; off < length; off += ITEM_SIZE) {
-                    unsigned int const itemType = getNumber8(t, static_cast<unsigned char>(off));
-                    unsigned int const itemHandle =
-                        getNumber16(t, static_cast<unsigned char>(off + 1));
-                    if (itemType == type && itemHandle == handle) {
-                        containsTarget = true;
-                        SMBIOS_DETAIL(logger, "  Target " << type << " handle " << handle
-                                                          << " found in group " << name
-                                                          << " handle " << groupHandle);
-                    } else {
-                        members.push_back(
-                            std::make_pair(static_cast<unsigned char>(itemType), itemHandle));
-                    }
-                }
-            }
-            if (containsTarget) {
-                for (auto const& member : members) {
-                    SMBIOS_DETAIL(logger, "  Member " << static_cast<unsigned int>(member.first)
-                                                      << " handle " << member.second
+    forEachStructure(SMBIOS_HERE, logger, lists, 14, [&](TableData& group, size_t) {
+        SD::SmBios::Table const* t = group.table;
+        unsigned int const length = t->getLength();
+        unsigned int const groupHandle = getNumber16(t, GROUP_HANDLE);
+        std::string const name = getString(t, GROUP_NAME);
+        SMBIOS_DETAIL(logger, "Table 14 length = " << length << " entries="
+                                                   << (static_cast<int>(length) - 5) / 3);
+        bool containsTarget = false;
+        std::vector<std::pair<unsigned char, unsigned int>> members;
+        if (length > FIRST_ITEM) {
+            for (unsigned int off = FIRST_ITEM; off < length; off += ITEM_SIZE) {
+                unsigned int const itemType = getNumber8(t, static_cast<unsigned char>(off));
+                unsigned int const itemHandle = getNumber16(t, static_cast<unsigned char>(off + 1));
+                if (itemType == type && itemHandle == handle) {
+                    containsTarget = true;
+                    SMBIOS_DETAIL(logger, "  Target " << type << " handle " << handle
                                                       << " found in group " << name << " handle "
                                                       << groupHandle);
-                    result.push_back(member);
+                } else {
+                    members.push_back(
+                        std::make_pair(static_cast<unsigned char>(itemType), itemHandle));
                 }
             }
         }
-        SMBIOSMI_CATCH_STRUCTURE(logger, 14, p)
-    }
+        if (containsTarget) {
+            for (auto const& member : members) {
+                SMBIOS_DETAIL(logger, "  Member " << static_cast<unsigned int>(member.first)
+                                                  << " handle " << member.second
+                                                  << " found in group " << name << " handle "
+                                                  << groupHandle);
+                result.push_back(member);
+            }
+        }
+    });
     SMBIOS_DETAIL(logger, "findGroup exit");
     return result;
 }

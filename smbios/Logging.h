@@ -19,19 +19,36 @@ int const LOG_DETAIL = 3000;
 int const LOG_WARNING = 5000;
 int const LOG_ERROR = 6000;
 
+// Where a message is written from: the function, source file and line the
+// log line names. Shared code that writes on behalf of a builder takes the
+// builder's place, so that the line names the builder.
+struct SourcePlace {
+    char const* function;
+    char const* file;
+    int line;
+};
+
 }  // namespace SD
 
-#define SMBIOS_LOG(logger, level, expr)                                                     \
-    do {                                                                                    \
-        if (QNLog::QNLogger::isLevelEnabled(level)) {                                       \
-            QNLog::QNMessageBuffer smbiosLogBuffer_;                                        \
-            smbiosLogBuffer_ << expr;                                                       \
-            QNLog::QNLogger::logLevelMessage(__func__, __FILE__, __LINE__, logger, level,   \
-                                             smbiosLogBuffer_);                             \
-            QNLog::QNLogger::traceLevelMessage(__func__, __FILE__, __LINE__, logger, level, \
-                                               smbiosLogBuffer_);                           \
-        }                                                                                   \
+#define SMBIOS_HERE (SD::SourcePlace{__func__, __FILE__, __LINE__})
+
+#define SMBIOS_LOG_AT(place, logger, level, expr)                                              \
+    do {                                                                                       \
+        if (QNLog::QNLogger::isLevelEnabled(level)) {                                          \
+            SD::SourcePlace const smbiosLogPlace_ = (place);                                   \
+            QNLog::QNMessageBuffer smbiosLogBuffer_;                                           \
+            smbiosLogBuffer_ << expr;                                                          \
+            QNLog::QNLogger::logLevelMessage(smbiosLogPlace_.function, smbiosLogPlace_.file,   \
+                                             smbiosLogPlace_.line, logger, level,              \
+                                             smbiosLogBuffer_);                                \
+            QNLog::QNLogger::traceLevelMessage(smbiosLogPlace_.function, smbiosLogPlace_.file, \
+                                               smbiosLogPlace_.line, logger, level,            \
+                                               smbiosLogBuffer_);                              \
+        }                                                                                      \
     } while (0)
+
+#define SMBIOS_LOG(logger, level, expr) SMBIOS_LOG_AT(SMBIOS_HERE, logger, level, expr)
+#define SMBIOS_ERROR_AT(place, logger, expr) SMBIOS_LOG_AT(place, logger, SD::LOG_ERROR, expr)
 
 #define SMBIOS_DETAIL(logger, expr) SMBIOS_LOG(logger, SD::LOG_DETAIL, expr)
 #define SMBIOS_WARNING(logger, expr) SMBIOS_LOG(logger, SD::LOG_WARNING, expr)

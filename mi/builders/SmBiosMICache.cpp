@@ -1,4 +1,5 @@
 #include "IC/PropertyValue.h"
+#include "mi/BuilderSkeleton.h"
 #include "mi/SmBiosMI.h"
 #include "mi/builders/DecodeTable.h"
 
@@ -58,58 +59,52 @@ constexpr decode::Row<unsigned char> ASSOCIATIVITIES[] = {
 void SmBiosMI::makeCacheNodes(TableLists tables, unsigned int parentNodeId, unsigned int handle) {
     SMBIOS_DETAIL(logger, "makeCacheNodes entry handle=" << handle);
     SMBIOS_DETAIL(logger, "Table 7 count =" << tables[7]->size());
-    for (size_t k = 0; k < tables[7]->size(); ++k) {
-        try {
-            TableData const& entry = (*tables[7])[k];
-            SD::SmBios::Table const* t = entry.table;
-            if (getNumber16(t, HANDLE) != handle) {
-                continue;
-            }
-            SMBIOS_DETAIL(logger, "Table 7 length = " << entry.length << " handle = " << handle);
-            MutableNode* node = newNode(parentNodeId, 31, static_cast<unsigned int>(k));
-            node->setStatus(getBool16(t, CONFIGURATION, 0x80) ? 1 : 16);
-            node->setProperty(
-                125,
-                PropertyValue(std::vector<Number>{Number(1u), Number(14u), Number(16u)}, true));
-            node->setDescription("Processor Cache");
-            propString(t, SOCKET, 53, node);
-            unsigned int const mode = getEnumValue16(t, CONFIGURATION, 0x0300, 8);
-            node->setProperty(
-                72,
-                PropertyValue(EnumValue(decode::lookup(OPERATIONAL_MODES, mode, kUnknown)), true));
-
-            if (entry.length > 6) {
-                unsigned int const level = (getNumber16(t, CONFIGURATION) & 7) + 1;
-                node->setProperty(30, PropertyValue(Number(level), true));
-            }
-            if (entry.length > 0x0A) {
-                node->setProperty(69, PropertyValue(Number(1024u), true));
-                unsigned int const maximum = cacheSize(t->getWord(MAXIMUM_SIZE));
-                node->setProperty(112, PropertyValue(Number(maximum), true));
-                node->setProperty(37, PropertyValue(Number(maximum), true));
-                unsigned int const installed = cacheSize(t->getWord(INSTALLED_SIZE));
-                if (installed == 0) {
-                    node->setStatus(14);
-                }
-                node->setProperty(73, PropertyValue(Number(installed), true));
-                node->setProperty(173, PropertyValue(Number(installed), true));
-            }
-
-            node->setProperty(
-                9, PropertyValue(EnumValue(decode::lookup(SYSTEM_CACHE_TYPES,
-                                                          t->getByte(SYSTEM_CACHE_TYPE), kUnknown)),
-                                 true));
-            node->setProperty(
-                5, PropertyValue(EnumValue(decode::lookup(ASSOCIATIVITIES,
-                                                          t->getByte(ASSOCIATIVITY), kUnknown)),
-                                 true));
-            unsigned int const speed = getNumber8(t, SPEED);
-            if (speed != 0) {
-                node->setProperty(57, PropertyValue(Number(1000.0 / speed), true));
-            }
+    forEachStructure(SMBIOS_HERE, logger, tables, 7, [&](TableData& entry, size_t k) {
+        SD::SmBios::Table const* t = entry.table;
+        if (getNumber16(t, HANDLE) != handle) {
+            return;
         }
-        SMBIOSMI_CATCH_STRUCTURE(logger, 7, k)
-    }
+        SMBIOS_DETAIL(logger, "Table 7 length = " << entry.length << " handle = " << handle);
+        MutableNode* node = newNode(parentNodeId, 31, static_cast<unsigned int>(k));
+        node->setStatus(getBool16(t, CONFIGURATION, 0x80) ? 1 : 16);
+        node->setProperty(
+            125, PropertyValue(std::vector<Number>{Number(1u), Number(14u), Number(16u)}, true));
+        node->setDescription("Processor Cache");
+        propString(t, SOCKET, 53, node);
+        unsigned int const mode = getEnumValue16(t, CONFIGURATION, 0x0300, 8);
+        node->setProperty(
+            72, PropertyValue(EnumValue(decode::lookup(OPERATIONAL_MODES, mode, kUnknown)), true));
+
+        if (entry.length > 6) {
+            unsigned int const level = (getNumber16(t, CONFIGURATION) & 7) + 1;
+            node->setProperty(30, PropertyValue(Number(level), true));
+        }
+        if (entry.length > 0x0A) {
+            node->setProperty(69, PropertyValue(Number(1024u), true));
+            unsigned int const maximum = cacheSize(t->getWord(MAXIMUM_SIZE));
+            node->setProperty(112, PropertyValue(Number(maximum), true));
+            node->setProperty(37, PropertyValue(Number(maximum), true));
+            unsigned int const installed = cacheSize(t->getWord(INSTALLED_SIZE));
+            if (installed == 0) {
+                node->setStatus(14);
+            }
+            node->setProperty(73, PropertyValue(Number(installed), true));
+            node->setProperty(173, PropertyValue(Number(installed), true));
+        }
+
+        node->setProperty(
+            9, PropertyValue(EnumValue(decode::lookup(SYSTEM_CACHE_TYPES,
+                                                      t->getByte(SYSTEM_CACHE_TYPE), kUnknown)),
+                             true));
+        node->setProperty(
+            5, PropertyValue(
+                   EnumValue(decode::lookup(ASSOCIATIVITIES, t->getByte(ASSOCIATIVITY), kUnknown)),
+                   true));
+        unsigned int const speed = getNumber8(t, SPEED);
+        if (speed != 0) {
+            node->setProperty(57, PropertyValue(Number(1000.0 / speed), true));
+        }
+    });
     SMBIOS_DETAIL(logger, "makeCacheNodes exit");
 }
 

@@ -2,6 +2,7 @@
 #include <cctype>
 
 #include "IC/PropertyValue.h"
+#include "mi/BuilderSkeleton.h"
 #include "mi/SmBiosMI.h"
 #include "mi/builders/DecodeTable.h"
 #include "mi/builders/SmBiosMICmptr.h"
@@ -105,98 +106,94 @@ void SmBiosMI::makeChassisNodes(TableLists lists, unsigned int parentId) {
     unsigned int planarParentId = 0;
     bool mainChassis = false;
     bool homeFound = false;
-    for (size_t i = 0; i < lists[3]->size(); ++i) {
-        try {
-            TableData& entry = (*lists[3])[i];
-            SD::SmBios::Table const* t = entry.table;
-            SMBIOS_DETAIL(logger, "Table 3 length = " << entry.length);
-            unsigned int const type = getEnumValue(t, TYPE, 0x7F);
-            if (type == EXPANSION_CHASSIS) {
-                continue;
-            }
-            MutableNode* node = newNode(parentId, 1, static_cast<unsigned int>(i));
-            entry.node = node;
-            node->setStatus(1);
-            node->setDescription("Chassis");
-            unsigned int const nodeId = node->getNodeId();
+    forEachStructure(SMBIOS_HERE, logger, lists, 3, [&](TableData& entry, size_t i) {
+        SD::SmBios::Table const* t = entry.table;
+        SMBIOS_DETAIL(logger, "Table 3 length = " << entry.length);
+        unsigned int const type = getEnumValue(t, TYPE, 0x7F);
+        if (type == EXPANSION_CHASSIS) {
+            return;
+        }
+        MutableNode* node = newNode(parentId, 1, static_cast<unsigned int>(i));
+        entry.node = node;
+        node->setStatus(1);
+        node->setDescription("Chassis");
+        unsigned int const nodeId = node->getNodeId();
 
-            std::string manufacturer = getString(t, MANUFACTURER);
-            if (manufacturer.empty() || manufacturer == " " || manufacturer == "none") {
-                manufacturer = systemManufacturer;
-            }
-            node->setProperty(36, PropertyValue(manufacturer, true));
-            std::string const partNumber = getPartNum(systemProduct);
-            if (!partNumber.empty()) {
-                node->setProperty(45, PropertyValue(partNumber, true));
-            }
-            propBool8(t, TYPE, 0x80, 10, node);
+        std::string manufacturer = getString(t, MANUFACTURER);
+        if (manufacturer.empty() || manufacturer == " " || manufacturer == "none") {
+            manufacturer = systemManufacturer;
+        }
+        node->setProperty(36, PropertyValue(manufacturer, true));
+        std::string const partNumber = getPartNum(systemProduct);
+        if (!partNumber.empty()) {
+            node->setProperty(45, PropertyValue(partNumber, true));
+        }
+        propBool8(t, TYPE, 0x80, 10, node);
 
-            SMBIOS_DETAIL(logger, "Chassis Type = " << type);
-            node->setProperty(108, PropertyValue("Chassis", true));
-            ChassisKind const kind = chassisKind(type);
-            if (kind.name != nullptr) {
-                node->setProperty(108, PropertyValue(kind.name, true));
-            }
-            if (kind.mainChassis) {
-                mainChassis = true;
-            }
+        SMBIOS_DETAIL(logger, "Chassis Type = " << type);
+        node->setProperty(108, PropertyValue("Chassis", true));
+        ChassisKind const kind = chassisKind(type);
+        if (kind.name != nullptr) {
+            node->setProperty(108, PropertyValue(kind.name, true));
+        }
+        if (kind.mainChassis) {
+            mainChassis = true;
+        }
 
-            if (i == 0) {
-                planarParentId = nodeId;
-            }
-            if (mainChassis && !homeFound) {
-                planarParentId = nodeId;
-                homeFound = true;
-            }
+        if (i == 0) {
+            planarParentId = nodeId;
+        }
+        if (mainChassis && !homeFound) {
+            planarParentId = nodeId;
+            homeFound = true;
+        }
 
-            node->setProperty(39, PropertyValue(systemProduct, true));
-            node->setProperty(11, PropertyValue(EnumValue(kind.packageType), true));
-            node->setProperty(213, PropertyValue(EnumValue(kind.enclosure), true));
-            propString(t, VERSION, 307, node);
+        node->setProperty(39, PropertyValue(systemProduct, true));
+        node->setProperty(11, PropertyValue(EnumValue(kind.packageType), true));
+        node->setProperty(213, PropertyValue(EnumValue(kind.enclosure), true));
+        propString(t, VERSION, 307, node);
 
-            std::string serial = getString(t, SERIAL);
-            if (serial.empty() || serial == " " || lowerCase(serial) == "none") {
-                serial = systemSerial;
-            }
-            node->setProperty(50, PropertyValue(serial, true));
+        std::string serial = getString(t, SERIAL);
+        if (serial.empty() || serial == " " || lowerCase(serial) == "none") {
+            serial = systemSerial;
+        }
+        node->setProperty(50, PropertyValue(serial, true));
 
-            propString(t, ASSET_TAG, 2, node);
-            propEnumValue(t, BOOT_UP_STATE, 4, node);
-            propEnumValue(t, POWER_SUPPLY_STATE, 46, node);
-            propEnumValue(t, THERMAL_STATE, 60, node);
-            propEnumValue(t, SECURITY_STATUS, 49, node);
-            propBuffer(t, OEM_DEFINED, 4, 43, node);
-            propNumber8(t, HEIGHT, 21, node);
-            propNumber8(t, POWER_CORDS, 42, node);
+        propString(t, ASSET_TAG, 2, node);
+        propEnumValue(t, BOOT_UP_STATE, 4, node);
+        propEnumValue(t, POWER_SUPPLY_STATE, 46, node);
+        propEnumValue(t, THERMAL_STATE, 60, node);
+        propEnumValue(t, SECURITY_STATUS, 49, node);
+        propBuffer(t, OEM_DEFINED, 4, 43, node);
+        propNumber8(t, HEIGHT, 21, node);
+        propNumber8(t, POWER_CORDS, 42, node);
 
-            // Contained elements: a record's first byte is an SMBIOS
-            // structure type (bit 7 set) or a baseboard type. The records
-            // are read as they stand, even past the structure's end.
-            unsigned int const count = getNumber8(t, ELEMENT_COUNT);
-            unsigned int const recordLength = getNumber8(t, ELEMENT_RECORD_LENGTH);
-            SMBIOS_DETAIL(logger, "Contained Element Record count=" << count);
-            SMBIOS_DETAIL(logger, "Contained Element Record Length=" << recordLength);
-            if (count != 0 && recordLength != 0) {
-                std::string elements;
-                for (unsigned int r = 0; r < count; ++r) {
-                    unsigned int const element = getNumber8Unprot(t, ELEMENTS + r * recordLength);
-                    if ((element & 0x80) != 0) {
-                        elements += " " + std::to_string(element & 0x7F);
-                    } else {
-                        elements += " " + std::to_string(element);
-                        if (holdsBaseboard(element)) {
-                            planarParentId = nodeId;
-                            homeFound = true;
-                        }
+        // Contained elements: a record's first byte is an SMBIOS
+        // structure type (bit 7 set) or a baseboard type. The records
+        // are read as they stand, even past the structure's end.
+        unsigned int const count = getNumber8(t, ELEMENT_COUNT);
+        unsigned int const recordLength = getNumber8(t, ELEMENT_RECORD_LENGTH);
+        SMBIOS_DETAIL(logger, "Contained Element Record count=" << count);
+        SMBIOS_DETAIL(logger, "Contained Element Record Length=" << recordLength);
+        if (count != 0 && recordLength != 0) {
+            std::string elements;
+            for (unsigned int r = 0; r < count; ++r) {
+                unsigned int const element = getNumber8Unprot(t, ELEMENTS + r * recordLength);
+                if ((element & 0x80) != 0) {
+                    elements += " " + std::to_string(element & 0x7F);
+                } else {
+                    elements += " " + std::to_string(element);
+                    if (holdsBaseboard(element)) {
+                        planarParentId = nodeId;
+                        homeFound = true;
                     }
                 }
-                SMBIOS_DETAIL(logger, "Contained Elements=" << elements);
-            } else {
-                SMBIOS_DETAIL(logger, " < NONE > ");
             }
+            SMBIOS_DETAIL(logger, "Contained Elements=" << elements);
+        } else {
+            SMBIOS_DETAIL(logger, " < NONE > ");
         }
-        SMBIOSMI_CATCH_STRUCTURE(logger, 3, i)
-    }
+    });
     makePlanarNodes(lists, planarParentId);
     SMBIOS_DETAIL(logger, "makeChassisNodes exit");
 }

@@ -5,6 +5,7 @@
 
 #include "IC/PropertyValue.h"
 #include "SD/PlatformUtilities.h"
+#include "mi/BuilderSkeleton.h"
 #include "mi/SmBiosMI.h"
 
 namespace IC {
@@ -81,58 +82,53 @@ std::string getPartNum(std::string const& name) {
 // reached from the chassis builder, empties the shared lists meanwhile.
 void SmBiosMI::makeComputerNodes(TableLists lists, unsigned int parentId) {
     SMBIOS_DETAIL(logger, "makeComputerNodes entry");
-    for (size_t p = 0; p < lists[1]->size(); ++p) {
-        try {
-            SD::SmBios::Table const* t = (*lists[1])[p].table;
-            SMBIOS_DETAIL(logger, "Table 1 length = " << (*lists[1])[p].length);
-            unsigned int const nodeId = takeNodeId();
-            CmptrNode* node =
-                new CmptrNode(nodeId, parentId, miIdList, 40, static_cast<unsigned int>(p));
-            addNode(node);
-            node->setStatus(1);
-            node->setDescription("Computer System");
+    forEachStructure(SMBIOS_HERE, logger, lists, 1, [&](TableData& /*entry*/, size_t p) {
+        SD::SmBios::Table const* t = (*lists[1])[p].table;
+        SMBIOS_DETAIL(logger, "Table 1 length = " << (*lists[1])[p].length);
+        unsigned int const nodeId = takeNodeId();
+        CmptrNode* node = addNode(std::make_unique<CmptrNode>(nodeId, parentId, miIdList, 40,
+                                                              static_cast<unsigned int>(p)));
+        node->setStatus(1);
+        node->setDescription("Computer System");
 
-            node->setProperty(
-                125, PropertyValue(std::vector<Number>{Number(1u), Number(9u), Number(12u)}, true));
-            node->setProperty(126, PropertyValue(Number(Number::DATETIME), true));
-            node->setProperty(127, PropertyValue(Number(timeZoneHours()), true));
+        node->setProperty(
+            125, PropertyValue(std::vector<Number>{Number(1u), Number(9u), Number(12u)}, true));
+        node->setProperty(126, PropertyValue(Number(Number::DATETIME), true));
+        node->setProperty(127, PropertyValue(Number(timeZoneHours()), true));
 
-            propString(t, MANUFACTURER, 36, node);
-            std::string const product = getString(t, PRODUCT);
-            node->setProperty(39, PropertyValue(product, true));
-            node->setProperty(45, PropertyValue(getPartNum(product), true));
-            propString(t, VERSION, 307, node);
-            propString(t, SERIAL, 50, node);
+        propString(t, MANUFACTURER, 36, node);
+        std::string const product = getString(t, PRODUCT);
+        node->setProperty(39, PropertyValue(product, true));
+        node->setProperty(45, PropertyValue(getPartNum(product), true));
+        propString(t, VERSION, 307, node);
+        propString(t, SERIAL, 50, node);
 
-            std::vector<unsigned char> const uuidBytes = getBuffer(t, UUID, UUID_SIZE);
-            std::string uuid;
-            if (uuidBytes.size() == UUID_SIZE) {
-                std::string const raw(uuidBytes.begin(), uuidBytes.end());
-                uuid =
-                    SD::PlatformUtilities::uuid_unparse(raw.data(), static_cast<int>(raw.size()));
-            }
-            if (uuid.empty()) {
-                SMBIOS_DETAIL(logger, "PlatformUtilities::uuid_unparse error ");
-            } else {
-                reverse_uuid_byte_order(uuid);
-                node->setProperty(64, PropertyValue(uuid, true));
-            }
-
-            propEnumValue(t, WAKE_UP, 65, node);
-            propString(t, SKU, 52, node);
-            propString(t, FAMILY, 20, node);
-
-            makeChassisNodes(lists, nodeId);
-
-            unsigned int const handle = getNumber16(t, 2);
-            for (auto const& member : findGroup(lists, 1, handle)) {
-                std::cout << "Computer Node group member  Type="
-                          << static_cast<unsigned int>(member.first) << " Handle=" << member.second
-                          << std::endl;
-            }
+        std::vector<unsigned char> const uuidBytes = getBuffer(t, UUID, UUID_SIZE);
+        std::string uuid;
+        if (uuidBytes.size() == UUID_SIZE) {
+            std::string const raw(uuidBytes.begin(), uuidBytes.end());
+            uuid = SD::PlatformUtilities::uuid_unparse(raw.data(), static_cast<int>(raw.size()));
         }
-        SMBIOSMI_CATCH_STRUCTURE(logger, 1, p)
-    }
+        if (uuid.empty()) {
+            SMBIOS_DETAIL(logger, "PlatformUtilities::uuid_unparse error ");
+        } else {
+            reverse_uuid_byte_order(uuid);
+            node->setProperty(64, PropertyValue(uuid, true));
+        }
+
+        propEnumValue(t, WAKE_UP, 65, node);
+        propString(t, SKU, 52, node);
+        propString(t, FAMILY, 20, node);
+
+        makeChassisNodes(lists, nodeId);
+
+        unsigned int const handle = getNumber16(t, 2);
+        for (auto const& member : findGroup(lists, 1, handle)) {
+            std::cout << "Computer Node group member  Type="
+                      << static_cast<unsigned int>(member.first) << " Handle=" << member.second
+                      << std::endl;
+        }
+    });
     SMBIOS_DETAIL(logger, "makeComputerNodes exit");
 }
 

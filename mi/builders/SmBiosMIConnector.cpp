@@ -1,4 +1,5 @@
 #include "IC/PropertyValue.h"
+#include "mi/BuilderSkeleton.h"
 #include "mi/SmBiosMI.h"
 
 namespace IC {
@@ -18,25 +19,21 @@ char const* const REPORTED_CONNECTOR = "Compute ITE";
 // "Compute ITE", under the planar.
 void SmBiosMI::makeConnectorNodes(TableLists tables, unsigned int parentNodeId) {
     SMBIOS_DETAIL(logger, "makeConnectorNodes entry");
-    for (size_t i = 0; i < tables[8]->size(); ++i) {
-        try {
-            TableData& entry = (*tables[8])[i];
-            SD::SmBios::Table const* t = entry.table;
-            SMBIOS_DETAIL(logger, "Table " << 8 << " length = " << entry.length);
-            std::string const designator = getString(t, INTERNAL_DESIGNATOR);
-            if (designator.find(REPORTED_CONNECTOR) == std::string::npos) {
-                continue;
-            }
-            MutableNode* node = newNode(parentNodeId, 70, static_cast<unsigned int>(i));
-            entry.node = node;
-            node->setStatus(1);
-            node->setDescription("Port Connector");
-            node->setProperty(108, PropertyValue(designator, true));
-            unsigned char const portType = static_cast<unsigned char>(getNumber8(t, PORT_TYPE));
-            node->setProperty(128, PropertyValue(EnumValue(portType), true));
+    forEachStructure(SMBIOS_HERE, logger, tables, 8, [&](TableData& entry, size_t i) {
+        SD::SmBios::Table const* t = entry.table;
+        SMBIOS_DETAIL(logger, "Table " << 8 << " length = " << entry.length);
+        std::string const designator = getString(t, INTERNAL_DESIGNATOR);
+        if (designator.find(REPORTED_CONNECTOR) == std::string::npos) {
+            return;
         }
-        SMBIOSMI_CATCH_STRUCTURE(logger, 8, i)
-    }
+        MutableNode* node = newNode(parentNodeId, 70, static_cast<unsigned int>(i));
+        entry.node = node;
+        node->setStatus(1);
+        node->setDescription("Port Connector");
+        node->setProperty(108, PropertyValue(designator, true));
+        unsigned char const portType = static_cast<unsigned char>(getNumber8(t, PORT_TYPE));
+        node->setProperty(128, PropertyValue(EnumValue(portType), true));
+    });
     SMBIOS_DETAIL(logger, "makeConnectorNodes exit");
 }
 

@@ -1,4 +1,5 @@
 #include "IC/PropertyValue.h"
+#include "mi/BuilderSkeleton.h"
 #include "mi/SmBiosMI.h"
 #include "mi/builders/DecodeTable.h"
 
@@ -70,91 +71,86 @@ void SmBiosMI::makeCpuNodes(TableLists tables, unsigned int parentNodeId) {
     SMBIOS_DETAIL(logger, "makeCpuNodes entry");
     SMBIOS_DETAIL(logger, "Table 4 count =" << tables[4]->size());
     unsigned int cpuIndex = 0;
-    for (size_t k = 0; k < tables[4]->size(); ++k) {
-        try {
-            TableData const& entry = (*tables[4])[k];
-            SD::SmBios::Table const* t = entry.table;
-            if (t->getType() != 4) {
-                continue;
-            }
-            SD::TableType4 const copy(*t);
-            unsigned int const status = copy.getByte(STATUS);
-            SMBIOS_DETAIL(logger, "Table 4 length = " << entry.length);
-            std::string const socket = getString(t, SOCKET);
-            if ((status & STATUS_MASK) != POPULATED_AND_ENABLED) {
-                continue;
-            }
+    forEachStructure(SMBIOS_HERE, logger, tables, 4, [&](TableData& entry, size_t) {
+        SD::SmBios::Table const* t = entry.table;
+        if (t->getType() != 4) {
+            return;
+        }
+        SD::TableType4 const copy(*t);
+        unsigned int const status = copy.getByte(STATUS);
+        SMBIOS_DETAIL(logger, "Table 4 length = " << entry.length);
+        std::string const socket = getString(t, SOCKET);
+        if ((status & STATUS_MASK) != POPULATED_AND_ENABLED) {
+            return;
+        }
 
-            MutableNode* node = newNode(parentNodeId, 4, cpuIndex);
-            ++cpuIndex;
-            unsigned int const nodeId = node->getNodeId();
-            node->setStatus(decode::lookup(PROCESSOR_STATUSES, status & 0x07, 0u));
-            node->setProperty(125, PropertyValue(numbers({0, 1, 16, 24, 7}), true));
-            // Kept: the description counts from 1 ("CPU 1") while the index
-            // counts from 0; the agent shows the description to people.
-            node->setDescription("CPU " + std::to_string(cpuIndex));
+        MutableNode* node = newNode(parentNodeId, 4, cpuIndex);
+        ++cpuIndex;
+        unsigned int const nodeId = node->getNodeId();
+        node->setStatus(decode::lookup(PROCESSOR_STATUSES, status & 0x07, 0u));
+        node->setProperty(125, PropertyValue(numbers({0, 1, 16, 24, 7}), true));
+        // Kept: the description counts from 1 ("CPU 1") while the index
+        // counts from 0; the agent shows the description to people.
+        node->setDescription("CPU " + std::to_string(cpuIndex));
 
-            propString(t, SOCKET, 53, node);
-            propEnumValue(t, PROCESSOR_TYPE, 296, node);
-            propNumber8(t, FAMILY, 298, node);
-            propString(t, MANUFACTURER, 36, node);
-            propBuffer(t, PROCESSOR_ID, 8, 89, node);
-            unsigned int const stepping = getNumber8(t, PROCESSOR_ID) & 0x0F;
-            SMBIOS_DETAIL(logger, "Processor ID byte1 " << stepping);
-            node->setProperty(124, PropertyValue(std::to_string(stepping), true));
-            if (entry.length > VOLTAGE) {
-                getNumber8(t, VOLTAGE);
-            }
-            propString(t, VERSION, 307, node);
-            propNumber16(t, EXTERNAL_CLOCK, 19, node);
-            propNumber16(t, MAX_SPEED, 38, node);
-            propNumber16(t, CURRENT_SPEED, 80, node);
-            propBool8(t, STATUS, 0x40, 55, node);
-            unsigned int const upgrade = getNumber8(t, UPGRADE);
-            unsigned char const upgradeValue =
-                upgrade >= 2 && upgrade <= 22 ? static_cast<unsigned char>(upgrade - 2) : 0;
-            node->setProperty(304, PropertyValue(EnumValue(upgradeValue), true));
+        propString(t, SOCKET, 53, node);
+        propEnumValue(t, PROCESSOR_TYPE, 296, node);
+        propNumber8(t, FAMILY, 298, node);
+        propString(t, MANUFACTURER, 36, node);
+        propBuffer(t, PROCESSOR_ID, 8, 89, node);
+        unsigned int const stepping = getNumber8(t, PROCESSOR_ID) & 0x0F;
+        SMBIOS_DETAIL(logger, "Processor ID byte1 " << stepping);
+        node->setProperty(124, PropertyValue(std::to_string(stepping), true));
+        if (entry.length > VOLTAGE) {
+            getNumber8(t, VOLTAGE);
+        }
+        propString(t, VERSION, 307, node);
+        propNumber16(t, EXTERNAL_CLOCK, 19, node);
+        propNumber16(t, MAX_SPEED, 38, node);
+        propNumber16(t, CURRENT_SPEED, 80, node);
+        propBool8(t, STATUS, 0x40, 55, node);
+        unsigned int const upgrade = getNumber8(t, UPGRADE);
+        unsigned char const upgradeValue =
+            upgrade >= 2 && upgrade <= 22 ? static_cast<unsigned char>(upgrade - 2) : 0;
+        node->setProperty(304, PropertyValue(EnumValue(upgradeValue), true));
 
-            for (unsigned int level = 0; level < 3; ++level) {
-                unsigned int const cacheHandle = getNumber16(t, CACHE_HANDLES[level]);
-                SMBIOS_DETAIL(logger, CACHE_LABELS[level] << cacheHandle);
-                makeCacheNodes(tables, nodeId, cacheHandle);
-            }
+        for (unsigned int level = 0; level < 3; ++level) {
+            unsigned int const cacheHandle = getNumber16(t, CACHE_HANDLES[level]);
+            SMBIOS_DETAIL(logger, CACHE_LABELS[level] << cacheHandle);
+            makeCacheNodes(tables, nodeId, cacheHandle);
+        }
 
-            propString(t, SERIAL, 50, node);
-            propString(t, ASSET_TAG, 2, node);
-            propString(t, PART_NUMBER, 45, node);
-            bool const wide = getBool16(t, CHARACTERISTICS, 4);
-            SMBIOS_DETAIL(logger, " 64 bit = " << wide);
-            node->setProperty(15, PropertyValue(Number(wide ? 64u : 32u), true));
+        propString(t, SERIAL, 50, node);
+        propString(t, ASSET_TAG, 2, node);
+        propString(t, PART_NUMBER, 45, node);
+        bool const wide = getBool16(t, CHARACTERISTICS, 4);
+        SMBIOS_DETAIL(logger, " 64 bit = " << wide);
+        node->setProperty(15, PropertyValue(Number(wide ? 64u : 32u), true));
 
-            unsigned int const cores = getNumber8(t, CORE_COUNT);
-            unsigned int const enabled = getNumber8(t, CORE_ENABLED);
-            unsigned int const threads = getNumber8(t, THREAD_COUNT);
-            SMBIOS_DETAIL(
-                logger, " Cores =" << cores << " enabled=" << enabled << " thread count=" << threads
-                                   << (cores == 0 ? " - no core data in smbios tables" : ""));
-            node->setProperty(190, PropertyValue(Number(cores), true));
-            node->setProperty(189, PropertyValue(Number(enabled), true));
-            node->setProperty(87, PropertyValue(Number(threads), true));
+        unsigned int const cores = getNumber8(t, CORE_COUNT);
+        unsigned int const enabled = getNumber8(t, CORE_ENABLED);
+        unsigned int const threads = getNumber8(t, THREAD_COUNT);
+        SMBIOS_DETAIL(logger, " Cores =" << cores << " enabled=" << enabled
+                                         << " thread count=" << threads
+                                         << (cores == 0 ? " - no core data in smbios tables" : ""));
+        node->setProperty(190, PropertyValue(Number(cores), true));
+        node->setProperty(189, PropertyValue(Number(enabled), true));
+        node->setProperty(87, PropertyValue(Number(threads), true));
 
-            // Every core carries the whole processor's thread count.
-            for (unsigned int c = 0; c < cores; ++c) {
-                MutableNode* core = newNode(nodeId, 42, c);
-                core->setDescription("CPU Core Information");
-                core->setStatus(c < enabled ? 1 : 16);
-                core->setProperty(125, PropertyValue(numbers({1, 16}), true));
-                core->setProperty(128,
-                                  PropertyValue(EnumValue(static_cast<unsigned char>(0)), true));
-                if (threads != 0) {
-                    // Kept: every core carries the whole processor's thread
-                    // count, as the agent's reports expect.
-                    core->setProperty(87, PropertyValue(Number(threads), true));
-                }
+        // Every core carries the whole processor's thread count.
+        for (unsigned int c = 0; c < cores; ++c) {
+            MutableNode* core = newNode(nodeId, 42, c);
+            core->setDescription("CPU Core Information");
+            core->setStatus(c < enabled ? 1 : 16);
+            core->setProperty(125, PropertyValue(numbers({1, 16}), true));
+            core->setProperty(128, PropertyValue(EnumValue(static_cast<unsigned char>(0)), true));
+            if (threads != 0) {
+                // Kept: every core carries the whole processor's thread
+                // count, as the agent's reports expect.
+                core->setProperty(87, PropertyValue(Number(threads), true));
             }
         }
-        SMBIOSMI_CATCH_STRUCTURE(logger, 4, k)
-    }
+    });
     SMBIOS_DETAIL(logger, "makeCpuNodes exit");
 }
 

@@ -1,4 +1,5 @@
 #include "IC/PropertyValue.h"
+#include "mi/BuilderSkeleton.h"
 #include "mi/SmBiosMI.h"
 
 namespace IC {
@@ -74,51 +75,67 @@ void SmBiosMI::makeKVDNode(TableLists tables, unsigned int parentId) {
     SMBIOS_DETAIL(logger, "make"
                               << "KVD"
                               << "Nodes entry");
+    SD::SourcePlace const here = SMBIOS_HERE;
     for (size_t k = 0; k < tables[11]->size(); ++k) {
         unsigned int ix = 0;
-        try {
-            TableData& entry = (*tables[11])[k];
-            SD::SmBios::Table const* t = entry.table;
-            unsigned int const count = getNumber8(t, OEM_COUNT);
-            SMBIOS_DETAIL(logger, "String count = " << count);
-            bool accepted = false;
-            KVDVersion version;
-            for (ix = 1; ix <= count && !accepted; ++ix) {
-                SMBIOS_DETAIL(logger, "Reading ix = " << ix);
-                std::string const s = getStrByIdx(t, static_cast<unsigned char>(ix));
-                SMBIOS_DETAIL(logger, "Read string " << ix << ": " << s);
-                if (s.find(eyecat) == std::string::npos) {
-                    continue;
-                }
-                SMBIOS_DETAIL(logger, "Found KVD string: " << s);
-                accepted = parseKVDString(s, version);
-            }
-            if (accepted) {
-                SMBIOS_DETAIL(logger, "Table " << 11 << " length = " << entry.length);
-                MutableNode* node = newNode(parentId, 53, static_cast<unsigned int>(k));
-                entry.node = node;
-                node->setStatus(1);
-                node->setDescription("Corvane Preboot Diagnostics (KVD)");
-                node->setProperty(134, PropertyValue(version.text, true));
-                node->setProperty(104, PropertyValue(Number(version.major), true));
-                node->setProperty(107, PropertyValue(Number(version.minor), true));
-                node->setProperty(171, PropertyValue(version.build, true));
-            }
-        } catch (ICException const& e) {
-            SMBIOS_ERROR(logger, "ICException=" << e.what() << " Table " << 11 << " index =" << k
-                                                << "string index = " << ix);
-        } catch (std::exception const& e) {
-            SMBIOS_ERROR(logger, "Exception=" << e.what() << " Type=" << typeid(e).name()
-                                              << " Table " << 11 << " index =" << k
-                                              << "string index = " << ix);
-        } catch (...) {
-            SMBIOS_ERROR(logger,
-                         "Error in table " << 11 << " index " << k << "string index = " << ix);
-        }
+        TableData& entry = (*tables[11])[k];
+        // The diagnostics' failure lines also name the string index reached.
+        guarded([&] { makeKVDNodeOf(entry, parentId, static_cast<unsigned int>(k), ix); },
+                [&](Failure kind, char const* what, char const* typeName) {
+                    switch (kind) {
+                        case Failure::IC_EXCEPTION:
+                            SMBIOS_ERROR_AT(here, logger,
+                                            "ICException=" << what << " Table " << 11 << " index ="
+                                                           << k << "string index = " << ix);
+                            break;
+                        case Failure::STD_EXCEPTION:
+                            SMBIOS_ERROR_AT(here, logger,
+                                            "Exception=" << what << " Type=" << typeName
+                                                         << " Table " << 11 << " index =" << k
+                                                         << "string index = " << ix);
+                            break;
+                        case Failure::OTHER:
+                            SMBIOS_ERROR_AT(here, logger,
+                                            "Error in table " << 11 << " index " << k
+                                                              << "string index = " << ix);
+                            break;
+                    }
+                });
     }
     SMBIOS_DETAIL(logger, "make"
                               << "KVD"
                               << "Nodes exit");
+}
+
+void SmBiosMI::makeKVDNodeOf(TableData& entry, unsigned int parentId, unsigned int index,
+                             unsigned int& ix) {
+    SD::SmBios::Table const* t = entry.table;
+    unsigned int const count = getNumber8(t, OEM_COUNT);
+    SMBIOS_DETAIL(logger, "String count = " << count);
+    bool accepted = false;
+    KVDVersion version;
+    for (ix = 1; ix <= count && !accepted; ++ix) {
+        SMBIOS_DETAIL(logger, "Reading ix = " << ix);
+        std::string const s = getStrByIdx(t, static_cast<unsigned char>(ix));
+        SMBIOS_DETAIL(logger, "Read string " << ix << ": " << s);
+        if (s.find(eyecat) == std::string::npos) {
+            continue;
+        }
+        SMBIOS_DETAIL(logger, "Found KVD string: " << s);
+        accepted = parseKVDString(s, version);
+    }
+    if (!accepted) {
+        return;
+    }
+    SMBIOS_DETAIL(logger, "Table " << 11 << " length = " << entry.length);
+    MutableNode* node = newNode(parentId, 53, index);
+    entry.node = node;
+    node->setStatus(1);
+    node->setDescription("Corvane Preboot Diagnostics (KVD)");
+    node->setProperty(134, PropertyValue(version.text, true));
+    node->setProperty(104, PropertyValue(Number(version.major), true));
+    node->setProperty(107, PropertyValue(Number(version.minor), true));
+    node->setProperty(171, PropertyValue(version.build, true));
 }
 
 }  // namespace IC

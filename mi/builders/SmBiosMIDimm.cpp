@@ -1,4 +1,5 @@
 #include "IC/PropertyValue.h"
+#include "mi/BuilderSkeleton.h"
 #include "mi/SmBiosMI.h"
 
 namespace IC {
@@ -63,78 +64,69 @@ void SmBiosMI::makeDimmNodes(TableLists tables, unsigned int parentNodeId) {
     SMBIOS_DETAIL(logger, "Table 5 count =" << tables[5]->size());
     SMBIOS_DETAIL(logger, "Table 6 count =" << tables[6]->size());
     SMBIOS_DETAIL(logger, "Table 16 count =" << tables[16]->size());
-    for (size_t p = 0; p < tables[16]->size(); ++p) {
-        try {
-            TableData const& entry = (*tables[16])[p];
-            SD::SmBios::Table const* t = entry.table;
-            MutableNode* node = newNode(parentNodeId, 32, static_cast<unsigned int>(p));
-            node->setStatus(1);
-            node->setDescription("Memory Array");
-            propEnumValue(t, ARRAY_LOCATION, 302, node);
-            propEnumValue(t, ARRAY_USE, 303, node);
-            propEnumValue(t, ARRAY_ERROR_CORRECTION, 300, node);
-            if (entry.length > 0x0A) {
-                unsigned int const capacity = t->getDWord(ARRAY_MAXIMUM_CAPACITY);
-                if (capacity != CAPACITY_UNKNOWN) {
-                    node->setProperty(37, PropertyValue(Number(capacity), true));
-                }
+    forEachStructure(SMBIOS_HERE, logger, tables, 16, [&](TableData& entry, size_t p) {
+        SD::SmBios::Table const* t = entry.table;
+        MutableNode* node = newNode(parentNodeId, 32, static_cast<unsigned int>(p));
+        node->setStatus(1);
+        node->setDescription("Memory Array");
+        propEnumValue(t, ARRAY_LOCATION, 302, node);
+        propEnumValue(t, ARRAY_USE, 303, node);
+        propEnumValue(t, ARRAY_ERROR_CORRECTION, 300, node);
+        if (entry.length > 0x0A) {
+            unsigned int const capacity = t->getDWord(ARRAY_MAXIMUM_CAPACITY);
+            if (capacity != CAPACITY_UNKNOWN) {
+                node->setProperty(37, PropertyValue(Number(capacity), true));
             }
-            // Kept: property 301 comes from the error-information handle at
-            // 0x0B, not the device count at 0x0D; the agent's reports use it so.
-            propNumber16(t, ARRAY_ERROR_HANDLE, 301, node);
-            SMBIOS_DETAIL(logger, "Table 16 length = " << entry.length);
         }
-        SMBIOSMI_CATCH_STRUCTURE(logger, 16, p)
-    }
+        // Kept: property 301 comes from the error-information handle at
+        // 0x0B, not the device count at 0x0D; the agent's reports use it so.
+        propNumber16(t, ARRAY_ERROR_HANDLE, 301, node);
+        SMBIOS_DETAIL(logger, "Table 16 length = " << entry.length);
+    });
 
     SMBIOS_DETAIL(logger, "Table 17 count =" << tables[17]->size());
     unsigned int deviceIndex = 0;
-    for (size_t p = 0; p < tables[17]->size(); ++p) {
-        try {
-            TableData const& entry = (*tables[17])[p];
-            SD::SmBios::Table const* t = entry.table;
-            SMBIOS_DETAIL(logger, "Table 17 length = " << entry.length);
-            unsigned int const size = deviceSize(t, entry.length);
-            if (size == 0) {
-                continue;
-            }
-            MutableNode* node = newNode(parentNodeId, 19, deviceIndex++);
-            node->setStatus(1);
-            node->setProperty(125,
-                              PropertyValue(std::vector<Number>{Number(1u), Number(14u)}, true));
-            node->setProperty(112, PropertyValue(Number(size), true));
-            node->setProperty(73, PropertyValue(Number(size), true));
-            propNumber16(t, TOTAL_WIDTH, 61, node);
-            propNumber16(t, DATA_WIDTH, 15, node);
-            node->setProperty(69, PropertyValue(Number(1024u), true));
-            unsigned int const formFactor = getNumber8(t, FORM_FACTOR);
-            node->setProperty(
-                85, PropertyValue(EnumValue(formFactor <= 0x0F ? FORM_FACTORS[formFactor]
-                                                               : static_cast<unsigned char>(0)),
-                                  true));
-            if (entry.length > 0x11) {
-                std::string const device = getString(t, DEVICE_LOCATOR);
-                std::string const bank = getString(t, BANK_LOCATOR);
-                std::string const locator =
-                    !device.empty() && !bank.empty() ? device + ":" + bank : device + bank;
-                if (!locator.empty()) {
-                    node->setProperty(68, PropertyValue(locator, true));
-                    node->setDescription(locator);
-                }
-            }
-            unsigned int const memoryType = getNumber8(t, MEMORY_TYPE);
-            node->setProperty(
-                295, PropertyValue(EnumValue(memoryType <= 0x19 ? MEMORY_TYPES[memoryType]
-                                                                : static_cast<unsigned char>(1)),
-                                   true));
-            node->setProperty(135, PropertyValue(Number(getBool16(t, TYPE_DETAIL, 0x1000)), true));
-            propNumber16(t, SPEED, 57, node);
-            propString(t, MANUFACTURER, 36, node);
-            propString(t, SERIAL, 50, node);
-            propString(t, PART_NUMBER, 45, node);
+    forEachStructure(SMBIOS_HERE, logger, tables, 17, [&](TableData& entry, size_t) {
+        SD::SmBios::Table const* t = entry.table;
+        SMBIOS_DETAIL(logger, "Table 17 length = " << entry.length);
+        unsigned int const size = deviceSize(t, entry.length);
+        if (size == 0) {
+            return;
         }
-        SMBIOSMI_CATCH_STRUCTURE(logger, 17, p)
-    }
+        MutableNode* node = newNode(parentNodeId, 19, deviceIndex++);
+        node->setStatus(1);
+        node->setProperty(125, PropertyValue(std::vector<Number>{Number(1u), Number(14u)}, true));
+        node->setProperty(112, PropertyValue(Number(size), true));
+        node->setProperty(73, PropertyValue(Number(size), true));
+        propNumber16(t, TOTAL_WIDTH, 61, node);
+        propNumber16(t, DATA_WIDTH, 15, node);
+        node->setProperty(69, PropertyValue(Number(1024u), true));
+        unsigned int const formFactor = getNumber8(t, FORM_FACTOR);
+        node->setProperty(
+            85, PropertyValue(EnumValue(formFactor <= 0x0F ? FORM_FACTORS[formFactor]
+                                                           : static_cast<unsigned char>(0)),
+                              true));
+        if (entry.length > 0x11) {
+            std::string const device = getString(t, DEVICE_LOCATOR);
+            std::string const bank = getString(t, BANK_LOCATOR);
+            std::string const locator =
+                !device.empty() && !bank.empty() ? device + ":" + bank : device + bank;
+            if (!locator.empty()) {
+                node->setProperty(68, PropertyValue(locator, true));
+                node->setDescription(locator);
+            }
+        }
+        unsigned int const memoryType = getNumber8(t, MEMORY_TYPE);
+        node->setProperty(
+            295, PropertyValue(EnumValue(memoryType <= 0x19 ? MEMORY_TYPES[memoryType]
+                                                            : static_cast<unsigned char>(1)),
+                               true));
+        node->setProperty(135, PropertyValue(Number(getBool16(t, TYPE_DETAIL, 0x1000)), true));
+        propNumber16(t, SPEED, 57, node);
+        propString(t, MANUFACTURER, 36, node);
+        propString(t, SERIAL, 50, node);
+        propString(t, PART_NUMBER, 45, node);
+    });
     SMBIOS_DETAIL(logger, "makeDimmNodes exit");
 }
 

@@ -1,4 +1,5 @@
 #include "IC/PropertyValue.h"
+#include "mi/BuilderSkeleton.h"
 #include "mi/SmBiosMI.h"
 
 namespace IC {
@@ -25,42 +26,40 @@ void SmBiosMI::makeDiskControllerNodes(TableLists tables, unsigned int parentId)
     SMBIOS_DETAIL(logger, "make"
                               << "DiskController"
                               << "Nodes entry");
-    for (size_t k = 0; k < tables[11]->size(); ++k) {
-        try {
-            TableData& entry = (*tables[11])[k];
-            SD::SmBios::Table const* t = entry.table;
-            unsigned int const count = getNumber8(t, OEM_COUNT);
-            // Kept: every structure uses up a node id before its strings are
-            // looked at, so one without the IDE string leaves a gap in the ids;
-            // the agent's stored trees carry these ids.
-            unsigned int const nodeId = takeNodeId();
-            if (count == 0) {
+    // Kept: a failure here is logged as one of table 8; log searches expect it.
+    forEachStructure(SMBIOS_HERE, logger, tables, 11, 8, [&](TableData& entry, size_t) {
+        SD::SmBios::Table const* t = entry.table;
+        unsigned int const count = getNumber8(t, OEM_COUNT);
+        // Kept: every structure uses up a node id before its strings are
+        // looked at, so one without the IDE string leaves a gap in the ids;
+        // the agent's stored trees carry these ids.
+        unsigned int const nodeId = takeNodeId();
+        if (count == 0) {
+            return;
+        }
+        for (unsigned int i = 1; i <= count; ++i) {
+            std::string const text =
+                withoutTrailingBlanks(getStrByIdx(t, static_cast<unsigned char>(i)));
+            bool const enabled = text == IDE_ENABLED;
+            if (!enabled && text != IDE_DISABLED) {
                 continue;
             }
-            for (unsigned int i = 1; i <= count; ++i) {
-                std::string const text =
-                    withoutTrailingBlanks(getStrByIdx(t, static_cast<unsigned char>(i)));
-                bool const enabled = text == IDE_ENABLED;
-                if (!enabled && text != IDE_DISABLED) {
-                    continue;
-                }
-                // Kept: the index is always 1.
-                MutableNode* node = addNode(new MutableNode(nodeId, parentId, miIdList, 50, 1));
-                entry.node = node;
-                node->setProperty(
-                    125, PropertyValue(std::vector<Number>{Number(1u), Number(16u)}, true));
-                node->setProperty(85, PropertyValue(Number(0u), true));
-                node->setProperty(185, PropertyValue(Number(36u), true));
-                node->setProperty(81, PropertyValue(Number(2u), true));
-                node->setStatus(enabled ? 1 : 16);
-                node->setProperty(128, PropertyValue("IDE Bus", true));
-                node->setDescription("IDE Bus");
-                node->setProperty(44, PropertyValue("Other", true));
-                break;
-            }
+            // Kept: the index is always 1.
+            MutableNode* node =
+                addNode(std::make_unique<MutableNode>(nodeId, parentId, miIdList, 50, 1));
+            entry.node = node;
+            node->setProperty(125,
+                              PropertyValue(std::vector<Number>{Number(1u), Number(16u)}, true));
+            node->setProperty(85, PropertyValue(Number(0u), true));
+            node->setProperty(185, PropertyValue(Number(36u), true));
+            node->setProperty(81, PropertyValue(Number(2u), true));
+            node->setStatus(enabled ? 1 : 16);
+            node->setProperty(128, PropertyValue("IDE Bus", true));
+            node->setDescription("IDE Bus");
+            node->setProperty(44, PropertyValue("Other", true));
+            break;
         }
-        SMBIOSMI_CATCH_STRUCTURE(logger, 8, k)
-    }
+    });
     SMBIOS_DETAIL(logger, "make"
                               << "DiskController"
                               << "Nodes exit");

@@ -2,6 +2,7 @@
 
 #include "IC/PropertyValue.h"
 #include "IC/Version2.h"
+#include "mi/BuilderSkeleton.h"
 #include "mi/SmBiosMI.h"
 
 namespace IC {
@@ -28,6 +29,24 @@ unsigned int versionNumber(std::string const& text) {
 unsigned int minorVersion(std::string const& version) {
     size_t const dot = version.find('.');
     return dot == std::string::npos ? 0 : versionNumber(version.substr(dot + 1));
+}
+
+// The build id (70) and version (134) from "[BUILD-VERSION]" in a BIOS
+// version string; false when it holds no such part.
+bool setBracketedVersion(std::string const& version, MutableNode* node) {
+    size_t const p = version.find('[');
+    size_t const q = version.find(']');
+    if (p == std::string::npos || q == std::string::npos) {
+        return false;
+    }
+    std::string const inner = version.substr(p + 1, q - p - 1);
+    size_t const d = inner.find('-');
+    if (d == std::string::npos) {
+        return false;
+    }
+    node->setProperty(134, PropertyValue(inner.substr(d + 1), true));
+    node->setProperty(70, PropertyValue(inner.substr(0, d), true));
+    return true;
 }
 
 }  // namespace
@@ -116,105 +135,95 @@ void SmBiosMI::makeFirmwareNodes(TableLists tables, unsigned int parentId) {
                               << "Nodes entry");
     bool uefi = false;
     unsigned int ordinal = 1;
+    SD::SourcePlace const here = SMBIOS_HERE;
     for (size_t k = 0; k < tables[11]->size(); ++k) {
-        try {
-            TableData& entry = (*tables[11])[k];
-            SD::SmBios::Table const* t = entry.table;
-            unsigned int const count = getNumber8(t, OEM_COUNT);
-            if (count == 0) {
-                continue;
-            }
-            for (unsigned int i = 1; i <= count; ++i) {
-                std::string const s = getStrByIdx(t, static_cast<unsigned char>(i));
-                if (s.empty()) {
-                    SMBIOS_DETAIL(logger, "OEM string is NULL");
-                    break;
-                }
-                bool const diagnostics = s.find("Diagnostics") != std::string::npos;
-                bool const serviceProcessor = s.find("Ostrel") != std::string::npos;
-                bool const uefiString = s.find("UEFI") != std::string::npos;
-                if (!diagnostics && !serviceProcessor && !uefiString) {
-                    continue;
-                }
-                if (!diagnostics && uefiString) {
-                    uefi = true;
-                    continue;
-                }
-                std::string const name = diagnostics ? "Diagnostics" : "OTL";
-                MutableNode* node = newNode(parentId, 3, ordinal++);
-                entry.node = node;
-                node->setDescription(name);
-                node->setProperty(108, PropertyValue(name, true));
-                node->setStatus(1);
-                node->setProperty(36, PropertyValue("Corvane", true));
-                parseFirmwareOemString(s, node);
-                makeLogNodes(tables, node->getNodeId());
-            }
-        }
-        // Kept: the failure messages of this phase name table 0 and the
-        // firmware ordinal minus one, as log searches expect.
-        SMBIOSMI_CATCH_STRUCTURE(logger, 0, ordinal - 1)
+        TableData& entry = (*tables[11])[k];
+        guarded([&] { makeOemFirmwareNodes(tables, entry, parentId, ordinal, uefi); },
+                // Kept: the failure messages of this phase name table 0 and
+                // the firmware ordinal minus one, as log searches expect.
+                [&](Failure kind, char const* what, char const* typeName) {
+                    logStructureFailure(here, logger, 0, ordinal - 1, kind, what, typeName);
+                });
     }
 
     std::string const baseName = uefi ? "UEFI" : "BIOS";
-    for (size_t k = 0; k < tables[0]->size(); ++k) {
-        try {
-            TableData& entry = (*tables[0])[k];
-            SD::SmBios::Table const* t = entry.table;
-            SMBIOS_DETAIL(logger, "Table " << 0 << " length = " << entry.length);
-            MutableNode* node = newNode(parentId, 3, ordinal++);
-            entry.node = node;
-            node->setStatus(1);
-            node->setDescription(baseName);
-            propString(t, VENDOR, 36, node);
-            propString(t, RELEASE_DATE, 164, node);
-            node->setProperty(108, PropertyValue(baseName, true));
-            std::string const version = getString(t, BIOS_VERSION);
-            node->setProperty(307, PropertyValue(version, true));
-
-            size_t const p = version.find('[');
-            size_t const q = version.find(']');
-            bool parsed = false;
-            if (p != std::string::npos && q != std::string::npos) {
-                std::string const inner = version.substr(p + 1, q - p - 1);
-                size_t const d = inner.find('-');
-                if (d != std::string::npos) {
-                    node->setProperty(134, PropertyValue(inner.substr(d + 1), true));
-                    node->setProperty(70, PropertyValue(inner.substr(0, d), true));
-                    parsed = true;
-                }
-            }
-            if (!parsed) {
-                SMBIOS_ERROR(logger,
-                             "Error reading standard format of version and build number "
-                             "for Planar Firmware");
-                propString(t, BIOS_VERSION, 134, node);
-            }
-
-            if (entry.length > 21) {
-                node->setProperty(
-                    175,
-                    PropertyValue(Number(Version2(smbiosMajorVersion, smbiosMinorVersion)), true));
-                // Kept: the BIOS node's 104 and 107 carry the SMBIOS version,
-                // unlike the OEM-string images'; the agent's reports expect it.
-                node->setProperty(104, PropertyValue(Number(smbiosMajorVersion), true));
-                node->setProperty(107, PropertyValue(Number(smbiosMinorVersion), true));
-            }
-            if (entry.length > 22) {
-                unsigned int const major = getNumber8(t, EC_MAJOR);
-                unsigned int const minor = getNumber8(t, EC_MINOR);
-                if (major < EC_NOT_SUPPORTED && minor < EC_NOT_SUPPORTED) {
-                    node->setProperty(187, PropertyValue(Number(major), true));
-                    node->setProperty(188, PropertyValue(Number(minor), true));
-                }
-            }
-            makeLogNodes(tables, node->getNodeId());
-        }
-        SMBIOSMI_CATCH_STRUCTURE(logger, 0, k)
-    }
+    forEachStructure(SMBIOS_HERE, logger, tables, 0, [&](TableData& entry, size_t) {
+        SMBIOS_DETAIL(logger, "Table " << 0 << " length = " << entry.length);
+        MutableNode* node = newNode(parentId, 3, ordinal++);
+        entry.node = node;
+        setBiosFirmwareProperties(entry, baseName, node);
+        makeLogNodes(tables, node->getNodeId());
+    });
     SMBIOS_DETAIL(logger, "make"
                               << "Firmware"
                               << "Nodes exit");
+}
+
+void SmBiosMI::makeOemFirmwareNodes(TableLists tables, TableData& entry, unsigned int parentId,
+                                    unsigned int& ordinal, bool& uefi) {
+    SD::SmBios::Table const* t = entry.table;
+    unsigned int const count = getNumber8(t, OEM_COUNT);
+    for (unsigned int i = 1; i <= count; ++i) {
+        std::string const s = getStrByIdx(t, static_cast<unsigned char>(i));
+        if (s.empty()) {
+            SMBIOS_DETAIL(logger, "OEM string is NULL");
+            break;
+        }
+        bool const diagnostics = s.find("Diagnostics") != std::string::npos;
+        bool const serviceProcessor = s.find("Ostrel") != std::string::npos;
+        bool const uefiString = s.find("UEFI") != std::string::npos;
+        if (!diagnostics && !serviceProcessor && !uefiString) {
+            continue;
+        }
+        if (!diagnostics && uefiString) {
+            uefi = true;
+            continue;
+        }
+        std::string const name = diagnostics ? "Diagnostics" : "OTL";
+        MutableNode* node = newNode(parentId, 3, ordinal++);
+        entry.node = node;
+        node->setDescription(name);
+        node->setProperty(108, PropertyValue(name, true));
+        node->setStatus(1);
+        node->setProperty(36, PropertyValue("Corvane", true));
+        parseFirmwareOemString(s, node);
+        makeLogNodes(tables, node->getNodeId());
+    }
+}
+
+void SmBiosMI::setBiosFirmwareProperties(TableData const& entry, std::string const& name,
+                                         MutableNode* node) {
+    SD::SmBios::Table const* t = entry.table;
+    node->setStatus(1);
+    node->setDescription(name);
+    propString(t, VENDOR, 36, node);
+    propString(t, RELEASE_DATE, 164, node);
+    node->setProperty(108, PropertyValue(name, true));
+    std::string const version = getString(t, BIOS_VERSION);
+    node->setProperty(307, PropertyValue(version, true));
+    if (!setBracketedVersion(version, node)) {
+        SMBIOS_ERROR(logger,
+                     "Error reading standard format of version and build number "
+                     "for Planar Firmware");
+        propString(t, BIOS_VERSION, 134, node);
+    }
+
+    if (entry.length > 21) {
+        node->setProperty(
+            175, PropertyValue(Number(Version2(smbiosMajorVersion, smbiosMinorVersion)), true));
+        // Kept: the BIOS node's 104 and 107 carry the SMBIOS version,
+        // unlike the OEM-string images'; the agent's reports expect it.
+        node->setProperty(104, PropertyValue(Number(smbiosMajorVersion), true));
+        node->setProperty(107, PropertyValue(Number(smbiosMinorVersion), true));
+    }
+    if (entry.length > 22) {
+        unsigned int const major = getNumber8(t, EC_MAJOR);
+        unsigned int const minor = getNumber8(t, EC_MINOR);
+        if (major < EC_NOT_SUPPORTED && minor < EC_NOT_SUPPORTED) {
+            node->setProperty(187, PropertyValue(Number(major), true));
+            node->setProperty(188, PropertyValue(Number(minor), true));
+        }
+    }
 }
 
 }  // namespace IC

@@ -1,4 +1,5 @@
 #include "IC/PropertyValue.h"
+#include "mi/BuilderSkeleton.h"
 #include "mi/SmBiosMI.h"
 
 namespace IC {
@@ -36,58 +37,54 @@ void SmBiosMI::makeLogNodes(TableLists tables, unsigned int parentId) {
     SMBIOS_DETAIL(logger, "make"
                               << "Log"
                               << "Nodes entry");
-    for (size_t k = 0; k < tables[15]->size(); ++k) {
-        try {
-            TableData& entry = (*tables[15])[k];
-            SD::SmBios::Table const* t = entry.table;
-            SMBIOS_DETAIL(logger, "Table " << 15 << " length = " << entry.length);
-            MutableNode* node = newNode(parentId, 35, static_cast<unsigned int>(k));
-            entry.node = node;
-            node->setDescription("SmBios System Event Log");
-            node->setProperty(108, PropertyValue("System Management BIOS System Event Log", true));
-            unsigned int const areaLength = getNumber16(t, AREA_LENGTH);
-            node->setProperty(37, PropertyValue(Number(areaLength), true));
-            if (areaLength == 0) {
-                node->setStatus(16);
-            } else {
-                node->setStatus(30);
-                if (getBool8(t, LOG_STATUS, 1)) {
-                    node->setStatus(getBool8(t, LOG_STATUS, 2) ? 31 : 1);
-                }
+    forEachStructure(SMBIOS_HERE, logger, tables, 15, [&](TableData& entry, size_t k) {
+        SD::SmBios::Table const* t = entry.table;
+        SMBIOS_DETAIL(logger, "Table " << 15 << " length = " << entry.length);
+        MutableNode* node = newNode(parentId, 35, static_cast<unsigned int>(k));
+        entry.node = node;
+        node->setDescription("SmBios System Event Log");
+        node->setProperty(108, PropertyValue("System Management BIOS System Event Log", true));
+        unsigned int const areaLength = getNumber16(t, AREA_LENGTH);
+        node->setProperty(37, PropertyValue(Number(areaLength), true));
+        if (areaLength == 0) {
+            node->setStatus(16);
+        } else {
+            node->setStatus(30);
+            if (getBool8(t, LOG_STATUS, 1)) {
+                node->setStatus(getBool8(t, LOG_STATUS, 2) ? 31 : 1);
             }
-            node->setProperty(125, PropertyValue(std::vector<Number>{Number(30u), Number(1u),
-                                                                     Number(16u), Number(31u)},
-                                                 true));
-
-            // The header fields are only logged, but each is read whatever
-            // the log thresholds: a field cut off by a short structure ends
-            // this structure's handling at every level alike.
-            unsigned int const handle = getNumber16(t, HANDLE);
-            SMBIOS_DETAIL(logger, "Handle=" << handle);
-            unsigned int const headerStart = getNumber16(t, HEADER_START);
-            SMBIOS_DETAIL(logger, "Log Header Start offset=" << headerStart);
-            unsigned int const dataStart = getNumber16(t, DATA_START);
-            SMBIOS_DETAIL(logger, "Log Data Start offset=" << dataStart);
-            unsigned int const accessMethod = getNumber8(t, ACCESS_METHOD);
-            SMBIOS_DETAIL(logger, "Access Method=" << accessMethod);
-            unsigned int const logStatus = getNumber8(t, LOG_STATUS);
-            SMBIOS_DETAIL(logger, "Log Status=" << logStatus);
-            std::vector<unsigned char> const changeToken = getBuffer(t, CHANGE_TOKEN, 4);
-            SMBIOS_DETAIL(logger, "Log Change Status=" << bytesText(changeToken));
-            std::vector<unsigned char> const accessAddress = getBuffer(t, ACCESS_ADDRESS, 4);
-            SMBIOS_DETAIL(logger, "Access Method Address=" << bytesText(accessAddress));
-            unsigned int const headerFormat = getNumber8(t, HEADER_FORMAT);
-            SMBIOS_DETAIL(logger, "Log Header Format=" << headerFormat);
-            unsigned int const descriptorCount = getNumber8(t, DESCRIPTOR_COUNT);
-            unsigned int const descriptorLength = getNumber8(t, DESCRIPTOR_LENGTH);
-            SMBIOS_DETAIL(logger, "Number of Log Type Descriptors=" << descriptorCount);
-            SMBIOS_DETAIL(logger, "Log Type Descriptor Length=" << descriptorLength);
-            std::vector<unsigned char> const descriptors =
-                getBufferUnprot(t, DESCRIPTORS, descriptorCount * descriptorLength);
-            SMBIOS_DETAIL(logger, "Log Type Descriptors=" << bytesText(descriptors));
         }
-        SMBIOSMI_CATCH_STRUCTURE(logger, 15, k)
-    }
+        node->setProperty(
+            125, PropertyValue(
+                     std::vector<Number>{Number(30u), Number(1u), Number(16u), Number(31u)}, true));
+
+        // The header fields are only logged, but each is read whatever
+        // the log thresholds: a field cut off by a short structure ends
+        // this structure's handling at every level alike.
+        unsigned int const handle = getNumber16(t, HANDLE);
+        SMBIOS_DETAIL(logger, "Handle=" << handle);
+        unsigned int const headerStart = getNumber16(t, HEADER_START);
+        SMBIOS_DETAIL(logger, "Log Header Start offset=" << headerStart);
+        unsigned int const dataStart = getNumber16(t, DATA_START);
+        SMBIOS_DETAIL(logger, "Log Data Start offset=" << dataStart);
+        unsigned int const accessMethod = getNumber8(t, ACCESS_METHOD);
+        SMBIOS_DETAIL(logger, "Access Method=" << accessMethod);
+        unsigned int const logStatus = getNumber8(t, LOG_STATUS);
+        SMBIOS_DETAIL(logger, "Log Status=" << logStatus);
+        std::vector<unsigned char> const changeToken = getBuffer(t, CHANGE_TOKEN, 4);
+        SMBIOS_DETAIL(logger, "Log Change Status=" << bytesText(changeToken));
+        std::vector<unsigned char> const accessAddress = getBuffer(t, ACCESS_ADDRESS, 4);
+        SMBIOS_DETAIL(logger, "Access Method Address=" << bytesText(accessAddress));
+        unsigned int const headerFormat = getNumber8(t, HEADER_FORMAT);
+        SMBIOS_DETAIL(logger, "Log Header Format=" << headerFormat);
+        unsigned int const descriptorCount = getNumber8(t, DESCRIPTOR_COUNT);
+        unsigned int const descriptorLength = getNumber8(t, DESCRIPTOR_LENGTH);
+        SMBIOS_DETAIL(logger, "Number of Log Type Descriptors=" << descriptorCount);
+        SMBIOS_DETAIL(logger, "Log Type Descriptor Length=" << descriptorLength);
+        std::vector<unsigned char> const descriptors =
+            getBufferUnprot(t, DESCRIPTORS, descriptorCount * descriptorLength);
+        SMBIOS_DETAIL(logger, "Log Type Descriptors=" << bytesText(descriptors));
+    });
     SMBIOS_DETAIL(logger, "make"
                               << "Log"
                               << "Nodes exit");

@@ -1,3 +1,4 @@
+#include "mi/BuilderSkeleton.h"
 #include "mi/SmBiosMI.h"
 
 namespace IC {
@@ -12,17 +13,14 @@ void SmBiosMI::makeBMCNodes(TableLists tables, unsigned int parentId) {
     SMBIOS_DETAIL(logger, "make"
                               << "BMC"
                               << "Nodes entry");
-    for (size_t k = 0; k < tables[38]->size(); ++k) {
-        try {
-            SMBIOS_DETAIL(logger, "Table " << 38 << " length = " << (*tables[38])[k].length);
-            MutableNode* node = newNode(parentId, 13, static_cast<unsigned int>(k));
-            node->setStatus(1);
-            node->setDescription("BMC");
-            makeLogNodes(tables, node->getNodeId());
-            makeFirmwareNodes(tables, node->getNodeId());
-        }
-        SMBIOSMI_CATCH_STRUCTURE(logger, 38, k)
-    }
+    forEachStructure(SMBIOS_HERE, logger, tables, 38, [&](TableData& /*entry*/, size_t k) {
+        SMBIOS_DETAIL(logger, "Table " << 38 << " length = " << (*tables[38])[k].length);
+        MutableNode* node = newNode(parentId, 13, static_cast<unsigned int>(k));
+        node->setStatus(1);
+        node->setDescription("BMC");
+        makeLogNodes(tables, node->getNodeId());
+        makeFirmwareNodes(tables, node->getNodeId());
+    });
     SMBIOS_DETAIL(logger, "make"
                               << "BMC"
                               << "Nodes exit");

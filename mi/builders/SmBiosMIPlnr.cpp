@@ -1,6 +1,7 @@
 #include <memory>
 
 #include "IC/PropertyValue.h"
+#include "mi/BuilderSkeleton.h"
 #include "mi/SmBiosMI.h"
 
 namespace IC {
@@ -70,151 +71,149 @@ void SmBiosMI::makePlanarNodes(TableLists tables, unsigned int parentNodeId) {
 
     if (tables[2]->empty()) {
         SMBIOS_DETAIL(logger, "No Table 2 for Planar");
-        try {
-            MutableNode* node = newNode(parentNodeId, 41, 0);
-            node->setStatus(1);
-            node->setDescription("Planar");
-            unsigned int const planarId = node->getNodeId();
-            // Kept: this order differs from the one with a baseboard below;
-            // node ids, and so the agent's stored inventory, follow it.
-            makeCpuNodes(tables, planarId);
-            makeSlotNodes(tables, planarId);
-            makeConnectorNodes(tables, planarId);
-            makeDimmNodes(tables, planarId);
-            makeFirmwareNodes(tables, planarId);
-            makeDiskControllerNodes(tables, planarId);
-            makeKVDNode(tables, planarId);
-            makeSMBIOSTableNodes(tables, planarId);
+        guardStructure(SMBIOS_HERE, logger, 2, 0,
+                       [&] { makeBarePlanarNode(tables, parentNodeId); });
+    } else {
+        size_t const chosen = chooseBaseboard(tables);
+        StructureGroups owned;
+        guardStructure(SMBIOS_HERE, logger, 2, chosen, [&] {
+            makeBaseboardPlanarNode(tables, (*tables[2])[chosen], parent, parentNodeId, owned);
+        });
+    }
+    SMBIOS_DETAIL(logger, "makePlanarNodes exit");
+}
+
+void SmBiosMI::makeBarePlanarNode(TableLists tables, unsigned int parentNodeId) {
+    MutableNode* node = newNode(parentNodeId, 41, 0);
+    node->setStatus(1);
+    node->setDescription("Planar");
+    unsigned int const planarId = node->getNodeId();
+    // Kept: this order differs from the one with a baseboard below; node
+    // ids, and so the agent's stored inventory, follow it.
+    makeCpuNodes(tables, planarId);
+    makeSlotNodes(tables, planarId);
+    makeConnectorNodes(tables, planarId);
+    makeDimmNodes(tables, planarId);
+    makeFirmwareNodes(tables, planarId);
+    makeDiskControllerNodes(tables, planarId);
+    makeKVDNode(tables, planarId);
+    makeSMBIOSTableNodes(tables, planarId);
+}
+
+size_t SmBiosMI::chooseBaseboard(TableLists tables) const {
+    for (unsigned int boardType : BOARD_PRIORITY) {
+        for (size_t k = 0; k < tables[2]->size(); ++k) {
+            if (getNumber8((*tables[2])[k].table, BOARD_TYPE) == boardType) {
+                return k;
+            }
         }
-        SMBIOSMI_CATCH_STRUCTURE(logger, 2, 0)
-        SMBIOS_DETAIL(logger, "makePlanarNodes exit");
+    }
+    return 0;
+}
+
+void SmBiosMI::makeBaseboardPlanarNode(TableLists tables, TableData& entry, Node* parent,
+                                       unsigned int parentNodeId, StructureGroups& owned) {
+    SD::SmBios::Table const* t = entry.table;
+    SMBIOS_DETAIL(logger, "Table 2 length = " << entry.length);
+    MutableNode* node = newNode(parentNodeId, 41, 0);
+    entry.node = node;
+    node->setStatus(1);
+    node->setDescription("Planar");
+    unsigned int const planarId = node->getNodeId();
+    unsigned int const handle = getNumber16(t, HANDLE);
+
+    propString(t, MANUFACTURER, 36, node);
+    propString(t, PRODUCT, 39, node);
+    std::string const product = getString(t, PRODUCT);
+    if (!product.empty()) {
+        node->setProperty(172, PropertyValue(product, true));
+        parent->setProperty(172, PropertyValue(product, true));
+    }
+    propString(t, SERIAL, 50, node);
+    propString(t, ASSET_TAG, 2, node);
+    propEnumValue(t, FEATURE_FLAGS, 44, node);
+    std::string const location = getString(t, LOCATION);
+    if (!location.empty()) {
+        node->setProperty(31, PropertyValue(location, true));
+        parent->setProperty(31, PropertyValue(location, true));
+    }
+    // Read whatever the log thresholds: a chassis handle cut off by a short
+    // structure ends the planar here at every level alike.
+    unsigned int const chassisHandle = getNumber16(t, CHASSIS_HANDLE);
+    SMBIOS_DETAIL(logger, "Handle=" << chassisHandle);
+    node->setProperty(128, PropertyValue(Number(getNumber8(t, BOARD_TYPE)), true));
+
+    // The planar takes every structure over into groups of its own; the
+    // shared groups are left empty. Each group moves whole, in its order.
+    owned.takeOver(tables);
+    TableLists const groups = owned.lists();
+    logContainedHandles(t, groups);
+    logGroupAssociations(groups, handle);
+
+    makeCpuNodes(groups, planarId);
+    makeSlotNodes(groups, planarId);
+    makeConnectorNodes(groups, planarId);
+    makeDimmNodes(groups, planarId);
+    makeDiskControllerNodes(groups, planarId);
+    makeSMBIOSTableNodes(groups, planarId);
+    makeFirmwareNodes(groups, planarId);
+    makeKVDNode(groups, planarId);
+    logStructureLists(logger, groups);
+}
+
+void SmBiosMI::logContainedHandles(SD::SmBios::Table const* t, TableLists groups) const {
+    unsigned int const count = getNumber8(t, CONTAINED_COUNT);
+    SMBIOS_DETAIL(logger, "Count of contained object handles=" << count);
+    if (count == 0) {
         return;
     }
-
-    size_t chosen = 0;
-    bool matched = false;
-    for (unsigned int boardType : BOARD_PRIORITY) {
-        for (size_t k = 0; k < tables[2]->size() && !matched; ++k) {
-            if (getNumber8((*tables[2])[k].table, BOARD_TYPE) == boardType) {
-                chosen = k;
-                matched = true;
+    unsigned int const needed = 15 + 2 * count;
+    if (needed > 255) {
+        SMBIOS_DETAIL(
+            logger, "Length of contained object handles " << needed << " exceeds 255 table length");
+        return;
+    }
+    std::vector<unsigned int> handles;
+    std::string listed;
+    for (unsigned int i = 0; i < count; ++i) {
+        handles.push_back(getNumber16(t, static_cast<unsigned char>(CONTAINED_HANDLES + 2 * i)));
+        listed += std::to_string(handles.back()) + " ";
+    }
+    SMBIOS_DETAIL(logger, "Handles="
+                              << "{ " << listed << "}");
+    for (unsigned int contained : handles) {
+        bool found = false;
+        for (unsigned int type = 0; type < 256 && !found; ++type) {
+            for (TableData const& member : *groups[type]) {
+                if (getNumber16(member.table, HANDLE) == contained) {
+                    unsigned int const memberType = member.table->getByte(0);
+                    SMBIOS_DETAIL(logger, "Planar contained element handle "
+                                              << contained << " found in Bios table "
+                                              << memberType);
+                    found = true;
+                    break;
+                }
             }
         }
-        if (matched) {
-            break;
+        if (!found) {
+            SMBIOS_DETAIL(logger, "Planar contained element handle "
+                                      << contained << " not found in Bios tables ");
         }
     }
+}
 
-    StructureGroups owned;
-    try {
-        TableData& entry = (*tables[2])[chosen];
-        SD::SmBios::Table const* t = entry.table;
-        SMBIOS_DETAIL(logger, "Table 2 length = " << entry.length);
-        MutableNode* node = newNode(parentNodeId, 41, 0);
-        entry.node = node;
-        node->setStatus(1);
-        node->setDescription("Planar");
-        unsigned int const planarId = node->getNodeId();
-        unsigned int const handle = getNumber16(t, HANDLE);
-
-        propString(t, MANUFACTURER, 36, node);
-        propString(t, PRODUCT, 39, node);
-        std::string const product = getString(t, PRODUCT);
-        if (!product.empty()) {
-            node->setProperty(172, PropertyValue(product, true));
-            parent->setProperty(172, PropertyValue(product, true));
-        }
-        propString(t, SERIAL, 50, node);
-        propString(t, ASSET_TAG, 2, node);
-        propEnumValue(t, FEATURE_FLAGS, 44, node);
-        std::string const location = getString(t, LOCATION);
-        if (!location.empty()) {
-            node->setProperty(31, PropertyValue(location, true));
-            parent->setProperty(31, PropertyValue(location, true));
-        }
-        // Read whatever the log thresholds: a chassis handle cut off by a
-        // short structure ends the planar here at every level alike.
-        unsigned int const chassisHandle = getNumber16(t, CHASSIS_HANDLE);
-        SMBIOS_DETAIL(logger, "Handle=" << chassisHandle);
-        node->setProperty(128, PropertyValue(Number(getNumber8(t, BOARD_TYPE)), true));
-
-        // The planar takes every structure over into groups of its own; the
-        // shared groups are left empty. Each group moves whole, in its order.
-        owned.takeOver(tables);
-        TableLists const groups = owned.lists();
-
-        unsigned int const count = getNumber8(t, CONTAINED_COUNT);
-        SMBIOS_DETAIL(logger, "Count of contained object handles=" << count);
-        if (count != 0) {
-            unsigned int const needed = 15 + 2 * count;
-            if (needed > 255) {
-                SMBIOS_DETAIL(logger, "Length of contained object handles "
-                                          << needed << " exceeds 255 table length");
-            } else {
-                std::vector<unsigned int> handles;
-                std::string listed;
-                for (unsigned int i = 0; i < count; ++i) {
-                    handles.push_back(
-                        getNumber16(t, static_cast<unsigned char>(CONTAINED_HANDLES + 2 * i)));
-                    listed += std::to_string(handles.back()) + " ";
-                }
-                SMBIOS_DETAIL(logger, "Handles="
-                                          << "{ " << listed << "}");
-                for (unsigned int contained : handles) {
-                    bool found = false;
-                    for (unsigned int type = 0; type < 256 && !found; ++type) {
-                        for (TableData const& member : *groups[type]) {
-                            if (getNumber16(member.table, HANDLE) == contained) {
-                                unsigned int const memberType = member.table->getByte(0);
-                                SMBIOS_DETAIL(logger, "Planar contained element handle "
-                                                          << contained << " found in Bios table "
-                                                          << memberType);
-                                found = true;
-                                break;
-                            }
-                        }
-                    }
-                    if (!found) {
-                        SMBIOS_DETAIL(logger, "Planar contained element handle "
-                                                  << contained << " not found in Bios tables ");
-                    }
-                }
-            }
-        }
-
-        // The baseboard's handle goes where the lookup takes a type, and 2
-        // where it takes a handle: the lookup serves the log only.
-        std::vector<std::pair<unsigned char, unsigned int>> const associations =
-            findGroup(groups, handle, 2);
-        if (!associations.empty()) {
-            SMBIOS_DETAIL(logger, " Planar Group Associations Exist: ");
-            for (auto const& member : associations) {
-                SMBIOS_DETAIL(logger, "    Table Type=" << static_cast<unsigned int>(member.first)
-                                                        << " Handle=" << member.second);
-            }
-        }
-
-        makeCpuNodes(groups, planarId);
-        makeSlotNodes(groups, planarId);
-        makeConnectorNodes(groups, planarId);
-        makeDimmNodes(groups, planarId);
-        makeDiskControllerNodes(groups, planarId);
-        makeSMBIOSTableNodes(groups, planarId);
-        makeFirmwareNodes(groups, planarId);
-        makeKVDNode(groups, planarId);
-
-        for (unsigned int type = 0; type < 256; ++type) {
-            if (!groups[type]->empty()) {
-                SMBIOS_DETAIL(logger, "Table(s) for index " << type);
-                for (TableData const& member : *groups[type]) {
-                    SMBIOS_DETAIL(logger, "   Pointer = " << static_cast<void const*>(member.table)
-                                                          << " length = " << member.length);
-                }
-            }
+void SmBiosMI::logGroupAssociations(TableLists groups, unsigned int handle) {
+    // The baseboard's handle goes where the lookup takes a type, and 2 where
+    // it takes a handle: the lookup serves the log only.
+    std::vector<std::pair<unsigned char, unsigned int>> const associations =
+        findGroup(groups, handle, 2);
+    if (!associations.empty()) {
+        SMBIOS_DETAIL(logger, " Planar Group Associations Exist: ");
+        for (auto const& member : associations) {
+            SMBIOS_DETAIL(logger, "    Table Type=" << static_cast<unsigned int>(member.first)
+                                                    << " Handle=" << member.second);
         }
     }
-    SMBIOSMI_CATCH_STRUCTURE(logger, 2, chosen)
-    SMBIOS_DETAIL(logger, "makePlanarNodes exit");
 }
 
 }  // namespace IC

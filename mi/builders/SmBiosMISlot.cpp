@@ -2,6 +2,7 @@
 #include <map>
 
 #include "IC/PropertyValue.h"
+#include "mi/BuilderSkeleton.h"
 #include "mi/SmBiosMI.h"
 
 namespace IC {
@@ -45,22 +46,18 @@ unsigned int SmBiosMI::getCIMSlotType(unsigned int smbiosSlotType) {
 // One node per System Slots structure, under the planar.
 void SmBiosMI::makeSlotNodes(TableLists tables, unsigned int parentNodeId) {
     SMBIOS_DETAIL(logger, "makeSlotNodes entry");
-    for (size_t i = 0; i < tables[9]->size(); ++i) {
-        try {
-            TableData& entry = (*tables[9])[i];
-            SD::SmBios::Table const* t = entry.table;
-            SMBIOS_DETAIL(logger, "Table " << 9 << " length = " << entry.length);
-            MutableNode* node = newNode(parentNodeId, 62, static_cast<unsigned int>(i));
-            entry.node = node;
-            node->setStatus(1);
-            node->setDescription("System Slot");
-            propString(t, DESIGNATION, 108, node);
-            unsigned int const slotType = getCIMSlotType(getNumber8(t, SLOT_TYPE));
-            node->setProperty(128, PropertyValue(EnumValue(slotType), true));
-            node->setProperty(270, PropertyValue(Number(getNumber16(t, SLOT_ID)), true));
-        }
-        SMBIOSMI_CATCH_STRUCTURE(logger, 9, i)
-    }
+    forEachStructure(SMBIOS_HERE, logger, tables, 9, [&](TableData& entry, size_t i) {
+        SD::SmBios::Table const* t = entry.table;
+        SMBIOS_DETAIL(logger, "Table " << 9 << " length = " << entry.length);
+        MutableNode* node = newNode(parentNodeId, 62, static_cast<unsigned int>(i));
+        entry.node = node;
+        node->setStatus(1);
+        node->setDescription("System Slot");
+        propString(t, DESIGNATION, 108, node);
+        unsigned int const slotType = getCIMSlotType(getNumber8(t, SLOT_TYPE));
+        node->setProperty(128, PropertyValue(EnumValue(slotType), true));
+        node->setProperty(270, PropertyValue(Number(getNumber16(t, SLOT_ID)), true));
+    });
     SMBIOS_DETAIL(logger, "makeSlotNodes exit");
 }
 

@@ -1,4 +1,5 @@
 #include "IC/PropertyValue.h"
+#include "mi/BuilderSkeleton.h"
 #include "mi/SmBiosMI.h"
 
 namespace IC {
@@ -29,15 +30,13 @@ SmBiosMI::ProbeKind const SmBiosMI::temperatureProbe = {28, 22, 10.0,
 // negative temperature, a two's-complement word, becomes a large value).
 void SmBiosMI::makeProbeNodes(TableLists tables, unsigned int parentId, unsigned int location,
                               ProbeKind const& kind, QNLog::QNLogger const& probeLogger) {
-    std::vector<TableData>& probes = *tables[kind.smbiosType];
-    for (size_t k = 0; k < probes.size(); ++k) {
-        try {
-            TableData& entry = probes[k];
+    forEachStructure(
+        SMBIOS_HERE, probeLogger, tables, kind.smbiosType, [&](TableData& entry, size_t k) {
             SD::SmBios::Table const* t = entry.table;
             SMBIOS_DETAIL(probeLogger, "Table " << kind.smbiosType << " length = " << entry.length);
             unsigned int const locationAndStatus = getNumber8(t, LOCATION_AND_STATUS);
             if ((locationAndStatus & 0x1F) != location) {
-                continue;
+                return;
             }
             MutableNode* node = newNode(parentId, kind.nodeType, static_cast<unsigned int>(k));
             entry.node = node;
@@ -80,9 +79,7 @@ void SmBiosMI::makeProbeNodes(TableLists tables, unsigned int parentId, unsigned
             if (minimum != LIMIT_UNKNOWN) {
                 node->setProperty(33, PropertyValue(Number(minimum / kind.divisor), true));
             }
-        }
-        SMBIOSMI_CATCH_STRUCTURE(probeLogger, kind.smbiosType, k)
-    }
+        });
 }
 
 // Temperature sensor nodes for the temperature probes at a location.

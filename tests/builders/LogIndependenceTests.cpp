@@ -32,6 +32,7 @@
 #include "DumpFormat.h"
 #include "LogLevels.h"
 #include "TreeSnapshot.h"
+#include "mi/BuilderSkeleton.h"
 #include "smbios/Logging.h"
 
 using buildertest::compareLevels;
@@ -470,25 +471,19 @@ struct ReadsInLogLines : TestMI {
     // A node per baseboard, then the chassis handle read only for the log,
     // then a second node: at the default levels the read never happens.
     void buildChangingTheTree(IC::TableLists lists, unsigned int parentId) {
-        for (IC::TableData const& entry : *lists[2]) {
-            try {
-                newNode(parentId, 41, 0);
-                SMBIOS_DETAIL(probeLogger, "Handle=" << getNumber16(entry.table, 0x0B));
-                newNode(parentId, 41, 1);
-            }
-            SMBIOSMI_CATCH_STRUCTURE(probeLogger, 2, 0)
-        }
+        IC::forEachStructure(SMBIOS_HERE, probeLogger, lists, 2, [&](IC::TableData& entry, size_t) {
+            newNode(parentId, 41, 0);
+            SMBIOS_DETAIL(probeLogger, "Handle=" << getNumber16(entry.table, 0x0B));
+            newNode(parentId, 41, 1);
+        });
     }
     // The read comes last: the tree is the same either way, only the
     // failure the read raises tells.
     void buildKeepingTheTree(IC::TableLists lists, unsigned int parentId) {
-        for (IC::TableData const& entry : *lists[2]) {
-            try {
-                newNode(parentId, 41, 0);
-                SMBIOS_DETAIL(probeLogger, "Handle=" << getNumber16(entry.table, 0x0B));
-            }
-            SMBIOSMI_CATCH_STRUCTURE(probeLogger, 2, 0)
-        }
+        IC::forEachStructure(SMBIOS_HERE, probeLogger, lists, 2, [&](IC::TableData& entry, size_t) {
+            newNode(parentId, 41, 0);
+            SMBIOS_DETAIL(probeLogger, "Handle=" << getNumber16(entry.table, 0x0B));
+        });
     }
 };
 
