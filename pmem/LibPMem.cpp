@@ -23,8 +23,7 @@
 #include "Loaders.h"
 #include "RegionMemory.h"
 #include "Source.h"
-
-#define PMEM_EXPORT extern "C" __attribute__((visibility("default")))
+#include "pmem/PMemContract.h"
 
 namespace pmem {
 
@@ -117,7 +116,10 @@ __attribute__((constructor)) void chooseSourceAtLoad() { library(); }
 
 using pmem::library;
 
-PMEM_EXPORT int PMemIsInitialized(void) {
+// The five functions of the contract, which declares them with C linkage and
+// exported.
+
+int PMemIsInitialized(void) {
     try {
         return library().source ? 1 : 0;
     } catch (...) {
@@ -125,7 +127,7 @@ PMEM_EXPORT int PMemIsInitialized(void) {
     }
 }
 
-PMEM_EXPORT int PMemOpen(void) {
+int PMemOpen(void) {
     try {
         pmem::Library& lib = library();
         std::lock_guard<std::mutex> lock(lib.mutex);
@@ -135,7 +137,7 @@ PMEM_EXPORT int PMemOpen(void) {
     }
 }
 
-PMEM_EXPORT int PMemClose(void) {
+int PMemClose(void) {
     try {
         pmem::Library& lib = library();
         std::lock_guard<std::mutex> lock(lib.mutex);
@@ -147,7 +149,7 @@ PMEM_EXPORT int PMemClose(void) {
 
 // 0 when exactly `count` bytes were copied; -1 otherwise. A read of no
 // bytes succeeds when a source serves.
-PMEM_EXPORT int PMemRead(void* buffer, unsigned long address, long count) {
+int PMemRead(void* buffer, unsigned long address, long count) {
     if (buffer == nullptr || count < 0) {
         return -1;
     }
@@ -173,8 +175,7 @@ PMEM_EXPORT int PMemRead(void* buffer, unsigned long address, long count) {
 // The first address from `start`, advancing by `step` while not past `end`,
 // where the anchor's characters (without its terminating NUL) all occur; 0
 // when there is none, and for an empty anchor or a step below 1.
-PMEM_EXPORT unsigned long PMemSearch(char const* anchor, unsigned long start, unsigned long end,
-                                     long step) {
+unsigned long PMemSearch(char const* anchor, unsigned long start, unsigned long end, long step) {
     if (anchor == nullptr || *anchor == '\0' || step <= 0 || start > end) {
         return 0;
     }

@@ -1,7 +1,5 @@
 #include "smbios/PMem.h"
 
-#include <dlfcn.h>
-
 #include <stdexcept>
 
 #include "SD/PlatformUtilities.h"
@@ -23,12 +21,6 @@ std::wstring _getFileName() {
 
 namespace {
 
-// A function pointer from a symbol of the loaded library (null when absent).
-template <typename Fn>
-Fn lookUp(void* handle, char const* name) {
-    return reinterpret_cast<Fn>(dlsym(handle, name));
-}
-
 // The library name, after the constructor's entry line.
 std::wstring enterConstructor() {
     SMBIOS_DETAIL(loggerPMem, "Constructor (void) entry");
@@ -44,20 +36,19 @@ PMem::PMem() : DynamicLibrary(enterConstructor()) {
                      "Constructor could not load library '" << name << "' - exception return");
         throw std::runtime_error("PMEM: could not load library '" + name + "'.");
     }
-    PMemIsInitializedFn isInitialized =
-        lookUp<PMemIsInitializedFn>(getHandle(), "PMemIsInitialized");
-    if (isInitialized == nullptr || isInitialized() == 0) {
+    pmem::Functions bound;
+    bool const complete = pmem::bindFunctions(getHandle(), bound) == nullptr;
+    if (bound.isInitialized == nullptr || bound.isInitialized() == 0) {
         unload();
         SMBIOS_ERROR(loggerPMem,
                      "Constructor library '" << name << "' did not initialize - exception return");
         throw std::runtime_error("PMEM: library '" + name + "' did not initialize.");
     }
-    _PMemOpen = lookUp<PMemOpenFn>(getHandle(), "PMemOpen");
-    _PMemClose = lookUp<PMemCloseFn>(getHandle(), "PMemClose");
-    _PMemRead = lookUp<PMemReadFn>(getHandle(), "PMemRead");
-    _PMemSearch = lookUp<PMemSearchFn>(getHandle(), "PMemSearch");
-    if (_PMemOpen == nullptr || _PMemClose == nullptr || _PMemRead == nullptr ||
-        _PMemSearch == nullptr) {
+    _PMemOpen = bound.open;
+    _PMemClose = bound.close;
+    _PMemRead = bound.read;
+    _PMemSearch = bound.search;
+    if (!complete) {
         unload();
         SMBIOS_ERROR(loggerPMem, "Constructor could not export all symbols - exception return");
         throw std::runtime_error("PMEM: could not export all symbols.");

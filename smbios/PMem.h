@@ -7,15 +7,16 @@
 
 #include "QNLog/QNLogger.h"
 #include "SD/DynamicLibrary.h"
+#include "pmem/PMemContract.h"
 
 namespace SD {
 
-typedef int (*PMemIsInitializedFn)();
-typedef int (*PMemOpenFn)();
-typedef int (*PMemCloseFn)();
-typedef int (*PMemReadFn)(void* buffer, unsigned long address, long count);
-typedef unsigned long (*PMemSearchFn)(char const* anchor, unsigned long start, unsigned long end,
-                                      long step);
+// The library's function types, as its contract declares them.
+typedef pmem::IsInitializedFn PMemIsInitializedFn;
+typedef pmem::OpenFn PMemOpenFn;
+typedef pmem::CloseFn PMemCloseFn;
+typedef pmem::ReadFn PMemReadFn;
+typedef pmem::SearchFn PMemSearchFn;
 
 // Bound by every successful construction of a PMem; only meaningful while a
 // PMem holds the library loaded.

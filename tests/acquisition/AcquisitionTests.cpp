@@ -46,7 +46,7 @@ public:
             return;
         }
         reset_ = fn<void (*)()>("FakePMemReset");
-        map_ = fn<void (*)(unsigned long, unsigned char const*, unsigned long)>("FakePMemMap");
+        map_ = fn<int (*)(unsigned long, unsigned char const*, unsigned long)>("FakePMemMap");
         setInitialized_ = fn<void (*)(int)>("FakePMemSetInitialized");
         setOpenResult_ = fn<void (*)(int)>("FakePMemSetOpenResult");
         failRead_ = fn<void (*)(int)>("FakePMemFailRead");
@@ -64,7 +64,8 @@ public:
     }
 
     void map(unsigned long base, std::vector<uint8_t> const& bytes) {
-        map_(base, bytes.data(), static_cast<unsigned long>(bytes.size()));
+        EXPECT_EQ(map_(base, bytes.data(), static_cast<unsigned long>(bytes.size())), 1)
+            << "the region at " << base << " could not be placed";
     }
     void setInitialized(int value) { setInitialized_(value); }
     void setOpenResult(int value) { setOpenResult_(value); }
@@ -92,7 +93,7 @@ private:
 
     void* handle_ = nullptr;
     void (*reset_)() = nullptr;
-    void (*map_)(unsigned long, unsigned char const*, unsigned long) = nullptr;
+    int (*map_)(unsigned long, unsigned char const*, unsigned long) = nullptr;
     void (*setInitialized_)(int) = nullptr;
     void (*setOpenResult_)(int) = nullptr;
     void (*failRead_)(int) = nullptr;

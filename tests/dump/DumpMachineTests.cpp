@@ -1,6 +1,6 @@
 // smbios-dump --from-machine, run as a child process on stand-in
 // physical-memory libraries whose fake memory the environment names
-// (DUMP_FAKE_PMEM_IMAGE=FILE@BASE,...): a machine with a "_SM_" entry point
+// (FAKE_PMEM_IMAGE=FILE@BASE,...): a machine with a "_SM_" entry point
 // in the BIOS area, one with only a legacy "_DMI_" entry point, libraries
 // that fail, and a missing library.
 #include <gtest/gtest.h>
@@ -47,7 +47,7 @@ public:
 
     hosttest::Environment environment() const {
         hosttest::Environment env;
-        env.set["DUMP_FAKE_PMEM_IMAGE"] = regions_;
+        env.set["FAKE_PMEM_IMAGE"] = regions_;
         return env;
     }
 
@@ -150,7 +150,7 @@ TEST(DumpMachine, LibraryThatDoesNotInitializeFails) {
     FakeMachine machine;
     mapSmMachine(machine);
     hosttest::Environment env;
-    env.set["DUMP_FAKE_PMEM_INITIALIZED"] = "0";
+    env.set["FAKE_PMEM_INITIALIZED"] = "0";
     expectMachineRefused(
         dumpMachine(machine, dumptest::fakePMem("full"), machine.dir().file("smbios.txt"), env),
         "PMemIsInitialized returned 0", machine);
@@ -160,7 +160,7 @@ TEST(DumpMachine, FailingOpenFails) {
     FakeMachine machine;
     mapSmMachine(machine);
     hosttest::Environment env;
-    env.set["DUMP_FAKE_PMEM_OPEN"] = "0";
+    env.set["FAKE_PMEM_OPEN"] = "0";
     expectMachineRefused(
         dumpMachine(machine, dumptest::fakePMem("full"), machine.dir().file("smbios.txt"), env),
         "PMemOpen returned 0", machine);
@@ -170,7 +170,7 @@ TEST(DumpMachine, FailingCloseFails) {
     FakeMachine machine;
     mapSmMachine(machine);
     hosttest::Environment env;
-    env.set["DUMP_FAKE_PMEM_CLOSE"] = "0";
+    env.set["FAKE_PMEM_CLOSE"] = "0";
     expectMachineRefused(
         dumpMachine(machine, dumptest::fakePMem("full"), machine.dir().file("smbios.txt"), env),
         "PMemClose returned 0", machine);

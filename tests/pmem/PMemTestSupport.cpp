@@ -1,6 +1,5 @@
 #include "PMemTestSupport.h"
 
-#include <dlfcn.h>
 #include <signal.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
@@ -23,45 +22,33 @@ std::string outDir() {
 
 std::string libraryPath() { return outDir() + "/libpmem.so"; }
 
-PMemLibrary::PMemLibrary() {
-    handle_ = dlopen(libraryPath().c_str(), RTLD_NOW | RTLD_LOCAL);
-    if (handle_ == nullptr) {
-        ADD_FAILURE() << "cannot load " << libraryPath() << ": " << dlerror();
+PMemLibrary::PMemLibrary() : library_(libraryPath()) {
+    if (!library_.loadAndBind()) {
+        if (library_.getHandle() == nullptr) {
+            ADD_FAILURE() << "cannot load " << libraryPath() << ": " << library_.getLastError();
+        } else {
+            ADD_FAILURE() << libraryPath() << " does not export " << library_.missing();
+        }
         return;
     }
-    isInitialized_ = reinterpret_cast<int (*)()>(dlsym(handle_, "PMemIsInitialized"));
-    open_ = reinterpret_cast<int (*)()>(dlsym(handle_, "PMemOpen"));
-    close_ = reinterpret_cast<int (*)()>(dlsym(handle_, "PMemClose"));
-    read_ = reinterpret_cast<int (*)(void*, unsigned long, long)>(dlsym(handle_, "PMemRead"));
-    search_ = reinterpret_cast<unsigned long (*)(char const*, unsigned long, unsigned long, long)>(
-        dlsym(handle_, "PMemSearch"));
-    if (isInitialized_ == nullptr || open_ == nullptr || close_ == nullptr || read_ == nullptr ||
-        search_ == nullptr) {
-        ADD_FAILURE() << libraryPath() << " lacks one of the five functions";
-        isInitialized_ = nullptr;
-        open_ = close_ = nullptr;
-        read_ = nullptr;
-        search_ = nullptr;
-    }
+    functions_ = library_.functions();
 }
 
-PMemLibrary::~PMemLibrary() {
-    if (handle_ != nullptr) {
-        dlclose(handle_);
-    }
-}
+PMemLibrary::~PMemLibrary() = default;
 
-int PMemLibrary::isInitialized() const { return isInitialized_ ? isInitialized_() : 0; }
-int PMemLibrary::open() const { return open_ ? open_() : 0; }
-int PMemLibrary::close() const { return close_ ? close_() : 0; }
+int PMemLibrary::isInitialized() const {
+    return functions_.isInitialized ? functions_.isInitialized() : 0;
+}
+int PMemLibrary::open() const { return functions_.open ? functions_.open() : 0; }
+int PMemLibrary::close() const { return functions_.close ? functions_.close() : 0; }
 
 int PMemLibrary::read(void* buffer, unsigned long address, long count) const {
-    return read_ ? read_(buffer, address, count) : -1;
+    return functions_.read ? functions_.read(buffer, address, count) : -1;
 }
 
 unsigned long PMemLibrary::search(char const* anchor, unsigned long start, unsigned long end,
                                   long step) const {
-    return search_ ? search_(anchor, start, end, step) : 0;
+    return functions_.search ? functions_.search(anchor, start, end, step) : 0;
 }
 
 std::vector<uint8_t> PMemLibrary::bytes(unsigned long address, size_t n, int& status) const {

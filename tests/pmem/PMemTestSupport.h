@@ -15,6 +15,7 @@
 #include <vector>
 
 #include "TestSupport.h"
+#include "pmem/PMemContract.h"
 #include "smbios/SmBios.h"
 
 namespace pmemtest {
@@ -24,8 +25,9 @@ std::string outDir();
 // The built libpmem.so.
 std::string libraryPath();
 
-// libpmem.so loaded with dlopen, its five functions bound. When it cannot
-// be loaded the test fails and the functions answer as an unusable library.
+// libpmem.so loaded and its five functions bound, through the contract's
+// binder. When it cannot be loaded or lacks a function the test fails and
+// the functions answer as an unusable library.
 class PMemLibrary {
 public:
     PMemLibrary();
@@ -34,7 +36,7 @@ public:
     PMemLibrary& operator=(PMemLibrary const&) = delete;
 
     // Whether the library was loaded and its five functions bound.
-    bool loaded() const { return isInitialized_ != nullptr; }
+    bool loaded() const { return functions_.isInitialized != nullptr; }
     int isInitialized() const;
     int open() const;
     int close() const;
@@ -45,12 +47,8 @@ public:
     std::vector<uint8_t> bytes(unsigned long address, size_t n, int& status) const;
 
 private:
-    void* handle_ = nullptr;
-    int (*isInitialized_)() = nullptr;
-    int (*open_)() = nullptr;
-    int (*close_)() = nullptr;
-    int (*read_)(void*, unsigned long, long) = nullptr;
-    unsigned long (*search_)(char const*, unsigned long, unsigned long, long) = nullptr;
+    pmem::BoundLibrary library_;
+    pmem::Functions functions_;  // all null unless every one was bound
 };
 
 // PMemRead of expected.size() bytes at `address` succeeds and gives exactly

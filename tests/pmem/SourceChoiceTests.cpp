@@ -6,10 +6,14 @@
 #include <link.h>
 
 #include <algorithm>
+#include <cctype>
 #include <climits>
+#include <cstdlib>
 #include <cstring>
+#include <iterator>
 
 #include "PMemTestSupport.h"
+#include "pmem/PMemContract.h"
 
 using pmemtest::imageItem;
 using pmemtest::kAnchor;
@@ -248,10 +252,69 @@ std::vector<std::string> exportedSymbols(std::string const& path) {
     return names;
 }
 
+// The names in the global list of a linker version script ("global:" up to
+// "local:"), in order. Comments (C style) are left out.
+std::vector<std::string> versionScriptGlobals(std::string const& text) {
+    std::string code;
+    for (size_t at = 0; at < text.size();) {
+        if (text.compare(at, 2, "/*") == 0) {
+            size_t const end = text.find("*/", at + 2);
+            at = end == std::string::npos ? text.size() : end + 2;
+            code += ' ';
+        } else {
+            code += text[at++];
+        }
+    }
+    std::vector<std::string> names;
+    bool inGlobal = false;
+    std::string word;
+    for (char c : code) {
+        bool const partOfName =
+            std::isalnum(static_cast<unsigned char>(c)) || c == '_' || c == '*' || c == ':';
+        if (partOfName) {
+            word += c;
+            continue;
+        }
+        if (word == "global:") {
+            inGlobal = true;
+        } else if (word == "local:") {
+            inGlobal = false;
+        } else if (inGlobal && !word.empty()) {
+            names.push_back(word);
+        }
+        word.clear();
+    }
+    return names;
+}
+
+// The contract's required exports, sorted.
+std::vector<std::string> contractExports() {
+    std::vector<std::string> names(std::begin(pmem::kRequiredExports),
+                                   std::end(pmem::kRequiredExports));
+    std::sort(names.begin(), names.end());
+    return names;
+}
+
 }  // namespace
 
+// The built library exports the contract's functions and nothing else, and
+// the contract names the five functions the plug-in binds.
 TEST(PMemExports, ExactlyTheFiveFunctions) {
-    EXPECT_EQ(exportedSymbols(pmemtest::libraryPath()),
-              (std::vector<std::string>{"PMemClose", "PMemIsInitialized", "PMemOpen", "PMemRead",
-                                        "PMemSearch"}));
+    EXPECT_EQ(exportedSymbols(pmemtest::libraryPath()), contractExports());
+    EXPECT_EQ(contractExports(), (std::vector<std::string>{"PMemClose", "PMemIsInitialized",
+                                                           "PMemOpen", "PMemRead", "PMemSearch"}));
+}
+
+// The version script, which decides what the library exports, lists the
+// contract's functions.
+TEST(PMemExports, VersionScriptListsTheContractsFunctions) {
+    char const* source = std::getenv("SMBIOS_SOURCE_DIR");
+    ASSERT_NE(source, nullptr) << "SMBIOS_SOURCE_DIR is not set";
+    std::string const script = std::string(source) + "/pmem/libpmem.map";
+    std::vector<uint8_t> const bytes = smbiostest::fileBytes(script);
+    ASSERT_FALSE(bytes.empty()) << "cannot read " << script;
+    std::vector<std::string> globals =
+        versionScriptGlobals(std::string(bytes.begin(), bytes.end()));
+    std::sort(globals.begin(), globals.end());
+    EXPECT_EQ(globals, contractExports()) << script;
 }

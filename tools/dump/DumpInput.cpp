@@ -4,7 +4,6 @@
 
 #include <cerrno>
 #include <cstdio>
-#include <cstring>
 
 #include "DumpFormat.h"
 #include "ToolSupport.h"
@@ -187,6 +186,9 @@ bool captureFromMachine(std::string const& libraryPath, Capture& out, std::strin
     // of the library path.
     std::string const path =
         libraryPath.find('/') == std::string::npos ? "./" + libraryPath : libraryPath;
+    // Loaded with dlopen rather than the contract's BoundLibrary, which
+    // needs the platform library: smbios-dump runs on its own, with only
+    // libpmem.so beside it or in ../lib.
     dlerror();
     void* handle = dlopen(path.c_str(), RTLD_NOW | RTLD_LOCAL);
     if (handle == nullptr) {
@@ -195,31 +197,13 @@ bool captureFromMachine(std::string const& libraryPath, Capture& out, std::strin
                 (why != nullptr ? why : "unknown error");
         return false;
     }
-    PMemFunctions pmem;
-    struct Binding {
-        char const* name;
-        void* target;
-        size_t size;
-    };
-    Binding const bindings[] = {
-        {"PMemIsInitialized", &pmem.isInitialized, sizeof pmem.isInitialized},
-        {"PMemOpen", &pmem.open, sizeof pmem.open},
-        {"PMemClose", &pmem.close, sizeof pmem.close},
-        {"PMemRead", &pmem.read, sizeof pmem.read},
-        {"PMemSearch", &pmem.search, sizeof pmem.search},
-    };
-    for (Binding const& binding : bindings) {
-        void* symbol = dlsym(handle, binding.name);
-        if (symbol == nullptr) {
-            error = "the physical-memory library " + path + " does not export " + binding.name;
-            dlclose(handle);
-            return false;
-        }
-        static_assert(sizeof(void*) == sizeof(int (*)(void)),
-                      "function and data pointers differ in size");
-        std::memcpy(binding.target, &symbol, binding.size);
+    PMemFunctions functions;
+    if (char const* missing = pmem::bindFunctions(handle, functions)) {
+        error = "the physical-memory library " + path + " does not export " + missing;
+        dlclose(handle);
+        return false;
     }
-    bool const captured = captureFromMemory(pmem, out, error);
+    bool const captured = captureFromMemory(functions, out, error);
     if (!captured) {
         error = path + ": " + error;
     }

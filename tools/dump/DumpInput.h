@@ -15,6 +15,7 @@
 #include <vector>
 
 #include "ToolSupport.h"
+#include "pmem/PMemContract.h"
 
 namespace smbiosdump {
 
@@ -43,17 +44,10 @@ bool captureFromDumpBin(std::vector<uint8_t> const& file, Capture& out, std::str
 bool captureFromTable(std::vector<uint8_t> const& table, uint8_t major, uint8_t minor, Capture& out,
                       std::string& error);
 
-// The physical-memory library's functions, as it exports them. Non-zero
-// means success for the first three, 0 for read; search returns 0 when the
-// anchor is not found.
-struct PMemFunctions {
-    int (*isInitialized)(void) = nullptr;
-    int (*open)(void) = nullptr;
-    int (*close)(void) = nullptr;
-    int (*read)(void* buffer, unsigned long address, long count) = nullptr;
-    unsigned long (*search)(char const* anchor, unsigned long start, unsigned long end,
-                            long step) = nullptr;
-};
+// The physical-memory library's functions, as its contract declares them.
+// Non-zero means success for the first three, 0 for read; search returns 0
+// when the anchor is not found.
+using PMemFunctions = pmem::Functions;
 
 // Where the entry points are looked for in physical memory: "_SM_" on
 // 16-byte boundaries of the BIOS area, else the legacy "_DMI_" anywhere in

@@ -1,14 +1,36 @@
-// A stand-in for the physical-memory library, for the acquisition tests. It
-// exports the library's five functions over a fake physical memory made of
-// regions that the test maps, and control functions through which the test
-// (which loads the same file) sets it up and reads what was called.
+// A stand-in for the physical-memory library libpmem.so, for the tests of
+// what loads it: the plug-in's acquisition, in the test's own process, and
+// smbios-dump --from-machine, in a child process. It exports the contract's
+// five functions over a fake physical memory, the library's own
+// pmem::RegionMemory, and is set up two ways.
+//
+// Control functions (FakePMem*, below), for a test that loads the same file
+// as the plug-in does and so shares its state: the regions it maps, the
+// results it chooses, the counts of the calls it reads back.
+//
+// The environment, read at each call, for a test that cannot hold the
+// library (its child process loads it, or it must see the library unloaded):
+//   FAKE_PMEM_IMAGE        FILE@BASE[,FILE@BASE...]: PMemOpen makes the
+//                          memory of these files, each from BASE
+//                          (hexadecimal) on, as libpmem.so's PMEM_IMAGE does;
+//                          the open fails when one cannot be placed
+//   FAKE_PMEM_INITIALIZED  PMemIsInitialized returns this number instead of
+//                          what FakePMemSetInitialized chose
+//   FAKE_PMEM_OPEN         "0": PMemOpen returns 0
+//   FAKE_PMEM_CLOSE        "0": PMemClose returns 0
+// Built with FAKE_PMEM_NO_SEARCH it does not export PMemSearch.
 #include <chrono>
+#include <climits>
 #include <cstdlib>
 #include <cstring>
-#include <map>
+#include <memory>
 #include <mutex>
 #include <thread>
 #include <vector>
+
+#include "Loaders.h"
+#include "RegionMemory.h"
+#include "pmem/PMemContract.h"
 
 #define FAKE_EXPORT extern "C" __attribute__((visibility("default")))
 
@@ -16,14 +38,14 @@ namespace {
 
 struct FakeMemory {
     std::mutex mutex;
-    std::map<unsigned long, std::vector<unsigned char>> regions;
+    std::unique_ptr<pmem::RegionMemory> regions{new pmem::RegionMemory()};
     int initialized = 1;
     int openResult = 1;
     int failRead = 0;      // the n-th read (1-based) fails; 0: none
     int readFailure = -1;  // what a failed read returns
     // A read at peekAddress records its count and the two bytes that follow
     // the count in the caller's buffer (0: no peeking). Only for a caller
-    // whose buffer is known to be longer: the table read.
+    // whose buffer is known to be longer: the plug-in's table read.
     unsigned long peekAddress = 0;
     long peekedCount = -1;
     int peekedTail[2] = {-1, -1};
@@ -39,19 +61,9 @@ FakeMemory& memory() {
     return fake;
 }
 
-// The byte at a physical address, false when no region holds it.
-bool byteAt(FakeMemory& fake, unsigned long address, unsigned char& value) {
-    auto it = fake.regions.upper_bound(address);
-    if (it == fake.regions.begin()) {
-        return false;
-    }
-    --it;
-    unsigned long const offset = address - it->first;
-    if (offset >= it->second.size()) {
-        return false;
-    }
-    value = it->second[offset];
-    return true;
+bool isSet(char const* name, char const* value) {
+    char const* text = std::getenv(name);
+    return text != nullptr && std::strcmp(text, value) == 0;
 }
 
 }  // namespace
@@ -59,7 +71,7 @@ bool byteAt(FakeMemory& fake, unsigned long address, unsigned char& value) {
 FAKE_EXPORT void FakePMemReset() {
     FakeMemory& fake = memory();
     std::lock_guard<std::mutex> lock(fake.mutex);
-    fake.regions.clear();
+    fake.regions.reset(new pmem::RegionMemory());
     fake.initialized = 1;
     fake.openResult = 1;
     fake.failRead = 0;
@@ -71,10 +83,12 @@ FAKE_EXPORT void FakePMemReset() {
     fake.opens = fake.closes = fake.reads = fake.searches = 0;
 }
 
-FAKE_EXPORT void FakePMemMap(unsigned long base, unsigned char const* bytes, unsigned long size) {
+// 1 when the bytes are placed from `base` on; 0 when they would overlap
+// bytes already placed or run past the last address.
+FAKE_EXPORT int FakePMemMap(unsigned long base, unsigned char const* bytes, unsigned long size) {
     FakeMemory& fake = memory();
     std::lock_guard<std::mutex> lock(fake.mutex);
-    fake.regions[base].assign(bytes, bytes + size);
+    return fake.regions->place(base, std::vector<unsigned char>(bytes, bytes + size)) ? 1 : 0;
 }
 
 FAKE_EXPORT void FakePMemSetInitialized(int value) { memory().initialized = value; }
@@ -104,40 +118,51 @@ FAKE_EXPORT void FakePMemCounts(int* opens, int* closes, int* reads, int* search
     *searches = fake.searches;
 }
 
-// FAKE_PMEM_INITIALIZED, when set, answers instead of FakePMemSetInitialized:
-// a test that must see the library unloaded cannot hold a handle on it.
-FAKE_EXPORT int PMemIsInitialized() {
+// The contract's functions (declared with C linkage and exported there).
+
+int PMemIsInitialized(void) {
     char const* value = std::getenv("FAKE_PMEM_INITIALIZED");
     return value != nullptr ? std::atoi(value) : memory().initialized;
 }
 
-FAKE_EXPORT int PMemOpen() {
+int PMemOpen(void) {
     FakeMemory& fake = memory();
     if (fake.openDelayMs > 0) {
         std::this_thread::sleep_for(std::chrono::milliseconds(fake.openDelayMs));
     }
     std::lock_guard<std::mutex> lock(fake.mutex);
     ++fake.opens;
+    if (fake.openResult == 0 || isSet("FAKE_PMEM_OPEN", "0")) {
+        return 0;
+    }
+    if (char const* image = std::getenv("FAKE_PMEM_IMAGE")) {
+        std::unique_ptr<pmem::RegionMemory> regions(new pmem::RegionMemory());
+        if (!pmem::loadImage(image, *regions)) {
+            return 0;
+        }
+        fake.regions = std::move(regions);
+    }
     return fake.openResult;
 }
 
-FAKE_EXPORT int PMemClose() {
+int PMemClose(void) {
     FakeMemory& fake = memory();
     std::lock_guard<std::mutex> lock(fake.mutex);
     ++fake.closes;
-    return 1;
+    return isSet("FAKE_PMEM_CLOSE", "0") ? 0 : 1;
 }
 
-FAKE_EXPORT int PMemRead(void* buffer, unsigned long address, long count) {
+int PMemRead(void* buffer, unsigned long address, long count) {
     FakeMemory& fake = memory();
     std::lock_guard<std::mutex> lock(fake.mutex);
     ++fake.reads;
-    if (fake.failRead == fake.reads || count < 0) {
+    if (fake.failRead == fake.reads || buffer == nullptr || count < 0) {
         return fake.readFailure;
     }
     unsigned char* out = static_cast<unsigned char*>(buffer);
-    for (long i = 0; i < count; ++i) {
-        if (!byteAt(fake, address + static_cast<unsigned long>(i), out[i])) {
+    if (count > 0) {
+        unsigned long const n = static_cast<unsigned long>(count);
+        if (n - 1 > ULONG_MAX - address || !fake.regions->read(out, address, n)) {
             return fake.readFailure;
         }
     }
@@ -150,30 +175,15 @@ FAKE_EXPORT int PMemRead(void* buffer, unsigned long address, long count) {
 }
 
 #ifndef FAKE_PMEM_NO_SEARCH
-FAKE_EXPORT unsigned long PMemSearch(char const* anchor, unsigned long start, unsigned long end,
-                                     long step) {
+unsigned long PMemSearch(char const* anchor, unsigned long start, unsigned long end, long step) {
     FakeMemory& fake = memory();
     std::lock_guard<std::mutex> lock(fake.mutex);
     ++fake.searches;
-    size_t const length = std::strlen(anchor);
-    if (step <= 0) {
+    if (anchor == nullptr || *anchor == '\0' || step <= 0 || start > end) {
         return 0;
     }
-    for (unsigned long address = start; address <= end;
-         address += static_cast<unsigned long>(step)) {
-        bool match = true;
-        for (size_t i = 0; i < length && match; ++i) {
-            unsigned char value = 0;
-            match =
-                byteAt(fake, address + i, value) && value == static_cast<unsigned char>(anchor[i]);
-        }
-        if (match) {
-            return address;
-        }
-        if (end - address < static_cast<unsigned long>(step)) {
-            break;
-        }
-    }
-    return 0;
+    return fake.regions->search(reinterpret_cast<unsigned char const*>(anchor),
+                                static_cast<unsigned long>(std::strlen(anchor)), start, end,
+                                static_cast<unsigned long>(step));
 }
 #endif
