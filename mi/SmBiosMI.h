@@ -219,6 +219,18 @@ protected:
     // One raw node: the structure's header fields, formatted bytes and
     // non-empty strings.
     void makeSMBIOSTableNode(SD::SmBios::Table const* t, unsigned int parentId, unsigned int index);
+    // Steps of the chassis builder: the identifying and the state
+    // properties of a chassis node, and whether the chassis contains a
+    // baseboard.
+    void setChassisIdentity(SD::SmBios::Table const* t, IC::MutableNode* node,
+                            std::string const& systemManufacturer, std::string const& systemProduct,
+                            unsigned int type, char const* kindName);
+    void setChassisState(SD::SmBios::Table const* t, IC::MutableNode* node,
+                         std::string const& systemProduct, std::string const& systemSerial,
+                         unsigned int packageType, unsigned int enclosure);
+    bool containsBaseboard(SD::SmBios::Table const* t) const;
+    // The core counts of a processor node and its core nodes.
+    void makeCoreNodes(SD::SmBios::Table const* t, IC::MutableNode* processor);
     // Steps of the planar builder: the planar without a baseboard
     // structure, the baseboard that becomes the planar, the planar from it
     // (taking the structures over into owned), and what it logs of its

@@ -81,7 +81,8 @@ std::string lowerCase(std::string text) {
 // One chassis node per System Enclosure structure (Expansion Chassis
 // excepted) under the computer system, with the system's texts where the
 // chassis leaves its own empty; then the planar builder, once, under the
-// chassis chosen as the baseboard's home.
+// chassis chosen as the baseboard's home: the last chassis that contains a
+// baseboard, else the first main chassis, else the first chassis.
 void SmBiosMI::makeChassisNodes(TableLists lists, unsigned int parentId) {
     SMBIOS_DETAIL(logger, "makeChassisNodes entry");
     std::string systemManufacturer = NO_SYSTEM_TABLE;
@@ -118,28 +119,12 @@ void SmBiosMI::makeChassisNodes(TableLists lists, unsigned int parentId) {
         node->setStatus(1);
         node->setDescription("Chassis");
         unsigned int const nodeId = node->getNodeId();
-
-        std::string manufacturer = getString(t, MANUFACTURER);
-        if (manufacturer.empty() || manufacturer == " " || manufacturer == "none") {
-            manufacturer = systemManufacturer;
-        }
-        node->setProperty(36, PropertyValue(manufacturer, true));
-        std::string const partNumber = getPartNum(systemProduct);
-        if (!partNumber.empty()) {
-            node->setProperty(45, PropertyValue(partNumber, true));
-        }
-        propBool8(t, TYPE, 0x80, 10, node);
-
-        SMBIOS_DETAIL(logger, "Chassis Type = " << type);
-        node->setProperty(108, PropertyValue("Chassis", true));
         ChassisKind const kind = chassisKind(type);
-        if (kind.name != nullptr) {
-            node->setProperty(108, PropertyValue(kind.name, true));
-        }
+        setChassisIdentity(t, node, systemManufacturer, systemProduct, type, kind.name);
+
         if (kind.mainChassis) {
             mainChassis = true;
         }
-
         if (i == 0) {
             planarParentId = nodeId;
         }
@@ -148,54 +133,92 @@ void SmBiosMI::makeChassisNodes(TableLists lists, unsigned int parentId) {
             homeFound = true;
         }
 
-        node->setProperty(39, PropertyValue(systemProduct, true));
-        node->setProperty(11, PropertyValue(EnumValue(kind.packageType), true));
-        node->setProperty(213, PropertyValue(EnumValue(kind.enclosure), true));
-        propString(t, VERSION, 307, node);
-
-        std::string serial = getString(t, SERIAL);
-        if (serial.empty() || serial == " " || lowerCase(serial) == "none") {
-            serial = systemSerial;
-        }
-        node->setProperty(50, PropertyValue(serial, true));
-
-        propString(t, ASSET_TAG, 2, node);
-        propEnumValue(t, BOOT_UP_STATE, 4, node);
-        propEnumValue(t, POWER_SUPPLY_STATE, 46, node);
-        propEnumValue(t, THERMAL_STATE, 60, node);
-        propEnumValue(t, SECURITY_STATUS, 49, node);
-        propBuffer(t, OEM_DEFINED, 4, 43, node);
-        propNumber8(t, HEIGHT, 21, node);
-        propNumber8(t, POWER_CORDS, 42, node);
-
-        // Contained elements: a record's first byte is an SMBIOS
-        // structure type (bit 7 set) or a baseboard type. The records
-        // are read as they stand, even past the structure's end.
-        unsigned int const count = getNumber8(t, ELEMENT_COUNT);
-        unsigned int const recordLength = getNumber8(t, ELEMENT_RECORD_LENGTH);
-        SMBIOS_DETAIL(logger, "Contained Element Record count=" << count);
-        SMBIOS_DETAIL(logger, "Contained Element Record Length=" << recordLength);
-        if (count != 0 && recordLength != 0) {
-            std::string elements;
-            for (unsigned int r = 0; r < count; ++r) {
-                unsigned int const element = getNumber8Unprot(t, ELEMENTS + r * recordLength);
-                if ((element & 0x80) != 0) {
-                    elements += " " + std::to_string(element & 0x7F);
-                } else {
-                    elements += " " + std::to_string(element);
-                    if (holdsBaseboard(element)) {
-                        planarParentId = nodeId;
-                        homeFound = true;
-                    }
-                }
-            }
-            SMBIOS_DETAIL(logger, "Contained Elements=" << elements);
-        } else {
-            SMBIOS_DETAIL(logger, " < NONE > ");
+        setChassisState(t, node, systemProduct, systemSerial, kind.packageType, kind.enclosure);
+        if (containsBaseboard(t)) {
+            planarParentId = nodeId;
+            homeFound = true;
         }
     });
     makePlanarNodes(lists, planarParentId);
     SMBIOS_DETAIL(logger, "makeChassisNodes exit");
+}
+
+// Maker, part number, chassis lock and name (108: kindName, or "Chassis").
+void SmBiosMI::setChassisIdentity(SD::SmBios::Table const* t, MutableNode* node,
+                                  std::string const& systemManufacturer,
+                                  std::string const& systemProduct, unsigned int type,
+                                  char const* kindName) {
+    std::string manufacturer = getString(t, MANUFACTURER);
+    if (manufacturer.empty() || manufacturer == " " || manufacturer == "none") {
+        manufacturer = systemManufacturer;
+    }
+    node->setProperty(36, PropertyValue(manufacturer, true));
+    std::string const partNumber = getPartNum(systemProduct);
+    if (!partNumber.empty()) {
+        node->setProperty(45, PropertyValue(partNumber, true));
+    }
+    propBool8(t, TYPE, 0x80, 10, node);
+
+    SMBIOS_DETAIL(logger, "Chassis Type = " << type);
+    node->setProperty(108, PropertyValue("Chassis", true));
+    if (kindName != nullptr) {
+        node->setProperty(108, PropertyValue(kindName, true));
+    }
+}
+
+// Model, package type, enclosure, version, serial number (the system's
+// where the chassis has none), asset tag, states, OEM bytes, height and
+// power cords.
+void SmBiosMI::setChassisState(SD::SmBios::Table const* t, MutableNode* node,
+                               std::string const& systemProduct, std::string const& systemSerial,
+                               unsigned int packageType, unsigned int enclosure) {
+    node->setProperty(39, PropertyValue(systemProduct, true));
+    node->setProperty(11, PropertyValue(EnumValue(packageType), true));
+    node->setProperty(213, PropertyValue(EnumValue(enclosure), true));
+    propString(t, VERSION, 307, node);
+
+    std::string serial = getString(t, SERIAL);
+    if (serial.empty() || serial == " " || lowerCase(serial) == "none") {
+        serial = systemSerial;
+    }
+    node->setProperty(50, PropertyValue(serial, true));
+
+    propString(t, ASSET_TAG, 2, node);
+    propEnumValue(t, BOOT_UP_STATE, 4, node);
+    propEnumValue(t, POWER_SUPPLY_STATE, 46, node);
+    propEnumValue(t, THERMAL_STATE, 60, node);
+    propEnumValue(t, SECURITY_STATUS, 49, node);
+    propBuffer(t, OEM_DEFINED, 4, 43, node);
+    propNumber8(t, HEIGHT, 21, node);
+    propNumber8(t, POWER_CORDS, 42, node);
+}
+
+// Whether a contained element is a baseboard type that makes the chassis
+// the planar's home. A record's first byte is an SMBIOS structure type
+// (bit 7 set) or a baseboard type; the records are read as they stand, even
+// past the structure's end.
+bool SmBiosMI::containsBaseboard(SD::SmBios::Table const* t) const {
+    unsigned int const count = getNumber8(t, ELEMENT_COUNT);
+    unsigned int const recordLength = getNumber8(t, ELEMENT_RECORD_LENGTH);
+    SMBIOS_DETAIL(logger, "Contained Element Record count=" << count);
+    SMBIOS_DETAIL(logger, "Contained Element Record Length=" << recordLength);
+    if (count == 0 || recordLength == 0) {
+        SMBIOS_DETAIL(logger, " < NONE > ");
+        return false;
+    }
+    bool baseboard = false;
+    std::string elements;
+    for (unsigned int r = 0; r < count; ++r) {
+        unsigned int const element = getNumber8Unprot(t, ELEMENTS + r * recordLength);
+        if ((element & 0x80) != 0) {
+            elements += " " + std::to_string(element & 0x7F);
+        } else {
+            elements += " " + std::to_string(element);
+            baseboard = baseboard || holdsBaseboard(element);
+        }
+    }
+    SMBIOS_DETAIL(logger, "Contained Elements=" << elements);
+    return baseboard;
 }
 
 }  // namespace IC

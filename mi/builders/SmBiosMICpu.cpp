@@ -127,31 +127,35 @@ void SmBiosMI::makeCpuNodes(TableLists tables, unsigned int parentNodeId) {
         SMBIOS_DETAIL(logger, " 64 bit = " << wide);
         node->setProperty(15, PropertyValue(Number(wide ? 64u : 32u), true));
 
-        unsigned int const cores = getNumber8(t, CORE_COUNT);
-        unsigned int const enabled = getNumber8(t, CORE_ENABLED);
-        unsigned int const threads = getNumber8(t, THREAD_COUNT);
-        SMBIOS_DETAIL(logger, " Cores =" << cores << " enabled=" << enabled
-                                         << " thread count=" << threads
-                                         << (cores == 0 ? " - no core data in smbios tables" : ""));
-        node->setProperty(190, PropertyValue(Number(cores), true));
-        node->setProperty(189, PropertyValue(Number(enabled), true));
-        node->setProperty(87, PropertyValue(Number(threads), true));
-
-        // Every core carries the whole processor's thread count.
-        for (unsigned int c = 0; c < cores; ++c) {
-            MutableNode* core = newNode(nodeId, 42, c);
-            core->setDescription("CPU Core Information");
-            core->setStatus(c < enabled ? 1 : 16);
-            core->setProperty(125, PropertyValue(numbers({1, 16}), true));
-            core->setProperty(128, PropertyValue(EnumValue(static_cast<unsigned char>(0)), true));
-            if (threads != 0) {
-                // Kept: every core carries the whole processor's thread
-                // count, as the agent's reports expect.
-                core->setProperty(87, PropertyValue(Number(threads), true));
-            }
-        }
+        makeCoreNodes(t, node);
     });
     SMBIOS_DETAIL(logger, "makeCpuNodes exit");
+}
+
+// The core counts of a processor node and one core node per core.
+void SmBiosMI::makeCoreNodes(SD::SmBios::Table const* t, MutableNode* processor) {
+    unsigned int const cores = getNumber8(t, CORE_COUNT);
+    unsigned int const enabled = getNumber8(t, CORE_ENABLED);
+    unsigned int const threads = getNumber8(t, THREAD_COUNT);
+    SMBIOS_DETAIL(logger, " Cores =" << cores << " enabled=" << enabled
+                                     << " thread count=" << threads
+                                     << (cores == 0 ? " - no core data in smbios tables" : ""));
+    processor->setProperty(190, PropertyValue(Number(cores), true));
+    processor->setProperty(189, PropertyValue(Number(enabled), true));
+    processor->setProperty(87, PropertyValue(Number(threads), true));
+
+    for (unsigned int c = 0; c < cores; ++c) {
+        MutableNode* core = newNode(processor->getNodeId(), 42, c);
+        core->setDescription("CPU Core Information");
+        core->setStatus(c < enabled ? 1 : 16);
+        core->setProperty(125, PropertyValue(numbers({1, 16}), true));
+        core->setProperty(128, PropertyValue(EnumValue(static_cast<unsigned char>(0)), true));
+        if (threads != 0) {
+            // Kept: every core carries the whole processor's thread
+            // count, as the agent's reports expect.
+            core->setProperty(87, PropertyValue(Number(threads), true));
+        }
+    }
 }
 
 }  // namespace IC
