@@ -434,69 +434,93 @@ std::string renderJson(std::vector<IC::Node*> const& nodes) {
     return document.dump(2) + "\n";
 }
 
-std::string renderTree(std::vector<IC::Node*> const& nodes) {
+namespace {
+
+// The nodes of a tree printout and how they hang together: each node's
+// children in list order, and whether it starts a tree of its own (its
+// linked id names no node of the list).
+struct TreeShape {
     std::vector<IC::Node const*> list;
+    std::vector<std::vector<size_t>> children;
+    std::vector<bool> topLevel;
+};
+
+TreeShape treeShape(std::vector<IC::Node*> const& nodes) {
+    TreeShape shape;
     for (IC::Node const* node : nodes) {
         if (node != nullptr) {
-            list.push_back(node);
+            shape.list.push_back(node);
         }
     }
-
     // The first node with an id is the one its linked nodes hang under.
     std::map<unsigned int, size_t> byId;
-    for (size_t i = 0; i < list.size(); ++i) {
-        byId.emplace(list[i]->getNodeId(), i);
+    for (size_t i = 0; i < shape.list.size(); ++i) {
+        byId.emplace(shape.list[i]->getNodeId(), i);
     }
-    std::vector<std::vector<size_t>> children(list.size());
-    std::vector<bool> topLevel(list.size(), false);
-    for (size_t i = 0; i < list.size(); ++i) {
-        auto parent = byId.find(list[i]->getLinkedId());
+    shape.children.resize(shape.list.size());
+    shape.topLevel.assign(shape.list.size(), false);
+    for (size_t i = 0; i < shape.list.size(); ++i) {
+        auto parent = byId.find(shape.list[i]->getLinkedId());
         if (parent == byId.end()) {
-            topLevel[i] = true;
+            shape.topLevel[i] = true;
         } else {
-            children[parent->second].push_back(i);
+            shape.children[parent->second].push_back(i);
         }
     }
+    return shape;
+}
 
-    std::string out;
-    std::vector<bool> printed(list.size(), false);
-    auto printFrom = [&](size_t start) {
-        // Depth first with an explicit stack; a node is printed once, which
-        // also ends any cycle of linked ids.
-        std::vector<std::pair<size_t, size_t>> stack;  // node, depth
-        stack.emplace_back(start, 0);
-        while (!stack.empty()) {
-            auto const [index, depth] = stack.back();
-            stack.pop_back();
-            if (printed[index]) {
-                continue;
-            }
-            printed[index] = true;
-            NodeFacts const facts = readFacts(*list[index]);
-            std::string const indent(2 * depth, ' ');
-            out += indent + nodeLine(facts, depth == 0) + "\n";
-            for (auto const& property : readProperties(*list[index])) {
-                out += indent + "  " + std::to_string(property.first) + " " +
-                       valueKindName(property.second) + "  " + formatValue(property.second) + "\n";
-            }
-            auto const& below = children[index];
-            for (auto child = below.rbegin(); child != below.rend(); ++child) {
-                if (!printed[*child]) {
-                    stack.emplace_back(*child, depth + 1);
-                }
+// One node's line and its property lines beneath it, indented by depth.
+void printNode(IC::Node const& node, size_t depth, std::string& out) {
+    NodeFacts const facts = readFacts(node);
+    std::string const indent(2 * depth, ' ');
+    out += indent + nodeLine(facts, depth == 0) + "\n";
+    for (auto const& property : readProperties(node)) {
+        out += indent + "  " + std::to_string(property.first) + " " +
+               valueKindName(property.second) + "  " + formatValue(property.second) + "\n";
+    }
+}
+
+// The node at `start` and everything below it that is not printed yet.
+void printSubtree(TreeShape const& shape, size_t start, std::vector<bool>& printed,
+                  std::string& out) {
+    // Depth first with an explicit stack; a node is printed once, which
+    // also ends any cycle of linked ids.
+    std::vector<std::pair<size_t, size_t>> stack;  // node, depth
+    stack.emplace_back(start, 0);
+    while (!stack.empty()) {
+        auto const [index, depth] = stack.back();
+        stack.pop_back();
+        if (printed[index]) {
+            continue;
+        }
+        printed[index] = true;
+        printNode(*shape.list[index], depth, out);
+        auto const& below = shape.children[index];
+        for (auto child = below.rbegin(); child != below.rend(); ++child) {
+            if (!printed[*child]) {
+                stack.emplace_back(*child, depth + 1);
             }
         }
-    };
-    for (size_t i = 0; i < list.size(); ++i) {
-        if (topLevel[i]) {
-            printFrom(i);
+    }
+}
+
+}  // namespace
+
+std::string renderTree(std::vector<IC::Node*> const& nodes) {
+    TreeShape const shape = treeShape(nodes);
+    std::string out;
+    std::vector<bool> printed(shape.list.size(), false);
+    for (size_t i = 0; i < shape.list.size(); ++i) {
+        if (shape.topLevel[i]) {
+            printSubtree(shape, i, printed, out);
         }
     }
     // Nodes whose linked ids only lead round in a cycle start trees of
     // their own.
-    for (size_t i = 0; i < list.size(); ++i) {
+    for (size_t i = 0; i < shape.list.size(); ++i) {
         if (!printed[i]) {
-            printFrom(i);
+            printSubtree(shape, i, printed, out);
         }
     }
     return out;
