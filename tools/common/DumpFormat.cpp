@@ -333,23 +333,26 @@ std::string formatOverride(std::vector<uint8_t> const& header, std::vector<uint8
     return text;
 }
 
-bool parseOverride(std::string const& text, std::vector<uint8_t>& header,
-                   std::vector<uint8_t>& table, std::string& error) {
-    OverrideReader reader(text);
-    OverrideReader::Token token;
-    auto expectTag = [&](char const* tag) {
-        if (!reader.next(token, error)) {
-            return false;
-        }
-        if (token.kind != OverrideReader::Token::TAG || token.tag != tag) {
-            error =
-                OverrideReader::at(token.line) + "expected <" + tag + ">, found " + describe(token);
-            return false;
-        }
-        return true;
-    };
+namespace {
 
-    if (!expectTag("SHOWSMBIOS") || !expectTag("EPHEADER")) {
+// Reads the next token, which must be the tag <tag>.
+bool expectTag(OverrideReader& reader, OverrideReader::Token& token, char const* tag,
+               std::string& error) {
+    if (!reader.next(token, error)) {
+        return false;
+    }
+    if (token.kind != OverrideReader::Token::TAG || token.tag != tag) {
+        error = OverrideReader::at(token.line) + "expected <" + tag + ">, found " + describe(token);
+        return false;
+    }
+    return true;
+}
+
+// <SHOWSMBIOS><EPHEADER>, the entry point's bytes, </EPHEADER>.
+bool readHeaderSection(OverrideReader& reader, OverrideReader::Token& token,
+                       std::vector<uint8_t>& header, std::string& error) {
+    if (!expectTag(reader, token, "SHOWSMBIOS", error) ||
+        !expectTag(reader, token, "EPHEADER", error)) {
         return false;
     }
     if (!reader.next(token, error)) {
@@ -360,19 +363,21 @@ bool parseOverride(std::string const& text, std::vector<uint8_t>& header,
                 describe(token);
         return false;
     }
-    std::vector<uint8_t> newHeader = std::move(token.bytes);
-    if (!expectTag("/EPHEADER")) {
-        return false;
-    }
+    header = std::move(token.bytes);
+    return expectTag(reader, token, "/EPHEADER", error);
+}
 
-    std::vector<uint8_t> newTable;
+// The table's bytes up to and including </SHOWSMBIOS>, with at most one
+// <SIZE> block among them (its content skipped); at least one byte.
+bool readTableSection(OverrideReader& reader, OverrideReader::Token& token,
+                      std::vector<uint8_t>& table, std::string& error) {
     bool sawSize = false;
     for (;;) {
         if (!reader.next(token, error)) {
             return false;
         }
         if (token.kind == OverrideReader::Token::DATA) {
-            newTable.insert(newTable.end(), token.bytes.begin(), token.bytes.end());
+            table.insert(table.end(), token.bytes.begin(), token.bytes.end());
             continue;
         }
         if (token.kind == OverrideReader::Token::END) {
@@ -389,7 +394,7 @@ bool parseOverride(std::string const& text, std::vector<uint8_t>& header,
             }
             sawSize = true;
             reader.skipToTag();
-            if (!expectTag("/SIZE")) {
+            if (!expectTag(reader, token, "/SIZE", error)) {
                 return false;
             }
             continue;
@@ -398,8 +403,23 @@ bool parseOverride(std::string const& text, std::vector<uint8_t>& header,
                 " in the table section";
         return false;
     }
-    if (newTable.empty()) {
+    if (table.empty()) {
         error = OverrideReader::at(token.line) + "the table section holds no data";
+        return false;
+    }
+    return true;
+}
+
+}  // namespace
+
+bool parseOverride(std::string const& text, std::vector<uint8_t>& header,
+                   std::vector<uint8_t>& table, std::string& error) {
+    OverrideReader reader(text);
+    OverrideReader::Token token;
+    std::vector<uint8_t> newHeader;
+    std::vector<uint8_t> newTable;
+    if (!readHeaderSection(reader, token, newHeader, error) ||
+        !readTableSection(reader, token, newTable, error)) {
         return false;
     }
     if (!reader.next(token, error)) {
