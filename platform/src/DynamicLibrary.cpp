@@ -1,4 +1,4 @@
-// SD::DynamicLibrary: dlopen/dlclose behind the agent's library interface.
+// SD::DynamicLibrary: dlopen/dlsym/dlclose behind the agent's library interface.
 #include "SD/DynamicLibrary.h"
 
 #include <dlfcn.h>
@@ -25,6 +25,18 @@ bool DynamicLibrary::load() {
     }
     lastError_.clear();
     return true;
+}
+
+void* DynamicLibrary::getSymbol(std::string const& name) {
+    if (handle_ == nullptr) {
+        lastError_ = make_string(fileName_) + " is not loaded";
+        return nullptr;
+    }
+    dlerror();  // forget any earlier failure
+    void* const symbol = dlsym(handle_, name.c_str());
+    char const* reason = symbol == nullptr ? dlerror() : nullptr;
+    lastError_ = reason != nullptr ? reason : "";
+    return symbol;
 }
 
 void DynamicLibrary::unload() {

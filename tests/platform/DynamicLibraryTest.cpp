@@ -96,6 +96,31 @@ TEST(DynamicLibrary, SymbolsAreFoundThroughHandle) {
     EXPECT_EQ(42, answer());
 }
 
+TEST(DynamicLibrary, GetSymbolFindsFunction) {
+    DynamicLibrary library(SD::make_wstring(platform_test::besideTestProgram(kModule)));
+    ASSERT_TRUE(library.load()) << library.getLastError();
+    void* const symbol = library.getSymbol("kestrel_test_module_answer");
+    ASSERT_NE(nullptr, symbol) << library.getLastError();
+    EXPECT_EQ(dlsym(library.getHandle(), "kestrel_test_module_answer"), symbol);
+    EXPECT_EQ("", library.getLastError());
+}
+
+TEST(DynamicLibrary, GetSymbolOfMissingNameFailsWithReason) {
+    DynamicLibrary library(SD::make_wstring(platform_test::besideTestProgram(kModule)));
+    ASSERT_TRUE(library.load()) << library.getLastError();
+    EXPECT_EQ(nullptr, library.getSymbol("kestrel_test_module_no_such_function"));
+    EXPECT_NE(std::string::npos,
+              library.getLastError().find("kestrel_test_module_no_such_function"))
+        << library.getLastError();
+}
+
+TEST(DynamicLibrary, GetSymbolBeforeLoadFails) {
+    DynamicLibrary library(SD::make_wstring(platform_test::besideTestProgram(kModule)));
+    EXPECT_EQ(nullptr, library.getSymbol("kestrel_test_module_answer"));
+    EXPECT_NE(std::string::npos, library.getLastError().find("not loaded"))
+        << library.getLastError();
+}
+
 TEST(DynamicLibrary, UnloadReleasesLibrary) {
     std::string const path = platform_test::besideTestProgram(kModule);
     DynamicLibrary library(SD::make_wstring(path));

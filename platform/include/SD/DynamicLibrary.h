@@ -17,6 +17,12 @@ public:
     void unload();
     // The handle for symbol lookup, null while not loaded.
     void* getHandle() const { return handle_; }
+    // The address of the symbol `name` in the loaded library, through the
+    // handle; null while not loaded or when the library does not define it
+    // (getLastError says why). The plug-in keeps to load, getHandle and
+    // unload, the members the agent's own library offers; this one serves
+    // the tools.
+    void* getSymbol(std::string const& name);
     std::wstring const& getFileName() const { return fileName_; }
     std::string const& getLastError() const { return lastError_; }
 
