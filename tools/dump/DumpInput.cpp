@@ -1,7 +1,5 @@
 #include "DumpInput.h"
 
-#include <dlfcn.h>
-
 #include <cerrno>
 #include <cstdio>
 
@@ -186,28 +184,18 @@ bool captureFromMachine(std::string const& libraryPath, Capture& out, std::strin
     // of the library path.
     std::string const path =
         libraryPath.find('/') == std::string::npos ? "./" + libraryPath : libraryPath;
-    // Loaded with dlopen rather than the contract's BoundLibrary, which
-    // needs the platform library: smbios-dump runs on its own, with only
-    // libpmem.so beside it or in ../lib.
-    dlerror();
-    void* handle = dlopen(path.c_str(), RTLD_NOW | RTLD_LOCAL);
-    if (handle == nullptr) {
-        char const* why = dlerror();
-        error = "cannot load the physical-memory library " + path + ": " +
-                (why != nullptr ? why : "unknown error");
+    pmem::BoundLibrary library(path);
+    if (!library.loadAndBind()) {
+        error =
+            library.missing() != nullptr
+                ? "the physical-memory library " + path + " does not export " + library.missing()
+                : "cannot load the physical-memory library " + path + ": " + library.getLastError();
         return false;
     }
-    PMemFunctions functions;
-    if (char const* missing = pmem::bindFunctions(handle, functions)) {
-        error = "the physical-memory library " + path + " does not export " + missing;
-        dlclose(handle);
-        return false;
-    }
-    bool const captured = captureFromMemory(functions, out, error);
+    bool const captured = captureFromMemory(library.functions(), out, error);
     if (!captured) {
         error = path + ": " + error;
     }
-    dlclose(handle);
     return captured;
 }
 

@@ -1,7 +1,5 @@
 #include "inventory/PluginHost.h"
 
-#include <dlfcn.h>
-
 #include <cstring>
 #include <memory>
 
@@ -41,39 +39,32 @@ std::string failed(char const* step, IC::Error const& error) {
 
 PluginHost::PluginHost(std::string const& path) : path_(path), library_(SD::make_wstring(path)) {}
 
-void* PluginHost::entryPoint() const {
-    dlerror();
-    return library_.getHandle() != nullptr ? dlsym(library_.getHandle(), kEntryPoint) : nullptr;
-}
-
 bool PluginHost::load(std::string& why) {
     if (!library_.load()) {
         why = "cannot load the plug-in " + path_ + ": " + library_.getLastError();
         return false;
     }
-    if (entryPoint() == nullptr) {
-        char const* reason = dlerror();
+    void* const symbol = library_.getSymbol(kEntryPoint);
+    if (symbol == nullptr) {
+        std::string const& reason = library_.getLastError();
         why = "the plug-in " + path_ + " has no OpenMI entry point" +
-              (reason != nullptr ? std::string(": ") + reason : std::string());
+              (!reason.empty() ? ": " + reason : std::string());
         return false;
     }
+    static_assert(sizeof openMI_ == sizeof symbol, "function and data pointers differ in size");
+    std::memcpy(&openMI_, &symbol, sizeof openMI_);
     return true;
 }
 
 bool PluginHost::isLinkedSmBiosPlugin() const {
-    // The SMBIOS plug-in this program links is in the global scope; a
-    // plug-in loaded from a path is the same one only when the loader found
-    // it to be the same file.
-    void* const loaded = entryPoint();
-    return loaded != nullptr && loaded == dlsym(RTLD_DEFAULT, kEntryPoint);
+    // The SMBIOS plug-in this program links is the one whose OpenMI this
+    // program calls by name; a plug-in loaded from a path is the same one
+    // only when the loader found it to be the same file.
+    return openMI_ != nullptr && openMI_ == &OpenMI;
 }
 
 bool PluginHost::initialize(std::string& why) {
-    IC::OpenMIFunction openMI = nullptr;
-    void* const symbol = entryPoint();
-    static_assert(sizeof openMI == sizeof symbol, "function and data pointers differ in size");
-    std::memcpy(&openMI, &symbol, sizeof openMI);
-    int const opened = openMI(&interface_, &openError_);
+    int const opened = openMI_(&interface_, &openError_);
     if (opened != 0) {
         why = "OpenMI of " + path_ + " returned " + std::to_string(opened);
         if (openError_ != nullptr && !openError_->getMessage().empty()) {

@@ -46,10 +46,9 @@ public:
     bool getNodes(std::vector<IC::Node*>& nodes, std::string& why);
 
 private:
-    void* entryPoint() const;
-
     std::string path_;
     SD::DynamicLibrary library_;
+    IC::OpenMIFunction openMI_ = nullptr;  // the library's OpenMI, once loaded
     IC::ManagementInterface* interface_ = nullptr;
     IC::Error* openError_ = nullptr;
 };
