@@ -18,6 +18,7 @@
 #include <unistd.h>
 
 #include <CLI/CLI.hpp>
+#include <cstdint>
 #include <cstdio>
 #include <iostream>
 #include <string>
@@ -37,23 +38,9 @@ size_t const kBytesPerLine = 32;
 
 void complain(std::string const& message) { smbiostool::complain(kProgram, message); }
 
-int usage(std::string const& message) { return smbiostool::usage(kProgram, message); }
-
-bool writeToStandardOutput(std::string const& text) {
-    std::fwrite(text.data(), 1, text.size(), stdout);
-    return std::fflush(stdout) == 0 && std::ferror(stdout) == 0;
-}
-
-int run(int argc, char** argv) {
-    CLI::App app{
-        "Writes an SMBIOS table into the override dump file that the SMBIOS plug-in reads "
-        "instead of physical memory.",
-        kProgram};
-    app.footer(
-        "Exactly one source and one output. --install writes <data dir>/SmBiosOverride/"
-        "smbios.txt, the data dir being --data-dir, else KESTREL_DATA_DIR, else "
-        "/var/lib/kestrel/. --version without a value prints this program's version.");
-
+// The command line: the options' values, and which options were given (a
+// given value may be empty: "--from-bin ''" names a source).
+struct CommandLine {
     std::string fromBin;
     std::string fromTable;
     std::string tableVersion;
@@ -64,135 +51,246 @@ int run(int argc, char** argv) {
     std::string dataDir;
     bool force = false;
 
-    auto* fromBinOption =
-        app.add_option("--from-bin", fromBin, "Source: a dmidecode --dump-bin image")
+    bool fromBinGiven = false;
+    bool fromTableGiven = false;
+    bool versionGiven = false;
+    bool outputGiven = false;
+
+    int sources() const {
+        return (fromBinGiven ? 1 : 0) + (fromTableGiven ? 1 : 0) + (fromMachine ? 1 : 0);
+    }
+};
+
+// The options whose presence counts, not only their value; they live as
+// long as the CLI::App that parses the command line.
+struct CountedOptions {
+    CLI::Option* fromBin = nullptr;
+    CLI::Option* fromTable = nullptr;
+    CLI::Option* version = nullptr;
+    CLI::Option* output = nullptr;
+
+    void record(CommandLine& line) const {
+        line.fromBinGiven = fromBin->count() > 0;
+        line.fromTableGiven = fromTable->count() > 0;
+        line.versionGiven = version->count() > 0;
+        line.outputGiven = output->count() > 0;
+    }
+};
+
+// --version MAJ.MIN: each part a decimal number from 0 to 255. Without a
+// value the option asks for the program's version; that is not checked
+// here.
+CLI::Validator smbiosVersionValidator() {
+    return CLI::Validator(
+        [](std::string& text) {
+            uint8_t major = 0;
+            uint8_t minor = 0;
+            if (smbiosdump::parseSmbiosVersion(text, major, minor)) {
+                return std::string();
+            }
+            return "bad SMBIOS version '" + text + "' (MAJ.MIN expected, each 0-255)";
+        },
+        "");
+}
+
+// The sources, one of which is needed: --from-bin, --from-table with its
+// --version, --from-machine with its --pmem.
+void addSourceOptions(CLI::App& app, CommandLine& line, CountedOptions& counted) {
+    counted.fromBin =
+        app.add_option("--from-bin", line.fromBin, "Source: a dmidecode --dump-bin image")
             ->type_name("FILE");
-    auto* fromTableOption =
-        app.add_option("--from-table", fromTable,
+    counted.fromTable =
+        app.add_option("--from-table", line.fromTable,
                        "Source: a raw SMBIOS structure table (needs --version MAJ.MIN)")
             ->type_name("FILE");
-    auto* versionOption =
-        app.add_option("--version", tableVersion,
+    counted.version =
+        app.add_option("--version", line.tableVersion,
                        "The SMBIOS version of the --from-table table; without a value, print "
                        "this program's version and exit")
             ->type_name("MAJ.MIN")
-            ->expected(0, 1);
-    auto* fromMachineOption = app.add_flag("--from-machine", fromMachine,
+            ->expected(0, 1)
+            ->check(smbiosVersionValidator());
+    auto* fromMachineOption = app.add_flag("--from-machine", line.fromMachine,
                                            "Source: this machine, through the libpmem.so library");
     auto* pmemOption =
-        app.add_option("--pmem", pmemPath,
+        app.add_option("--pmem", line.pmemPath,
                        "The physical-memory library for --from-machine (default: libpmem.so "
                        "beside this program, else in ../lib from it)")
             ->type_name("PATH");
-    auto* outputOption =
-        app.add_option("-o,--output", output, "Write the dump file here (- for standard output)")
-            ->type_name("FILE");
-    auto* installOption = app.add_flag("--install", install,
+    counted.fromBin->excludes(counted.fromTable)->excludes(fromMachineOption);
+    counted.fromTable->excludes(fromMachineOption);
+    pmemOption->needs(fromMachineOption);
+}
+
+// The outputs, one of which is needed: -o FILE or --install (with its
+// --data-dir); and --force.
+void addOutputOptions(CLI::App& app, CommandLine& line, CountedOptions& counted) {
+    counted.output = app.add_option("-o,--output", line.output,
+                                    "Write the dump file here (- for standard output)")
+                         ->type_name("FILE");
+    auto* installOption = app.add_flag("--install", line.install,
                                        "Write the dump file where the plug-in looks for it first");
     auto* dataDirOption =
-        app.add_option("--data-dir", dataDir, "The agent's data directory for --install")
+        app.add_option("--data-dir", line.dataDir, "The agent's data directory for --install")
             ->type_name("DIR");
-    app.add_flag("--force", force,
+    app.add_flag("--force", line.force,
                  "Replace the output file when it exists (a regular file or a symbolic link; "
                  "nothing else is replaced)");
-
-    fromBinOption->excludes(fromTableOption)->excludes(fromMachineOption);
-    fromTableOption->excludes(fromMachineOption);
-    pmemOption->needs(fromMachineOption);
-    outputOption->excludes(installOption);
+    counted.output->excludes(installOption);
     dataDirOption->needs(installOption);
+}
 
-    int exitStatus = 0;
-    if (!smbiostool::parseCommandLine(app, argc, argv, kProgram, exitStatus)) {
-        return exitStatus;
+// The rules across options that CLI11's exclusions and requirements cannot
+// say in this program's words, checked once those have passed: --version
+// alone prints the program's version; exactly one source (the exclusions
+// refuse a second one); --version MAJ.MIN with --from-table and only with
+// it; exactly one output (the exclusions refuse a second one).
+void checkCombination(CommandLine const& line) {
+    if (line.versionGiven && line.tableVersion.empty() && line.sources() == 0) {
+        throw CLI::CallForVersion(std::string(kProgram) + " " + PROJECT_VERSION,
+                                  CLI::ExitCodes::Success);
     }
+    if (line.sources() != 1) {
+        throw CLI::RequiredError(
+            "exactly one source is needed: --from-bin FILE, --from-table FILE --version MAJ.MIN "
+            "or --from-machine",
+            CLI::ExitCodes::RequiredError);
+    }
+    if (line.fromTableGiven && line.tableVersion.empty()) {
+        throw CLI::RequiredError("--from-table needs the table's SMBIOS version: --version MAJ.MIN",
+                                 CLI::ExitCodes::RequiredError);
+    }
+    if (!line.fromTableGiven && line.versionGiven) {
+        throw CLI::ValidationError("--version MAJ.MIN only goes with --from-table");
+    }
+    if (!line.outputGiven && !line.install) {
+        throw CLI::RequiredError("no output: give -o FILE, -o - (standard output) or --install",
+                                 CLI::ExitCodes::RequiredError);
+    }
+    if (line.outputGiven && line.output.empty()) {
+        throw CLI::ValidationError("-o: empty file name");
+    }
+}
 
-    int const sources = (fromBinOption->count() > 0 ? 1 : 0) +
-                        (fromTableOption->count() > 0 ? 1 : 0) + (fromMachine ? 1 : 0);
-    bool const versionGiven = versionOption->count() > 0;
-    if (versionGiven && tableVersion.empty() && sources == 0) {
-        std::cout << kProgram << " " << PROJECT_VERSION << std::endl;
+// Parses the command line into `line`. Returns true when the program goes
+// on; else false and the status to exit with (0 after the help or the
+// version, EXIT_USAGE after saying what is wrong).
+bool parseOptions(int argc, char** argv, CommandLine& line, int& exitStatus) {
+    CLI::App app{
+        "Writes an SMBIOS table into the override dump file that the SMBIOS plug-in reads "
+        "instead of physical memory.",
+        kProgram};
+    app.footer(
+        "Exactly one source and one output. --install writes <data dir>/SmBiosOverride/"
+        "smbios.txt, the data dir being --data-dir, else KESTREL_DATA_DIR, else "
+        "/var/lib/kestrel/. --version without a value prints this program's version.");
+    CountedOptions counted;
+    addSourceOptions(app, line, counted);
+    addOutputOptions(app, line, counted);
+    app.callback([&line, &counted]() {
+        counted.record(line);
+        checkCombination(line);
+    });
+    return smbiostool::parseCommandLine(app, argc, argv, kProgram, exitStatus);
+}
+
+// Where the dump file goes: standard output, the -o file, or the override
+// file under the data directory for --install.
+struct Target {
+    bool toStandardOutput = false;
+    std::string path;
+    bool install = false;
+    std::string installDataDir;
+};
+
+Target chooseTarget(CommandLine const& line) {
+    Target target;
+    target.toStandardOutput = !line.install && line.output == "-";
+    target.path = line.output;
+    target.install = line.install;
+    if (line.install) {
+        target.installDataDir = smbiosdump::dataDirectory(line.dataDir);
+        target.path = smbiosdump::overridePath(target.installDataDir);
+    }
+    return target;
+}
+
+// An existing file is refused before any input is read, and again (without
+// a race) when it is put in place. What is not a regular file or a symbolic
+// link is never replaced: a device or FIFO would be swapped for a plain
+// file. Returns 0, or the exit status after saying why.
+int checkTarget(Target const& target, bool force) {
+    if (target.toStandardOutput) {
         return 0;
     }
-    if (sources != 1) {
-        return usage(
-            "exactly one source is needed: --from-bin FILE, --from-table FILE --version MAJ.MIN "
-            "or --from-machine");
-    }
-    uint8_t major = 0;
-    uint8_t minor = 0;
-    if (fromTableOption->count() > 0) {
-        if (tableVersion.empty()) {
-            return usage("--from-table needs the table's SMBIOS version: --version MAJ.MIN");
-        }
-        if (!smbiosdump::parseSmbiosVersion(tableVersion, major, minor)) {
-            return usage("--version: bad SMBIOS version '" + tableVersion +
-                         "' (MAJ.MIN expected, each 0-255)");
-        }
-    } else if (versionGiven) {
-        return usage("--version MAJ.MIN only goes with --from-table");
-    }
-    if (outputOption->count() == 0 && !install) {
-        return usage("no output: give -o FILE, -o - (standard output) or --install");
-    }
-    if (outputOption->count() > 0 && output.empty()) {
-        return usage("-o: empty file name");
-    }
-
-    // Where the file goes; an existing one is refused before any input is
-    // read, and again (without a race) when it is put in place. What is not
-    // a regular file or a symbolic link is never replaced: a device or FIFO
-    // would be swapped for a plain file.
-    bool const toStandardOutput = !install && output == "-";
-    std::string target = output;
-    std::string installDataDir;
-    if (install) {
-        installDataDir = smbiosdump::dataDirectory(dataDir);
-        target = smbiosdump::overridePath(installDataDir);
-    }
     std::string error;
-    if (!toStandardOutput && !smbiosdump::mayReplace(target, error)) {
+    if (!smbiosdump::mayReplace(target.path, error)) {
         complain(error);
         return smbiostool::EXIT_FAILED;
     }
-    if (!toStandardOutput && !force && access(target.c_str(), F_OK) == 0) {
-        complain(target + " exists; not replaced (use --force to replace it)");
+    if (!force && access(target.path.c_str(), F_OK) == 0) {
+        complain(target.path + " exists; not replaced (use --force to replace it)");
         return smbiostool::EXIT_FAILED;
     }
+    return 0;
+}
 
-    // The whole input, before anything is written.
-    smbiosdump::Capture capture;
-    if (fromBinOption->count() > 0 || fromTableOption->count() > 0) {
-        std::string const& path = fromBinOption->count() > 0 ? fromBin : fromTable;
-        std::vector<uint8_t> bytes;
-        if (!smbiosdump::readInputFile(path, bytes, error)) {
-            complain(path + ": " + error);
-            return smbiostool::EXIT_FAILED;
-        }
-        bool const captured =
-            fromBinOption->count() > 0
-                ? smbiosdump::captureFromDumpBin(bytes, capture, error)
-                : smbiosdump::captureFromTable(bytes, major, minor, capture, error);
-        if (!captured) {
-            complain(path + ": " + error);
-            return smbiostool::EXIT_FAILED;
-        }
-    } else {
-        std::string const library =
-            pmemPath.empty() ? smbiosdump::defaultPMemPath(smbiostool::ownFolder()) : pmemPath;
-        if (!smbiosdump::captureFromMachine(library, capture, error)) {
-            // The library's sources (the kernel's tables, /dev/mem) are
-            // root's to read.
-            complain("cannot read this machine's SMBIOS table: " + error +
-                     (geteuid() != 0 ? " (reading physical memory usually needs root)" : ""));
-            return smbiostool::EXIT_FAILED;
-        }
+// --from-bin or --from-table: the whole file, then its entry point and
+// table. Returns 0, or the exit status after saying why.
+int captureFromFile(CommandLine const& line, smbiosdump::Capture& capture) {
+    std::string const& path = line.fromBinGiven ? line.fromBin : line.fromTable;
+    std::vector<uint8_t> bytes;
+    std::string error;
+    if (!smbiosdump::readInputFile(path, bytes, error)) {
+        complain(path + ": " + error);
+        return smbiostool::EXIT_FAILED;
     }
+    bool captured = false;
+    if (line.fromBinGiven) {
+        captured = smbiosdump::captureFromDumpBin(bytes, capture, error);
+    } else {
+        uint8_t major = 0;
+        uint8_t minor = 0;
+        // Checked on the command line already.
+        smbiosdump::parseSmbiosVersion(line.tableVersion, major, minor);
+        captured = smbiosdump::captureFromTable(bytes, major, minor, capture, error);
+    }
+    if (!captured) {
+        complain(path + ": " + error);
+        return smbiostool::EXIT_FAILED;
+    }
+    return 0;
+}
+
+// --from-machine: this machine's table through the physical-memory library.
+// Returns 0, or the exit status after saying why.
+int captureFromMachine(CommandLine const& line, smbiosdump::Capture& capture) {
+    std::string const library = line.pmemPath.empty()
+                                    ? smbiosdump::defaultPMemPath(smbiostool::ownFolder())
+                                    : line.pmemPath;
+    std::string error;
+    if (!smbiosdump::captureFromMachine(library, capture, error)) {
+        // The library's sources (the kernel's tables, /dev/mem) are root's
+        // to read.
+        complain("cannot read this machine's SMBIOS table: " + error +
+                 (geteuid() != 0 ? " (reading physical memory usually needs root)" : ""));
+        return smbiostool::EXIT_FAILED;
+    }
+    return 0;
+}
+
+bool writeToStandardOutput(std::string const& text) {
+    std::fwrite(text.data(), 1, text.size(), stdout);
+    return std::fflush(stdout) == 0 && std::ferror(stdout) == 0;
+}
+
+// Writes the dump file where the target says, all or nothing, and says
+// what was written. Returns 0, or the exit status after saying why.
+int writeDump(Target const& target, bool force, smbiosdump::Capture const& capture) {
     std::string const text =
         smbiosdump::formatOverride(capture.header, capture.table, kBytesPerLine);
     std::string const summary = smbiosdump::describeCapture(capture);
-
-    if (toStandardOutput) {
+    if (target.toStandardOutput) {
         if (!writeToStandardOutput(text)) {
             complain("cannot write to standard output");
             return smbiostool::EXIT_FAILED;
@@ -200,22 +298,42 @@ int run(int argc, char** argv) {
         std::cerr << kProgram << ": wrote standard output: " << summary << std::endl;
         return 0;
     }
-    if (install && !smbiosdump::makeOverrideFolder(installDataDir, error)) {
+    std::string error;
+    if (target.install && !smbiosdump::makeOverrideFolder(target.installDataDir, error)) {
         complain(error);
         return smbiostool::EXIT_FAILED;
     }
-    switch (smbiosdump::writeFileAtomically(target, text, force, error)) {
+    switch (smbiosdump::writeFileAtomically(target.path, text, force, error)) {
         case smbiosdump::WriteResult::WRITTEN:
             break;
         case smbiosdump::WriteResult::EXISTS:
-            complain(target + " exists; not replaced (use --force to replace it)");
+            complain(target.path + " exists; not replaced (use --force to replace it)");
             return smbiostool::EXIT_FAILED;
         case smbiosdump::WriteResult::FAILED:
             complain(error);
             return smbiostool::EXIT_FAILED;
     }
-    std::cerr << kProgram << ": wrote " << target << ": " << summary << std::endl;
+    std::cerr << kProgram << ": wrote " << target.path << ": " << summary << std::endl;
     return 0;
+}
+
+int run(int argc, char** argv) {
+    CommandLine line;
+    int status = 0;
+    if (!parseOptions(argc, argv, line, status)) {
+        return status;
+    }
+    Target const target = chooseTarget(line);
+    if ((status = checkTarget(target, line.force)) != 0) {
+        return status;
+    }
+    // The whole input, before anything is written.
+    smbiosdump::Capture capture;
+    status = line.fromMachine ? captureFromMachine(line, capture) : captureFromFile(line, capture);
+    if (status != 0) {
+        return status;
+    }
+    return writeDump(target, line.force, capture);
 }
 
 }  // namespace

@@ -511,4 +511,64 @@ TEST(DumpTool, VersionMayComeBeforeTableOption) {
     EXPECT_EQ(back.header.at(7), 4);
 }
 
+// The rules that tie the options together, each alone on the command line:
+// the whole line each one says, exit status 2, nothing written.
+TEST(DumpTool, EachCommandLineRuleSaysItsOwnLine) {
+    TableInput input;
+    std::string const out = input.dir.file("out.txt");
+    std::string const table = input.path();
+    struct Case {
+        std::vector<std::string> args;
+        std::string says;
+    };
+    std::vector<Case> const cases = {
+        {{"-o", out},
+         "exactly one source is needed: --from-bin FILE, --from-table FILE --version MAJ.MIN or "
+         "--from-machine"},
+        {{"--from-table", table, "-o", out},
+         "--from-table needs the table's SMBIOS version: --version MAJ.MIN"},
+        {{"--from-table", table, "--version", "2", "-o", out},
+         "--version: bad SMBIOS version '2' (MAJ.MIN expected, each 0-255)"},
+        {{"--from-table", table, "--version", "2.x", "-o", out},
+         "--version: bad SMBIOS version '2.x' (MAJ.MIN expected, each 0-255)"},
+        {{"--from-table", table, "--version", "256.0", "-o", out},
+         "--version: bad SMBIOS version '256.0' (MAJ.MIN expected, each 0-255)"},
+        {{"--from-machine", "--version", "2.7", "-o", out},
+         "--version MAJ.MIN only goes with --from-table"},
+        {{"--from-table", table, "--version", "2.7"},
+         "no output: give -o FILE, -o - (standard output) or --install"},
+        {{"--from-table", table, "--version", "2.7", "-o", ""}, "-o: empty file name"},
+    };
+    for (Case const& c : cases) {
+        std::string joined;
+        for (std::string const& arg : c.args) {
+            joined += " '" + arg + "'";
+        }
+        SCOPED_TRACE("smbios-dump" + joined);
+        RunResult const run = runDump(c.args);
+        EXPECT_EQ(run.exitStatus, 2) << describe(run);
+        EXPECT_EQ(run.err, "smbios-dump: " + c.says + " (see --help)\n");
+        EXPECT_TRUE(run.out.empty()) << describe(run);
+        EXPECT_EQ(dumptest::folderEntries(input.dir.path()),
+                  (std::vector<std::string>{"table.bin"}));
+    }
+}
+
+// --version with no value and no source prints the program's version,
+// whatever output is named; with a source it is the table's version,
+// missing.
+TEST(DumpTool, VersionWithoutValueIsTheProgramsUnlessASourceIsGiven) {
+    TableInput input;
+    std::string const out = input.dir.file("out.txt");
+    RunResult const version = runDump({"--version", "-o", out});
+    EXPECT_EQ(version.exitStatus, 0) << describe(version);
+    EXPECT_EQ(version.out, std::string("smbios-dump ") + PROJECT_VERSION + "\n");
+    EXPECT_EQ(version.err, "");
+    RunResult const missing = runDump({"--from-table", input.path(), "--version", "-o", out});
+    EXPECT_EQ(missing.exitStatus, 2) << describe(missing);
+    EXPECT_NE(missing.err.find("--from-table needs the table's SMBIOS version"), std::string::npos)
+        << describe(missing);
+    EXPECT_EQ(dumptest::folderEntries(input.dir.path()), (std::vector<std::string>{"table.bin"}));
+}
+
 }  // namespace
