@@ -1,6 +1,6 @@
 // smbios-inventory: loads a management-interface plug-in the way the
-// inventory agent does (dlopen, OpenMI, initialize, getMap) and prints the
-// inventory tree that it builds, as a tree for people or as JSON.
+// inventory agent does (the library, OpenMI, initialize, getMap) and prints
+// the inventory tree that it builds, as a tree for people or as JSON.
 //
 // Exit status: 0 after printing, 1 when the plug-in cannot be loaded or
 // fails, 2 for a wrong command line or a dump file that is not usable, and
