@@ -199,7 +199,7 @@ public:
     // Makes a node with the next node id under parentId and appends it.
     IC::MutableNode* newNode(unsigned int parentId, unsigned int nodeType, unsigned int index);
 
-private:
+protected:
     unsigned int smbiosMajorVersion = 0;
     unsigned int smbiosMinorVersion = 0;
 };
