@@ -93,7 +93,7 @@ bench: packages-bench build
 	$(BUILD)/out/smbios-bench
 
 format: packages-format
-	find platform smbios mi pmem tools tests bench fuzz examples \
+	find format platform smbios mi pmem tools tests bench fuzz examples \
 	  \( -name '*.cpp' -o -name '*.h' \) -print0 | xargs -0 clang-format -i
 
 clean:

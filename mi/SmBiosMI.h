@@ -183,21 +183,10 @@ public:
     // not follow the grammar.
     bool parseKVDString(std::string const& s, KVDVersion& version);
 
-    // The two kinds of probe the sensor builders turn into nodes.
-    struct ProbeKind {
-        unsigned int smbiosType;
-        unsigned int nodeType;
-        double divisor;
-        char const* nominalLabel;
-    };
-    static ProbeKind const temperatureProbe;
-    static ProbeKind const voltageProbe;
-
     unsigned int getSmBiosMajorVersion() const { return smbiosMajorVersion; }
     unsigned int getSmBiosMinorVersion() const { return smbiosMinorVersion; }
 
-protected:
-    // Takes the next node id.
+    // Node creation, shared by the builders. Takes the next node id.
     unsigned int takeNodeId() { return nextNodeId++; }
     // Hands a node made by a builder to the node list, which owns it from
     // then on (also when the list cannot take it), and returns it.
@@ -209,49 +198,8 @@ protected:
     }
     // Makes a node with the next node id under parentId and appends it.
     IC::MutableNode* newNode(unsigned int parentId, unsigned int nodeType, unsigned int index);
-    // Sets the identification, build id and version properties of a
-    // firmware node from its OEM string.
-    void parseFirmwareOemString(std::string const& s, IC::MutableNode* node);
-    // The diagnostics node of one OEM Strings structure when one of its
-    // strings is accepted; ix is the string index reached.
-    void makeKVDNodeOf(TableData& entry, unsigned int parentId, unsigned int index,
-                       unsigned int& ix);
-    // One raw node: the structure's header fields, formatted bytes and
-    // non-empty strings.
-    void makeSMBIOSTableNode(SD::SmBios::Table const* t, unsigned int parentId, unsigned int index);
-    // Steps of the chassis builder: the identifying and the state
-    // properties of a chassis node, and whether the chassis contains a
-    // baseboard.
-    void setChassisIdentity(SD::SmBios::Table const* t, IC::MutableNode* node,
-                            std::string const& systemManufacturer, std::string const& systemProduct,
-                            unsigned int type, char const* kindName);
-    void setChassisState(SD::SmBios::Table const* t, IC::MutableNode* node,
-                         std::string const& systemProduct, std::string const& systemSerial,
-                         unsigned int packageType, unsigned int enclosure);
-    bool containsBaseboard(SD::SmBios::Table const* t) const;
-    // The core counts of a processor node and its core nodes.
-    void makeCoreNodes(SD::SmBios::Table const* t, IC::MutableNode* processor);
-    // Steps of the planar builder: the planar without a baseboard
-    // structure, the baseboard that becomes the planar, the planar from it
-    // (taking the structures over into owned), and what it logs of its
-    // contained handles and group associations.
-    void makeBarePlanarNode(TableLists tables, unsigned int parentNodeId);
-    size_t chooseBaseboard(TableLists tables) const;
-    void makeBaseboardPlanarNode(TableLists tables, TableData& entry, Node* parent,
-                                 unsigned int parentNodeId, StructureGroups& owned);
-    void logContainedHandles(SD::SmBios::Table const* t, TableLists groups) const;
-    void logGroupAssociations(TableLists groups, unsigned int handle);
-    // Steps of the firmware builder: the nodes of the images one OEM
-    // Strings structure names (uefi set when one names UEFI), and the
-    // properties of a BIOS Information structure's node.
-    void makeOemFirmwareNodes(TableLists tables, TableData& entry, unsigned int parentId,
-                              unsigned int& ordinal, bool& uefi);
-    void setBiosFirmwareProperties(TableData const& entry, std::string const& name,
-                                   IC::MutableNode* node);
-    // Sensor nodes of one kind of probe at a location.
-    void makeProbeNodes(TableLists tables, unsigned int parentId, unsigned int location,
-                        ProbeKind const& kind, QNLog::QNLogger const& probeLogger);
 
+protected:
     unsigned int smbiosMajorVersion = 0;
     unsigned int smbiosMinorVersion = 0;
 };

@@ -76,6 +76,83 @@ std::string lowerCase(std::string text) {
     return text;
 }
 
+// Maker, part number, chassis lock and name (108: kindName, or "Chassis").
+void setChassisIdentity(SmBiosMI& mi, SD::SmBios::Table const* t, MutableNode* node,
+                        std::string const& systemManufacturer, std::string const& systemProduct,
+                        unsigned int type, char const* kindName) {
+    std::string manufacturer = mi.getString(t, MANUFACTURER);
+    if (manufacturer.empty() || manufacturer == " " || manufacturer == "none") {
+        manufacturer = systemManufacturer;
+    }
+    node->setProperty(36, PropertyValue(manufacturer, true));
+    std::string const partNumber = getPartNum(systemProduct);
+    if (!partNumber.empty()) {
+        node->setProperty(45, PropertyValue(partNumber, true));
+    }
+    mi.propBool8(t, TYPE, 0x80, 10, node);
+
+    SMBIOS_DETAIL(logger, "Chassis Type = " << type);
+    node->setProperty(108, PropertyValue("Chassis", true));
+    if (kindName != nullptr) {
+        node->setProperty(108, PropertyValue(kindName, true));
+    }
+}
+
+// Model, package type, enclosure, version, serial number (the system's
+// where the chassis has none), asset tag, states, OEM bytes, height and
+// power cords.
+void setChassisState(SmBiosMI& mi, SD::SmBios::Table const* t, MutableNode* node,
+                     std::string const& systemProduct, std::string const& systemSerial,
+                     unsigned int packageType, unsigned int enclosure) {
+    node->setProperty(39, PropertyValue(systemProduct, true));
+    node->setProperty(11, PropertyValue(EnumValue(packageType), true));
+    node->setProperty(213, PropertyValue(EnumValue(enclosure), true));
+    mi.propString(t, VERSION, 307, node);
+
+    std::string serial = mi.getString(t, SERIAL);
+    if (serial.empty() || serial == " " || lowerCase(serial) == "none") {
+        serial = systemSerial;
+    }
+    node->setProperty(50, PropertyValue(serial, true));
+
+    mi.propString(t, ASSET_TAG, 2, node);
+    mi.propEnumValue(t, BOOT_UP_STATE, 4, node);
+    mi.propEnumValue(t, POWER_SUPPLY_STATE, 46, node);
+    mi.propEnumValue(t, THERMAL_STATE, 60, node);
+    mi.propEnumValue(t, SECURITY_STATUS, 49, node);
+    mi.propBuffer(t, OEM_DEFINED, 4, 43, node);
+    mi.propNumber8(t, HEIGHT, 21, node);
+    mi.propNumber8(t, POWER_CORDS, 42, node);
+}
+
+// Whether a contained element is a baseboard type that makes the chassis
+// the planar's home. A record's first byte is an SMBIOS structure type
+// (bit 7 set) or a baseboard type; the records are read as they stand, even
+// past the structure's end.
+bool containsBaseboard(SmBiosMI const& mi, SD::SmBios::Table const* t) {
+    unsigned int const count = mi.getNumber8(t, ELEMENT_COUNT);
+    unsigned int const recordLength = mi.getNumber8(t, ELEMENT_RECORD_LENGTH);
+    SMBIOS_DETAIL(logger, "Contained Element Record count=" << count);
+    SMBIOS_DETAIL(logger, "Contained Element Record Length=" << recordLength);
+    if (count == 0 || recordLength == 0) {
+        SMBIOS_DETAIL(logger, " < NONE > ");
+        return false;
+    }
+    bool baseboard = false;
+    std::string elements;
+    for (unsigned int r = 0; r < count; ++r) {
+        unsigned int const element = mi.getNumber8Unprot(t, ELEMENTS + r * recordLength);
+        if ((element & 0x80) != 0) {
+            elements += " " + std::to_string(element & 0x7F);
+        } else {
+            elements += " " + std::to_string(element);
+            baseboard = baseboard || holdsBaseboard(element);
+        }
+    }
+    SMBIOS_DETAIL(logger, "Contained Elements=" << elements);
+    return baseboard;
+}
+
 }  // namespace
 
 // One chassis node per System Enclosure structure (Expansion Chassis
@@ -120,7 +197,7 @@ void SmBiosMI::makeChassisNodes(TableLists lists, unsigned int parentId) {
         node->setDescription("Chassis");
         unsigned int const nodeId = node->getNodeId();
         ChassisKind const kind = chassisKind(type);
-        setChassisIdentity(t, node, systemManufacturer, systemProduct, type, kind.name);
+        setChassisIdentity(*this, t, node, systemManufacturer, systemProduct, type, kind.name);
 
         if (kind.mainChassis) {
             mainChassis = true;
@@ -133,92 +210,15 @@ void SmBiosMI::makeChassisNodes(TableLists lists, unsigned int parentId) {
             homeFound = true;
         }
 
-        setChassisState(t, node, systemProduct, systemSerial, kind.packageType, kind.enclosure);
-        if (containsBaseboard(t)) {
+        setChassisState(*this, t, node, systemProduct, systemSerial, kind.packageType,
+                        kind.enclosure);
+        if (containsBaseboard(*this, t)) {
             planarParentId = nodeId;
             homeFound = true;
         }
     });
     makePlanarNodes(lists, planarParentId);
     SMBIOS_DETAIL(logger, "makeChassisNodes exit");
-}
-
-// Maker, part number, chassis lock and name (108: kindName, or "Chassis").
-void SmBiosMI::setChassisIdentity(SD::SmBios::Table const* t, MutableNode* node,
-                                  std::string const& systemManufacturer,
-                                  std::string const& systemProduct, unsigned int type,
-                                  char const* kindName) {
-    std::string manufacturer = getString(t, MANUFACTURER);
-    if (manufacturer.empty() || manufacturer == " " || manufacturer == "none") {
-        manufacturer = systemManufacturer;
-    }
-    node->setProperty(36, PropertyValue(manufacturer, true));
-    std::string const partNumber = getPartNum(systemProduct);
-    if (!partNumber.empty()) {
-        node->setProperty(45, PropertyValue(partNumber, true));
-    }
-    propBool8(t, TYPE, 0x80, 10, node);
-
-    SMBIOS_DETAIL(logger, "Chassis Type = " << type);
-    node->setProperty(108, PropertyValue("Chassis", true));
-    if (kindName != nullptr) {
-        node->setProperty(108, PropertyValue(kindName, true));
-    }
-}
-
-// Model, package type, enclosure, version, serial number (the system's
-// where the chassis has none), asset tag, states, OEM bytes, height and
-// power cords.
-void SmBiosMI::setChassisState(SD::SmBios::Table const* t, MutableNode* node,
-                               std::string const& systemProduct, std::string const& systemSerial,
-                               unsigned int packageType, unsigned int enclosure) {
-    node->setProperty(39, PropertyValue(systemProduct, true));
-    node->setProperty(11, PropertyValue(EnumValue(packageType), true));
-    node->setProperty(213, PropertyValue(EnumValue(enclosure), true));
-    propString(t, VERSION, 307, node);
-
-    std::string serial = getString(t, SERIAL);
-    if (serial.empty() || serial == " " || lowerCase(serial) == "none") {
-        serial = systemSerial;
-    }
-    node->setProperty(50, PropertyValue(serial, true));
-
-    propString(t, ASSET_TAG, 2, node);
-    propEnumValue(t, BOOT_UP_STATE, 4, node);
-    propEnumValue(t, POWER_SUPPLY_STATE, 46, node);
-    propEnumValue(t, THERMAL_STATE, 60, node);
-    propEnumValue(t, SECURITY_STATUS, 49, node);
-    propBuffer(t, OEM_DEFINED, 4, 43, node);
-    propNumber8(t, HEIGHT, 21, node);
-    propNumber8(t, POWER_CORDS, 42, node);
-}
-
-// Whether a contained element is a baseboard type that makes the chassis
-// the planar's home. A record's first byte is an SMBIOS structure type
-// (bit 7 set) or a baseboard type; the records are read as they stand, even
-// past the structure's end.
-bool SmBiosMI::containsBaseboard(SD::SmBios::Table const* t) const {
-    unsigned int const count = getNumber8(t, ELEMENT_COUNT);
-    unsigned int const recordLength = getNumber8(t, ELEMENT_RECORD_LENGTH);
-    SMBIOS_DETAIL(logger, "Contained Element Record count=" << count);
-    SMBIOS_DETAIL(logger, "Contained Element Record Length=" << recordLength);
-    if (count == 0 || recordLength == 0) {
-        SMBIOS_DETAIL(logger, " < NONE > ");
-        return false;
-    }
-    bool baseboard = false;
-    std::string elements;
-    for (unsigned int r = 0; r < count; ++r) {
-        unsigned int const element = getNumber8Unprot(t, ELEMENTS + r * recordLength);
-        if ((element & 0x80) != 0) {
-            elements += " " + std::to_string(element & 0x7F);
-        } else {
-            elements += " " + std::to_string(element);
-            baseboard = baseboard || holdsBaseboard(element);
-        }
-    }
-    SMBIOS_DETAIL(logger, "Contained Elements=" << elements);
-    return baseboard;
 }
 
 }  // namespace IC

@@ -63,6 +63,32 @@ std::vector<Number> numbers(std::initializer_list<unsigned int> values) {
     return list;
 }
 
+// The core counts of a processor node and one core node per core.
+void makeCoreNodes(SmBiosMI& mi, SD::SmBios::Table const* t, MutableNode* processor) {
+    unsigned int const cores = mi.getNumber8(t, CORE_COUNT);
+    unsigned int const enabled = mi.getNumber8(t, CORE_ENABLED);
+    unsigned int const threads = mi.getNumber8(t, THREAD_COUNT);
+    SMBIOS_DETAIL(logger, " Cores =" << cores << " enabled=" << enabled
+                                     << " thread count=" << threads
+                                     << (cores == 0 ? " - no core data in smbios tables" : ""));
+    processor->setProperty(190, PropertyValue(Number(cores), true));
+    processor->setProperty(189, PropertyValue(Number(enabled), true));
+    processor->setProperty(87, PropertyValue(Number(threads), true));
+
+    for (unsigned int c = 0; c < cores; ++c) {
+        MutableNode* core = mi.newNode(processor->getNodeId(), 42, c);
+        core->setDescription("CPU Core Information");
+        core->setStatus(c < enabled ? 1 : 16);
+        core->setProperty(125, PropertyValue(numbers({1, 16}), true));
+        core->setProperty(128, PropertyValue(EnumValue(static_cast<unsigned char>(0)), true));
+        if (threads != 0) {
+            // Kept: every core carries the whole processor's thread
+            // count, as the agent's reports expect.
+            core->setProperty(87, PropertyValue(Number(threads), true));
+        }
+    }
+}
+
 }  // namespace
 
 // One node per populated, enabled processor under the planar, with its L1,
@@ -127,35 +153,9 @@ void SmBiosMI::makeCpuNodes(TableLists tables, unsigned int parentNodeId) {
         SMBIOS_DETAIL(logger, " 64 bit = " << wide);
         node->setProperty(15, PropertyValue(Number(wide ? 64u : 32u), true));
 
-        makeCoreNodes(t, node);
+        makeCoreNodes(*this, t, node);
     });
     SMBIOS_DETAIL(logger, "makeCpuNodes exit");
-}
-
-// The core counts of a processor node and one core node per core.
-void SmBiosMI::makeCoreNodes(SD::SmBios::Table const* t, MutableNode* processor) {
-    unsigned int const cores = getNumber8(t, CORE_COUNT);
-    unsigned int const enabled = getNumber8(t, CORE_ENABLED);
-    unsigned int const threads = getNumber8(t, THREAD_COUNT);
-    SMBIOS_DETAIL(logger, " Cores =" << cores << " enabled=" << enabled
-                                     << " thread count=" << threads
-                                     << (cores == 0 ? " - no core data in smbios tables" : ""));
-    processor->setProperty(190, PropertyValue(Number(cores), true));
-    processor->setProperty(189, PropertyValue(Number(enabled), true));
-    processor->setProperty(87, PropertyValue(Number(threads), true));
-
-    for (unsigned int c = 0; c < cores; ++c) {
-        MutableNode* core = newNode(processor->getNodeId(), 42, c);
-        core->setDescription("CPU Core Information");
-        core->setStatus(c < enabled ? 1 : 16);
-        core->setProperty(125, PropertyValue(numbers({1, 16}), true));
-        core->setProperty(128, PropertyValue(EnumValue(static_cast<unsigned char>(0)), true));
-        if (threads != 0) {
-            // Kept: every core carries the whole processor's thread
-            // count, as the agent's reports expect.
-            core->setProperty(87, PropertyValue(Number(threads), true));
-        }
-    }
 }
 
 }  // namespace IC

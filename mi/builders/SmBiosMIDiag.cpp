@@ -11,6 +11,37 @@ unsigned char const OEM_COUNT = 0x04;
 
 bool isDigit(char c) { return c >= '0' && c <= '9'; }
 
+void makeKVDNodeOf(SmBiosMI& mi, TableData& entry, unsigned int parentId, unsigned int index,
+                   unsigned int& ix) {
+    SD::SmBios::Table const* t = entry.table;
+    unsigned int const count = mi.getNumber8(t, OEM_COUNT);
+    SMBIOS_DETAIL(logger, "String count = " << count);
+    bool accepted = false;
+    SmBiosMI::KVDVersion version;
+    for (ix = 1; ix <= count && !accepted; ++ix) {
+        SMBIOS_DETAIL(logger, "Reading ix = " << ix);
+        std::string const s = mi.getStrByIdx(t, static_cast<unsigned char>(ix));
+        SMBIOS_DETAIL(logger, "Read string " << ix << ": " << s);
+        if (s.find(SmBiosMI::eyecat) == std::string::npos) {
+            continue;
+        }
+        SMBIOS_DETAIL(logger, "Found KVD string: " << s);
+        accepted = mi.parseKVDString(s, version);
+    }
+    if (!accepted) {
+        return;
+    }
+    SMBIOS_DETAIL(logger, "Table " << 11 << " length = " << entry.length);
+    MutableNode* node = mi.newNode(parentId, 53, index);
+    entry.node = node;
+    node->setStatus(1);
+    node->setDescription("Corvane Preboot Diagnostics (KVD)");
+    node->setProperty(134, PropertyValue(version.text, true));
+    node->setProperty(104, PropertyValue(Number(version.major), true));
+    node->setProperty(107, PropertyValue(Number(version.minor), true));
+    node->setProperty(171, PropertyValue(version.build, true));
+}
+
 }  // namespace
 
 // The eye-catcher the preboot diagnostics image leaves in an OEM string.
@@ -20,7 +51,7 @@ std::string const SmBiosMI::eyecat = "$DS Corvane Preboot Diagnostics (KVD)";
 // eye-catcher, blanks, MAJOR "." MINOR, blanks, "-[" BUILD "]-".
 bool SmBiosMI::parseKVDString(std::string const& s, KVDVersion& version) {
     size_t const length = s.size();
-    size_t p = s.find(eyecat) + eyecat.size();
+    size_t p = s.find(SmBiosMI::eyecat) + eyecat.size();
     while (p < length && s[p] == ' ') {
         ++p;
     }
@@ -80,7 +111,7 @@ void SmBiosMI::makeKVDNode(TableLists tables, unsigned int parentId) {
         unsigned int ix = 0;
         TableData& entry = (*tables[11])[k];
         // The diagnostics' failure lines also name the string index reached.
-        guarded([&] { makeKVDNodeOf(entry, parentId, static_cast<unsigned int>(k), ix); },
+        guarded([&] { makeKVDNodeOf(*this, entry, parentId, static_cast<unsigned int>(k), ix); },
                 [&](Failure kind, char const* what, char const* typeName) {
                     switch (kind) {
                         case Failure::IC_EXCEPTION:
@@ -105,37 +136,6 @@ void SmBiosMI::makeKVDNode(TableLists tables, unsigned int parentId) {
     SMBIOS_DETAIL(logger, "make"
                               << "KVD"
                               << "Nodes exit");
-}
-
-void SmBiosMI::makeKVDNodeOf(TableData& entry, unsigned int parentId, unsigned int index,
-                             unsigned int& ix) {
-    SD::SmBios::Table const* t = entry.table;
-    unsigned int const count = getNumber8(t, OEM_COUNT);
-    SMBIOS_DETAIL(logger, "String count = " << count);
-    bool accepted = false;
-    KVDVersion version;
-    for (ix = 1; ix <= count && !accepted; ++ix) {
-        SMBIOS_DETAIL(logger, "Reading ix = " << ix);
-        std::string const s = getStrByIdx(t, static_cast<unsigned char>(ix));
-        SMBIOS_DETAIL(logger, "Read string " << ix << ": " << s);
-        if (s.find(eyecat) == std::string::npos) {
-            continue;
-        }
-        SMBIOS_DETAIL(logger, "Found KVD string: " << s);
-        accepted = parseKVDString(s, version);
-    }
-    if (!accepted) {
-        return;
-    }
-    SMBIOS_DETAIL(logger, "Table " << 11 << " length = " << entry.length);
-    MutableNode* node = newNode(parentId, 53, index);
-    entry.node = node;
-    node->setStatus(1);
-    node->setDescription("Corvane Preboot Diagnostics (KVD)");
-    node->setProperty(134, PropertyValue(version.text, true));
-    node->setProperty(104, PropertyValue(Number(version.major), true));
-    node->setProperty(107, PropertyValue(Number(version.minor), true));
-    node->setProperty(171, PropertyValue(version.build, true));
 }
 
 }  // namespace IC

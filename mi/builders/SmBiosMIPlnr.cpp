@@ -31,6 +31,139 @@ unsigned int const CONTAINED_HANDLES = 0x0F;
 unsigned int const BOARD_PRIORITY[] = {0x0A, 0x03, 0x0B, 0x0C, 0x06, 0x02, 0x09,
                                        0x05, 0x08, 0x07, 0x04, 0x0D, 0x01};
 
+void makeBarePlanarNode(SmBiosMI& mi, TableLists tables, unsigned int parentNodeId) {
+    MutableNode* node = mi.newNode(parentNodeId, 41, 0);
+    node->setStatus(1);
+    node->setDescription("Planar");
+    unsigned int const planarId = node->getNodeId();
+    // Kept: this order differs from the one with a baseboard below; node
+    // ids, and so the agent's stored inventory, follow it.
+    mi.makeCpuNodes(tables, planarId);
+    mi.makeSlotNodes(tables, planarId);
+    mi.makeConnectorNodes(tables, planarId);
+    mi.makeDimmNodes(tables, planarId);
+    mi.makeFirmwareNodes(tables, planarId);
+    mi.makeDiskControllerNodes(tables, planarId);
+    mi.makeKVDNode(tables, planarId);
+    mi.makeSMBIOSTableNodes(tables, planarId);
+}
+
+size_t chooseBaseboard(SmBiosMI const& mi, TableLists tables) {
+    for (unsigned int boardType : BOARD_PRIORITY) {
+        for (size_t k = 0; k < tables[2]->size(); ++k) {
+            if (mi.getNumber8((*tables[2])[k].table, BOARD_TYPE) == boardType) {
+                return k;
+            }
+        }
+    }
+    return 0;
+}
+
+void logContainedHandles(SmBiosMI const& mi, SD::SmBios::Table const* t, TableLists groups) {
+    unsigned int const count = mi.getNumber8(t, CONTAINED_COUNT);
+    SMBIOS_DETAIL(logger, "Count of contained object handles=" << count);
+    if (count == 0) {
+        return;
+    }
+    unsigned int const needed = 15 + 2 * count;
+    if (needed > 255) {
+        SMBIOS_DETAIL(
+            logger, "Length of contained object handles " << needed << " exceeds 255 table length");
+        return;
+    }
+    std::vector<unsigned int> handles;
+    std::string listed;
+    for (unsigned int i = 0; i < count; ++i) {
+        handles.push_back(mi.getNumber16(t, static_cast<unsigned char>(CONTAINED_HANDLES + 2 * i)));
+        listed += std::to_string(handles.back()) + " ";
+    }
+    SMBIOS_DETAIL(logger, "Handles="
+                              << "{ " << listed << "}");
+    for (unsigned int contained : handles) {
+        bool found = false;
+        for (unsigned int type = 0; type < 256 && !found; ++type) {
+            for (TableData const& member : *groups[type]) {
+                if (mi.getNumber16(member.table, HANDLE) == contained) {
+                    unsigned int const memberType = member.table->getByte(0);
+                    SMBIOS_DETAIL(logger, "Planar contained element handle "
+                                              << contained << " found in Bios table "
+                                              << memberType);
+                    found = true;
+                    break;
+                }
+            }
+        }
+        if (!found) {
+            SMBIOS_DETAIL(logger, "Planar contained element handle "
+                                      << contained << " not found in Bios tables ");
+        }
+    }
+}
+
+void logGroupAssociations(SmBiosMI& mi, TableLists groups, unsigned int handle) {
+    // The baseboard's handle goes where the lookup takes a type, and 2 where
+    // it takes a handle: the lookup serves the log only.
+    std::vector<std::pair<unsigned char, unsigned int>> const associations =
+        mi.findGroup(groups, handle, 2);
+    if (!associations.empty()) {
+        SMBIOS_DETAIL(logger, " Planar Group Associations Exist: ");
+        for (auto const& member : associations) {
+            SMBIOS_DETAIL(logger, "    Table Type=" << static_cast<unsigned int>(member.first)
+                                                    << " Handle=" << member.second);
+        }
+    }
+}
+
+void makeBaseboardPlanarNode(SmBiosMI& mi, TableLists tables, TableData& entry, Node* parent,
+                             unsigned int parentNodeId, StructureGroups& owned) {
+    SD::SmBios::Table const* t = entry.table;
+    SMBIOS_DETAIL(logger, "Table 2 length = " << entry.length);
+    MutableNode* node = mi.newNode(parentNodeId, 41, 0);
+    entry.node = node;
+    node->setStatus(1);
+    node->setDescription("Planar");
+    unsigned int const planarId = node->getNodeId();
+    unsigned int const handle = mi.getNumber16(t, HANDLE);
+
+    mi.propString(t, MANUFACTURER, 36, node);
+    mi.propString(t, PRODUCT, 39, node);
+    std::string const product = mi.getString(t, PRODUCT);
+    if (!product.empty()) {
+        node->setProperty(172, PropertyValue(product, true));
+        parent->setProperty(172, PropertyValue(product, true));
+    }
+    mi.propString(t, SERIAL, 50, node);
+    mi.propString(t, ASSET_TAG, 2, node);
+    mi.propEnumValue(t, FEATURE_FLAGS, 44, node);
+    std::string const location = mi.getString(t, LOCATION);
+    if (!location.empty()) {
+        node->setProperty(31, PropertyValue(location, true));
+        parent->setProperty(31, PropertyValue(location, true));
+    }
+    // Read whatever the log thresholds: a chassis handle cut off by a short
+    // structure ends the planar here at every level alike.
+    unsigned int const chassisHandle = mi.getNumber16(t, CHASSIS_HANDLE);
+    SMBIOS_DETAIL(logger, "Handle=" << chassisHandle);
+    node->setProperty(128, PropertyValue(Number(mi.getNumber8(t, BOARD_TYPE)), true));
+
+    // The planar takes every structure over into groups of its own; the
+    // shared groups are left empty. Each group moves whole, in its order.
+    owned.takeOver(tables);
+    TableLists const groups = owned.lists();
+    logContainedHandles(mi, t, groups);
+    logGroupAssociations(mi, groups, handle);
+
+    mi.makeCpuNodes(groups, planarId);
+    mi.makeSlotNodes(groups, planarId);
+    mi.makeConnectorNodes(groups, planarId);
+    mi.makeDimmNodes(groups, planarId);
+    mi.makeDiskControllerNodes(groups, planarId);
+    mi.makeSMBIOSTableNodes(groups, planarId);
+    mi.makeFirmwareNodes(groups, planarId);
+    mi.makeKVDNode(groups, planarId);
+    logStructureLists(logger, groups);
+}
+
 }  // namespace
 
 // The planar (baseboard) node under the chassis chosen as its home, and the
@@ -72,148 +205,16 @@ void SmBiosMI::makePlanarNodes(TableLists tables, unsigned int parentNodeId) {
     if (tables[2]->empty()) {
         SMBIOS_DETAIL(logger, "No Table 2 for Planar");
         guardStructure(SMBIOS_HERE, logger, 2, 0,
-                       [&] { makeBarePlanarNode(tables, parentNodeId); });
+                       [&] { makeBarePlanarNode(*this, tables, parentNodeId); });
     } else {
-        size_t const chosen = chooseBaseboard(tables);
+        size_t const chosen = chooseBaseboard(*this, tables);
         StructureGroups owned;
         guardStructure(SMBIOS_HERE, logger, 2, chosen, [&] {
-            makeBaseboardPlanarNode(tables, (*tables[2])[chosen], parent, parentNodeId, owned);
+            makeBaseboardPlanarNode(*this, tables, (*tables[2])[chosen], parent, parentNodeId,
+                                    owned);
         });
     }
     SMBIOS_DETAIL(logger, "makePlanarNodes exit");
-}
-
-void SmBiosMI::makeBarePlanarNode(TableLists tables, unsigned int parentNodeId) {
-    MutableNode* node = newNode(parentNodeId, 41, 0);
-    node->setStatus(1);
-    node->setDescription("Planar");
-    unsigned int const planarId = node->getNodeId();
-    // Kept: this order differs from the one with a baseboard below; node
-    // ids, and so the agent's stored inventory, follow it.
-    makeCpuNodes(tables, planarId);
-    makeSlotNodes(tables, planarId);
-    makeConnectorNodes(tables, planarId);
-    makeDimmNodes(tables, planarId);
-    makeFirmwareNodes(tables, planarId);
-    makeDiskControllerNodes(tables, planarId);
-    makeKVDNode(tables, planarId);
-    makeSMBIOSTableNodes(tables, planarId);
-}
-
-size_t SmBiosMI::chooseBaseboard(TableLists tables) const {
-    for (unsigned int boardType : BOARD_PRIORITY) {
-        for (size_t k = 0; k < tables[2]->size(); ++k) {
-            if (getNumber8((*tables[2])[k].table, BOARD_TYPE) == boardType) {
-                return k;
-            }
-        }
-    }
-    return 0;
-}
-
-void SmBiosMI::makeBaseboardPlanarNode(TableLists tables, TableData& entry, Node* parent,
-                                       unsigned int parentNodeId, StructureGroups& owned) {
-    SD::SmBios::Table const* t = entry.table;
-    SMBIOS_DETAIL(logger, "Table 2 length = " << entry.length);
-    MutableNode* node = newNode(parentNodeId, 41, 0);
-    entry.node = node;
-    node->setStatus(1);
-    node->setDescription("Planar");
-    unsigned int const planarId = node->getNodeId();
-    unsigned int const handle = getNumber16(t, HANDLE);
-
-    propString(t, MANUFACTURER, 36, node);
-    propString(t, PRODUCT, 39, node);
-    std::string const product = getString(t, PRODUCT);
-    if (!product.empty()) {
-        node->setProperty(172, PropertyValue(product, true));
-        parent->setProperty(172, PropertyValue(product, true));
-    }
-    propString(t, SERIAL, 50, node);
-    propString(t, ASSET_TAG, 2, node);
-    propEnumValue(t, FEATURE_FLAGS, 44, node);
-    std::string const location = getString(t, LOCATION);
-    if (!location.empty()) {
-        node->setProperty(31, PropertyValue(location, true));
-        parent->setProperty(31, PropertyValue(location, true));
-    }
-    // Read whatever the log thresholds: a chassis handle cut off by a short
-    // structure ends the planar here at every level alike.
-    unsigned int const chassisHandle = getNumber16(t, CHASSIS_HANDLE);
-    SMBIOS_DETAIL(logger, "Handle=" << chassisHandle);
-    node->setProperty(128, PropertyValue(Number(getNumber8(t, BOARD_TYPE)), true));
-
-    // The planar takes every structure over into groups of its own; the
-    // shared groups are left empty. Each group moves whole, in its order.
-    owned.takeOver(tables);
-    TableLists const groups = owned.lists();
-    logContainedHandles(t, groups);
-    logGroupAssociations(groups, handle);
-
-    makeCpuNodes(groups, planarId);
-    makeSlotNodes(groups, planarId);
-    makeConnectorNodes(groups, planarId);
-    makeDimmNodes(groups, planarId);
-    makeDiskControllerNodes(groups, planarId);
-    makeSMBIOSTableNodes(groups, planarId);
-    makeFirmwareNodes(groups, planarId);
-    makeKVDNode(groups, planarId);
-    logStructureLists(logger, groups);
-}
-
-void SmBiosMI::logContainedHandles(SD::SmBios::Table const* t, TableLists groups) const {
-    unsigned int const count = getNumber8(t, CONTAINED_COUNT);
-    SMBIOS_DETAIL(logger, "Count of contained object handles=" << count);
-    if (count == 0) {
-        return;
-    }
-    unsigned int const needed = 15 + 2 * count;
-    if (needed > 255) {
-        SMBIOS_DETAIL(
-            logger, "Length of contained object handles " << needed << " exceeds 255 table length");
-        return;
-    }
-    std::vector<unsigned int> handles;
-    std::string listed;
-    for (unsigned int i = 0; i < count; ++i) {
-        handles.push_back(getNumber16(t, static_cast<unsigned char>(CONTAINED_HANDLES + 2 * i)));
-        listed += std::to_string(handles.back()) + " ";
-    }
-    SMBIOS_DETAIL(logger, "Handles="
-                              << "{ " << listed << "}");
-    for (unsigned int contained : handles) {
-        bool found = false;
-        for (unsigned int type = 0; type < 256 && !found; ++type) {
-            for (TableData const& member : *groups[type]) {
-                if (getNumber16(member.table, HANDLE) == contained) {
-                    unsigned int const memberType = member.table->getByte(0);
-                    SMBIOS_DETAIL(logger, "Planar contained element handle "
-                                              << contained << " found in Bios table "
-                                              << memberType);
-                    found = true;
-                    break;
-                }
-            }
-        }
-        if (!found) {
-            SMBIOS_DETAIL(logger, "Planar contained element handle "
-                                      << contained << " not found in Bios tables ");
-        }
-    }
-}
-
-void SmBiosMI::logGroupAssociations(TableLists groups, unsigned int handle) {
-    // The baseboard's handle goes where the lookup takes a type, and 2 where
-    // it takes a handle: the lookup serves the log only.
-    std::vector<std::pair<unsigned char, unsigned int>> const associations =
-        findGroup(groups, handle, 2);
-    if (!associations.empty()) {
-        SMBIOS_DETAIL(logger, " Planar Group Associations Exist: ");
-        for (auto const& member : associations) {
-            SMBIOS_DETAIL(logger, "    Table Type=" << static_cast<unsigned int>(member.first)
-                                                    << " Handle=" << member.second);
-        }
-    }
 }
 
 }  // namespace IC

@@ -1,6 +1,7 @@
 #include "IC/PropertyValue.h"
 #include "mi/BuilderSkeleton.h"
 #include "mi/SmBiosMI.h"
+#include "mi/builders/SensorProbes.h"
 
 namespace IC {
 
@@ -20,25 +21,24 @@ unsigned char const NOMINAL = 0x14;
 unsigned int const NOMINAL_UNKNOWN = 0x800;
 unsigned int const LIMIT_UNKNOWN = 0x8000;
 
-}  // namespace
+ProbeKind const TEMPERATURE_PROBE = {28, 22, 10.0, "Temperature in 0.1 degrees="};
 
-SmBiosMI::ProbeKind const SmBiosMI::temperatureProbe = {28, 22, 10.0,
-                                                        "Temperature in 0.1 degrees="};
+}  // namespace
 
 // One sensor node per probe at the given location, under the given parent.
 // The readings are unsigned words scaled by the probe's divisor (kept: a
 // negative temperature, a two's-complement word, becomes a large value).
-void SmBiosMI::makeProbeNodes(TableLists tables, unsigned int parentId, unsigned int location,
-                              ProbeKind const& kind, QNLog::QNLogger const& probeLogger) {
+void makeProbeNodes(SmBiosMI& mi, TableLists tables, unsigned int parentId, unsigned int location,
+                    ProbeKind const& kind, QNLog::QNLogger const& probeLogger) {
     forEachStructure(
         SMBIOS_HERE, probeLogger, tables, kind.smbiosType, [&](TableData& entry, size_t k) {
             SD::SmBios::Table const* t = entry.table;
             SMBIOS_DETAIL(probeLogger, "Table " << kind.smbiosType << " length = " << entry.length);
-            unsigned int const locationAndStatus = getNumber8(t, LOCATION_AND_STATUS);
+            unsigned int const locationAndStatus = mi.getNumber8(t, LOCATION_AND_STATUS);
             if ((locationAndStatus & 0x1F) != location) {
                 return;
             }
-            MutableNode* node = newNode(parentId, kind.nodeType, static_cast<unsigned int>(k));
+            MutableNode* node = mi.newNode(parentId, kind.nodeType, static_cast<unsigned int>(k));
             entry.node = node;
             // Kept as it stands: critical and non-recoverable run on into the
             // cases below them, so their final status is 0; the agent's
@@ -63,19 +63,19 @@ void SmBiosMI::makeProbeNodes(TableLists tables, unsigned int parentId, unsigned
                               PropertyValue(std::vector<Number>{Number(1u), Number(0u), Number(21u),
                                                                 Number(24u), Number(27u)},
                                             true));
-            node->setDescription(getString(t, DESCRIPTION));
+            node->setDescription(mi.getString(t, DESCRIPTION));
             node->setProperty(31, PropertyValue(Number(locationAndStatus & 0x1F), true));
-            propBuffer(t, OEM_DEFINED, 4, 43, node);
-            unsigned int const nominal = getNumber16(t, NOMINAL);
+            mi.propBuffer(t, OEM_DEFINED, 4, 43, node);
+            unsigned int const nominal = mi.getNumber16(t, NOMINAL);
             if (nominal != NOMINAL_UNKNOWN) {
                 SMBIOS_DETAIL(probeLogger, kind.nominalLabel << nominal);
                 node->setProperty(14, PropertyValue(Number(nominal / kind.divisor), true));
             }
-            unsigned int const maximum = getNumber16(t, MAXIMUM);
+            unsigned int const maximum = mi.getNumber16(t, MAXIMUM);
             if (maximum != LIMIT_UNKNOWN) {
                 node->setProperty(23, PropertyValue(Number(maximum / kind.divisor), true));
             }
-            unsigned int const minimum = getNumber16(t, MINIMUM);
+            unsigned int const minimum = mi.getNumber16(t, MINIMUM);
             if (minimum != LIMIT_UNKNOWN) {
                 node->setProperty(33, PropertyValue(Number(minimum / kind.divisor), true));
             }
@@ -90,7 +90,7 @@ void SmBiosMI::makeTemperatureSensorNodes(TableLists tables, unsigned int parent
     SMBIOS_DETAIL(logger, "make"
                               << "TemperatureSensor"
                               << "Nodes entry");
-    makeProbeNodes(tables, parentId, location, temperatureProbe, logger);
+    makeProbeNodes(*this, tables, parentId, location, TEMPERATURE_PROBE, logger);
     SMBIOS_DETAIL(logger, "make"
                               << "TemperatureSensor"
                               << "Nodes exit");

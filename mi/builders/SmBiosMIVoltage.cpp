@@ -1,12 +1,13 @@
 #include "mi/SmBiosMI.h"
+#include "mi/builders/SensorProbes.h"
 
 namespace IC {
 
 namespace {
 QNLog::QNLogger logger("Quillon.IC.MI.SmBiosMI.SmBiosMIVoltage");
-}  // namespace
 
-SmBiosMI::ProbeKind const SmBiosMI::voltageProbe = {26, 21, 1000.0, "Millivolts="};
+ProbeKind const VOLTAGE_PROBE = {26, 21, 1000.0, "Millivolts="};
+}  // namespace
 
 // Voltage sensor nodes for the voltage probes at a location.
 void SmBiosMI::makeVoltageSensorNodes(TableLists tables, unsigned int parentId,
@@ -14,7 +15,7 @@ void SmBiosMI::makeVoltageSensorNodes(TableLists tables, unsigned int parentId,
     SMBIOS_DETAIL(logger, "make"
                               << "VoltageSensor"
                               << "Nodes entry");
-    makeProbeNodes(tables, parentId, location, voltageProbe, logger);
+    makeProbeNodes(*this, tables, parentId, location, VOLTAGE_PROBE, logger);
     SMBIOS_DETAIL(logger, "make"
                               << "VoltageSensor"
                               << "Nodes exit");
