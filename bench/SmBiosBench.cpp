@@ -139,7 +139,7 @@ void BM_ImportExampleDumpFile(benchmark::State& state) {
 BENCHMARK(BM_ImportExampleDumpFile);
 
 // The tree build, with the heap it holds once built (bytes in use after the
-// build minus before it) and its node count.
+// build minus before it), its node count and the heap per node.
 void buildTree(benchmark::State& state, std::vector<unsigned char> const& raw) {
     if (raw.empty()) {
         state.SkipWithError("no table");
@@ -156,6 +156,8 @@ void buildTree(benchmark::State& state, std::vector<unsigned char> const& raw) {
     }
     state.counters["nodes"] = static_cast<double>(nodes);
     state.counters["tree_heap_bytes"] = static_cast<double>(heapBytes);
+    state.counters["heap_per_node"] =
+        nodes != 0 ? static_cast<double>(heapBytes) / static_cast<double>(nodes) : 0.0;
 }
 
 void BM_BuildTreeExample(benchmark::State& state) { buildTree(state, exampleTable()); }

@@ -35,12 +35,10 @@ Error MutableNode::getProperty(unsigned int id, PropertyValue& value) const {
     return success();
 }
 
-std::map<unsigned int, PropertyValue> const& MutableNode::getProperties() const {
-    return properties_;
-}
+PropertyMap const& MutableNode::getProperties() const { return properties_; }
 
 Error MutableNode::setProperty(unsigned int const& id, PropertyValue const& value) {
-    properties_[id] = value;
+    properties_.set(id, value);
     return success();
 }
 

@@ -4,6 +4,7 @@
 #include <cstdio>
 #include <cstdlib>
 #include <ctime>
+#include <new>
 #include <ostream>
 
 namespace IC {
@@ -58,37 +59,44 @@ std::string formatDouble(double value) {
     return text;
 }
 
+// The version that numbers of other kinds answer with: constant-initialized,
+// so it is there before any constructor of another library runs.
+Version2 const noVersion{};
+
 }  // namespace
 
-Number::Number() : kind_(NONE) {}
+Number::Number() : kind_(NONE), words_{0, 0} {}
 
-Number::Number(bool value) : kind_(BOOL), boolValue_(value) {}
+Number::Number(bool value) : kind_(BOOL), words_{value ? 1u : 0u, 0} {}
 
-Number::Number(unsigned int value) : kind_(UNSIGNED), unsignedValue_(value) {}
+Number::Number(unsigned int value) : kind_(UNSIGNED), words_{value, 0} {}
 
-Number::Number(double value) : kind_(DOUBLE), doubleValue_(value) {}
+Number::Number(double value) : kind_(DOUBLE), words_{0, 0} { setWide(value); }
 
-Number::Number(Version2 const& value) : kind_(VERSION), versionValue_(value) {}
+Number::Number(Version2 const& value) : kind_(VERSION), version_(value) {}
 
-Number::Number(KindType kind) : kind_(kind) {
-    if (kind == DATETIME) {
-        dateTimeValue_ = static_cast<std::int64_t>(std::time(nullptr));
+Number::Number(KindType kind) : kind_(kind), words_{0, 0} {
+    if (kind == VERSION) {
+        new (&version_) Version2();
+    } else if (kind == DATETIME) {
+        setWide(static_cast<std::int64_t>(std::time(nullptr)));
     }
 }
+
+Version2 const& Number::getVersion() const { return kind_ == VERSION ? version_ : noVersion; }
 
 std::string Number::toString() const {
     switch (kind_) {
         case BOOL:
-            return boolValue_ ? "true" : "false";
+            return getBool() ? "true" : "false";
         case UNSIGNED:
-            return std::to_string(unsignedValue_);
+            return std::to_string(getUnsigned());
         case DOUBLE:
-            return formatDouble(doubleValue_);
+            return formatDouble(getDouble());
         case VERSION:
-            return std::to_string(versionValue_.getMajor()) + "." +
-                   std::to_string(versionValue_.getMinor());
+            return std::to_string(version_.getMajor()) + "." + std::to_string(version_.getMinor());
         case DATETIME:
-            return formatDateTime(dateTimeValue_);
+            return formatDateTime(getDateTime());
         case NONE:
             break;
     }
@@ -101,15 +109,17 @@ bool Number::operator==(Number const& other) const {
     }
     switch (kind_) {
         case BOOL:
-            return boolValue_ == other.boolValue_;
+            return getBool() == other.getBool();
         case UNSIGNED:
-            return unsignedValue_ == other.unsignedValue_;
+            return getUnsigned() == other.getUnsigned();
         case DOUBLE:
-            return doubleValue_ == other.doubleValue_;
+            // Compared as doubles, not as bits: 0.0 equals -0.0 and a NaN
+            // equals nothing.
+            return getDouble() == other.getDouble();
         case VERSION:
-            return versionValue_ == other.versionValue_;
+            return version_ == other.version_;
         case DATETIME:
-            return dateTimeValue_ == other.dateTimeValue_;
+            return getDateTime() == other.getDateTime();
         case NONE:
             break;
     }

@@ -1,7 +1,9 @@
 // IC::PropertyValue: construction, text form and comparison.
 #include "IC/PropertyValue.h"
 
+#include <new>
 #include <ostream>
+#include <utility>
 
 namespace IC {
 
@@ -34,6 +36,30 @@ std::string hexBytes(std::vector<unsigned char> const& bytes) {
     return text;
 }
 
+// What the getters of one kind answer for a value of another kind. Made on
+// first use, so that they exist whenever a value in another library's static
+// object is read.
+std::string const& noString() {
+    static std::string const empty;
+    return empty;
+}
+
+Number const& noNumber() {
+    static Number const none;
+    return none;
+}
+
+EnumValue const& noEnum() {
+    static EnumValue const none;
+    return none;
+}
+
+template <typename T>
+std::vector<T> const& noVector() {
+    static std::vector<T> const empty;
+    return empty;
+}
+
 }  // namespace
 
 PropertyValue::PropertyValue() : kind_(NONE) {}
@@ -64,6 +90,177 @@ PropertyValue::PropertyValue(std::vector<std::string> const& value, bool flag)
 
 PropertyValue::PropertyValue(KindType kind, bool flag)
     : kind_(KIND), flag_(flag), kindValue_(kind) {}
+
+PropertyValue::PropertyValue(PropertyValue const& other) : kind_(other.kind_), flag_(other.flag_) {
+    copyValue(other);
+}
+
+PropertyValue::PropertyValue(PropertyValue&& other) noexcept
+    : kind_(other.kind_), flag_(other.flag_) {
+    moveValue(other);
+}
+
+PropertyValue& PropertyValue::operator=(PropertyValue const& other) {
+    if (this == &other) {
+        return *this;
+    }
+    if (kind_ == other.kind_) {
+        switch (kind_) {
+            case STRING:
+                string_ = other.string_;
+                break;
+            case NUMBER:
+                number_ = other.number_;
+                break;
+            case ENUM:
+                enum_ = other.enum_;
+                break;
+            case BYTE:
+                byte_ = other.byte_;
+                break;
+            case BYTES:
+                bytes_ = other.bytes_;
+                break;
+            case NUMBERS:
+                numbers_ = other.numbers_;
+                break;
+            case STRINGS:
+                strings_ = other.strings_;
+                break;
+            case KIND:
+                kindValue_ = other.kindValue_;
+                break;
+            default:
+                break;
+        }
+    } else {
+        // Copied aside first: if the copy throws, this value stays as it was.
+        PropertyValue copy(other);
+        destroyValue();
+        kind_ = copy.kind_;
+        moveValue(copy);
+    }
+    flag_ = other.flag_;
+    return *this;
+}
+
+PropertyValue& PropertyValue::operator=(PropertyValue&& other) noexcept {
+    if (this != &other) {
+        destroyValue();
+        kind_ = other.kind_;
+        moveValue(other);
+        flag_ = other.flag_;
+    }
+    return *this;
+}
+
+PropertyValue::~PropertyValue() { destroyValue(); }
+
+void PropertyValue::copyValue(PropertyValue const& other) {
+    switch (kind_) {
+        case STRING:
+            new (&string_) std::string(other.string_);
+            break;
+        case NUMBER:
+            new (&number_) Number(other.number_);
+            break;
+        case ENUM:
+            new (&enum_) EnumValue(other.enum_);
+            break;
+        case BYTE:
+            byte_ = other.byte_;
+            break;
+        case BYTES:
+            new (&bytes_) std::vector<unsigned char>(other.bytes_);
+            break;
+        case NUMBERS:
+            new (&numbers_) std::vector<Number>(other.numbers_);
+            break;
+        case STRINGS:
+            new (&strings_) std::vector<std::string>(other.strings_);
+            break;
+        case KIND:
+            kindValue_ = other.kindValue_;
+            break;
+        default:
+            break;
+    }
+}
+
+void PropertyValue::moveValue(PropertyValue& other) noexcept {
+    switch (kind_) {
+        case STRING:
+            new (&string_) std::string(std::move(other.string_));
+            break;
+        case NUMBER:
+            new (&number_) Number(other.number_);
+            break;
+        case ENUM:
+            new (&enum_) EnumValue(other.enum_);
+            break;
+        case BYTE:
+            byte_ = other.byte_;
+            break;
+        case BYTES:
+            new (&bytes_) std::vector<unsigned char>(std::move(other.bytes_));
+            break;
+        case NUMBERS:
+            new (&numbers_) std::vector<Number>(std::move(other.numbers_));
+            break;
+        case STRINGS:
+            new (&strings_) std::vector<std::string>(std::move(other.strings_));
+            break;
+        case KIND:
+            kindValue_ = other.kindValue_;
+            break;
+        default:
+            break;
+    }
+}
+
+void PropertyValue::destroyValue() noexcept {
+    using String = std::string;
+    using Bytes = std::vector<unsigned char>;
+    using Numbers = std::vector<Number>;
+    using Strings = std::vector<std::string>;
+    switch (kind_) {
+        case STRING:
+            string_.~String();
+            break;
+        case BYTES:
+            bytes_.~Bytes();
+            break;
+        case NUMBERS:
+            numbers_.~Numbers();
+            break;
+        case STRINGS:
+            strings_.~Strings();
+            break;
+        default:
+            // Numbers, enumerated values, bytes and kinds need no ending.
+            break;
+    }
+}
+
+std::string const& PropertyValue::getString() const {
+    return kind_ == STRING ? string_ : noString();
+}
+
+Number const& PropertyValue::getNumber() const { return kind_ == NUMBER ? number_ : noNumber(); }
+
+EnumValue const& PropertyValue::getEnum() const { return kind_ == ENUM ? enum_ : noEnum(); }
+
+std::vector<unsigned char> const& PropertyValue::getBytes() const {
+    return kind_ == BYTES ? bytes_ : noVector<unsigned char>();
+}
+
+std::vector<Number> const& PropertyValue::getNumbers() const {
+    return kind_ == NUMBERS ? numbers_ : noVector<Number>();
+}
+
+std::vector<std::string> const& PropertyValue::getStrings() const {
+    return kind_ == STRINGS ? strings_ : noVector<std::string>();
+}
 
 std::string PropertyValue::toString() const {
     switch (kind_) {

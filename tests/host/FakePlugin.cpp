@@ -30,6 +30,7 @@
 #include "IC/MutableNode.h"
 #include "IC/Node.h"
 #include "IC/Number.h"
+#include "IC/PropertyMap.h"
 #include "IC/PropertyValue.h"
 #include "IC/Version2.h"
 #include "QNLog/QNLogger.h"
@@ -80,9 +81,7 @@ public:
         value = found->second;
         return IC::Error();
     }
-    std::map<unsigned int, IC::PropertyValue> const& getProperties() const override {
-        return properties_;
-    }
+    IC::PropertyMap const& getProperties() const override { return properties_; }
     IC::Error setProperty(unsigned int const& id, IC::PropertyValue const& value) override {
         properties_[id] = value;
         return IC::Error();
@@ -101,7 +100,7 @@ private:
     unsigned int nodeId_;
     unsigned int linkedId_;
     std::vector<unsigned int> miIds_;
-    std::map<unsigned int, IC::PropertyValue> properties_;
+    IC::PropertyMap properties_;
 };
 
 // The file this plug-in was loaded from.

@@ -1,10 +1,13 @@
 // IC::Number: kinds, values, text form and comparison.
 #include <gtest/gtest.h>
 
+#include <cmath>
 #include <ctime>
+#include <iostream>
 #include <regex>
 #include <sstream>
 #include <thread>
+#include <vector>
 
 #include "IC/Number.h"
 
@@ -117,4 +120,115 @@ TEST(Number, StreamWritesText) {
     std::ostringstream out;
     out << Number(42u) << "|" << Number(true) << "|" << Number(3276.8) << "|" << Number();
     EXPECT_EQ("42|true|3276.8|", out.str());
+}
+
+namespace {
+
+// One number of every kind, each with a value other than its zero.
+std::vector<Number> everyKind() {
+    return {Number(),
+            Number(true),
+            Number(4000000000u),
+            Number(-2.5),
+            Number(Version2(7, 12)),
+            Number(Number::DATETIME),
+            Number(static_cast<Number::KindType>(7))};
+}
+
+}  // namespace
+
+TEST(Number, GettersOfAnotherKindGiveThatKindsZero) {
+    for (Number const& number : everyKind()) {
+        SCOPED_TRACE(number.getKind());
+        if (number.getKind() != Number::BOOL) {
+            EXPECT_FALSE(number.getBool());
+        }
+        if (number.getKind() != Number::UNSIGNED) {
+            EXPECT_EQ(0u, number.getUnsigned());
+        }
+        if (number.getKind() != Number::DOUBLE) {
+            EXPECT_EQ(0.0, number.getDouble());
+        }
+        if (number.getKind() != Number::VERSION) {
+            EXPECT_EQ(Version2(), number.getVersion());
+        }
+        if (number.getKind() != Number::DATETIME) {
+            EXPECT_EQ(0, number.getDateTime());
+        }
+    }
+    EXPECT_TRUE(Number(true).getBool());
+    EXPECT_EQ(4000000000u, Number(4000000000u).getUnsigned());
+    EXPECT_EQ(-2.5, Number(-2.5).getDouble());
+    EXPECT_EQ(Version2(7, 12), Number(Version2(7, 12)).getVersion());
+    EXPECT_GT(Number(Number::DATETIME).getDateTime(), 0);
+}
+
+TEST(Number, VersionOfAnotherKindOutlivesTheNumber) {
+    Version2 const* version = nullptr;
+    {
+        Number const number(3u);
+        version = &number.getVersion();
+    }
+    EXPECT_EQ(0u, version->getMajor());
+    EXPECT_EQ(0u, version->getMinor());
+}
+
+TEST(Number, KindConstructorGivesZeroThroughEveryGetter) {
+    EXPECT_FALSE(Number(Number::BOOL).getBool());
+    EXPECT_EQ(0u, Number(Number::UNSIGNED).getUnsigned());
+    EXPECT_EQ(0.0, Number(Number::DOUBLE).getDouble());
+    EXPECT_EQ("0", Number(Number::DOUBLE).toString());
+    EXPECT_EQ(Version2(), Number(Number::VERSION).getVersion());
+    Number const unlisted(static_cast<Number::KindType>(7));
+    EXPECT_EQ(7, static_cast<int>(unlisted.getKind()));
+    EXPECT_EQ("", unlisted.toString());
+    EXPECT_EQ(Number(static_cast<Number::KindType>(7)), unlisted);
+    EXPECT_NE(Number(), unlisted);
+}
+
+TEST(Number, CopiesAndAssignmentsKeepKindAndValue) {
+    std::vector<Number> const numbers = everyKind();
+    for (Number const& source : numbers) {
+        Number const copy(source);
+        EXPECT_EQ(source, copy);
+        EXPECT_EQ(source.toString(), copy.toString());
+        for (Number const& before : numbers) {
+            Number target(before);
+            target = source;
+            EXPECT_EQ(source.getKind(), target.getKind());
+            EXPECT_EQ(source, target);
+            EXPECT_EQ(source.toString(), target.toString());
+        }
+        Number self(source);
+        Number const& alias = self;
+        self = alias;
+        EXPECT_EQ(source, self);
+    }
+}
+
+TEST(Number, EqualityNeverHoldsAcrossKinds) {
+    std::vector<Number> const numbers = everyKind();
+    for (size_t i = 0; i < numbers.size(); ++i) {
+        for (size_t j = 0; j < numbers.size(); ++j) {
+            EXPECT_EQ(i == j, numbers[i] == numbers[j]) << i << " " << j;
+        }
+    }
+    // Zero values of different kinds differ too.
+    EXPECT_NE(Number(false), Number(0u));
+    EXPECT_NE(Number(0u), Number(0.0));
+    EXPECT_NE(Number(0.0), Number(Version2()));
+    EXPECT_NE(Number(Number::DATETIME), Number(0u));
+}
+
+TEST(Number, DoublesCompareAsValues) {
+    EXPECT_EQ(Number(0.0), Number(-0.0));
+    EXPECT_EQ("-0", Number(-0.0).toString());
+    double const notANumber = std::nan("");
+    EXPECT_NE(Number(notANumber), Number(notANumber));
+    EXPECT_EQ(1.0 / 3.0, Number(1.0 / 3.0).getDouble());
+}
+
+TEST(Number, IsTwelveBytes) {
+    std::cout << "sizeof(IC::Number) = " << sizeof(Number) << "\n";
+    EXPECT_EQ(12u, sizeof(Number));
 }

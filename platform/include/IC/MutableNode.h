@@ -3,7 +3,6 @@
 // set of the same id replaces the earlier value.
 #pragma once
 
-#include <map>
 #include <string>
 #include <vector>
 
@@ -20,7 +19,7 @@ public:
     unsigned int getStatus() const override;
     std::string getDescription() const override;
     Error getProperty(unsigned int id, PropertyValue& value) const override;
-    std::map<unsigned int, PropertyValue> const& getProperties() const override;
+    PropertyMap const& getProperties() const override;
     Error setProperty(unsigned int const& id, PropertyValue const& value) override;
     unsigned int getNodeId() const override;
     unsigned int getLinkedId() const override;
@@ -48,7 +47,7 @@ private:
     std::string description_;
     std::string path_;
     std::string parent_;
-    std::map<unsigned int, PropertyValue> properties_;
+    PropertyMap properties_;
 };
 
 }  // namespace IC

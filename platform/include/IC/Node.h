@@ -2,11 +2,11 @@
 // virtual operations is part of the agent's interface and must not change.
 #pragma once
 
-#include <map>
 #include <string>
 #include <vector>
 
 #include "IC/Error.h"
+#include "IC/PropertyMap.h"
 #include "IC/PropertyValue.h"
 
 namespace IC {
@@ -20,7 +20,7 @@ public:
     virtual Error getProperty(unsigned int id, PropertyValue& value) const = 0;
     // The stored properties by id, in ascending id order. Values that a node
     // computes when they are read are only current through getProperty.
-    virtual std::map<unsigned int, PropertyValue> const& getProperties() const = 0;
+    virtual PropertyMap const& getProperties() const = 0;
     virtual Error setProperty(unsigned int const& id, PropertyValue const& value) = 0;
     virtual operator std::string() const;
     virtual unsigned int getNodeId() const = 0;
