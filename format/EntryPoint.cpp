@@ -76,8 +76,22 @@ std::vector<uint8_t> makeDmiEntryPoint(uint8_t bcdRevision, uint16_t tableLength
     return ep;
 }
 
-TableStats tableStats(std::vector<uint8_t> const& table) {
-    TableStats stats;
+namespace {
+
+// A walk over the whole structures at the start of a table.
+struct Walk {
+    size_t end = 0;        // the offset after the last whole structure taken
+    uint16_t count = 0;    // structures taken, saturating at 0xFFFF
+    uint16_t maxSize = 0;  // the largest one taken
+    bool cut = false;      // the data ends inside a structure, or at a malformed one
+};
+
+// Takes whole structures from the table's first byte until the end-of-table
+// structure (type 127, taken), the end of the data, the first malformed or
+// truncated structure (not taken: the walk is cut), or the first structure
+// that would end past `limit` bytes (not taken, not cut).
+Walk walkStructures(std::vector<uint8_t> const& table, size_t limit) {
+    Walk walk;
     size_t const size = table.size();
     size_t pos = 0;
     bool ended = false;
@@ -85,7 +99,7 @@ TableStats tableStats(std::vector<uint8_t> const& table) {
         uint8_t const type = table[pos];
         uint8_t const length = table[pos + 1];
         if (length < 4 || length > size - pos) {
-            stats.cut = true;
+            walk.cut = true;
             break;
         }
         // The string set ends with two NULs; with no strings those two NULs
@@ -95,16 +109,20 @@ TableStats tableStats(std::vector<uint8_t> const& table) {
             ++end;
         }
         if (end + 1 >= size) {
-            stats.cut = true;
+            walk.cut = true;
             break;
         }
         end += 2;
-        size_t const structureSize = end - pos;
-        if (stats.count < 0xFFFF) {
-            ++stats.count;
+        if (end > limit) {
+            walk.end = pos;
+            return walk;
         }
-        if (structureSize > stats.maxSize) {
-            stats.maxSize = static_cast<uint16_t>(std::min<size_t>(structureSize, 0xFFFF));
+        size_t const structureSize = end - pos;
+        if (walk.count < 0xFFFF) {
+            ++walk.count;
+        }
+        if (structureSize > walk.maxSize) {
+            walk.maxSize = static_cast<uint16_t>(std::min<size_t>(structureSize, 0xFFFF));
         }
         pos = end;
         if (type == 127) {
@@ -114,9 +132,30 @@ TableStats tableStats(std::vector<uint8_t> const& table) {
     }
     // One to three bytes after the last whole structure start one more.
     if (!ended && pos < size && size - pos < 4) {
-        stats.cut = true;
+        walk.cut = true;
     }
+    walk.end = pos;
+    return walk;
+}
+
+}  // namespace
+
+TableStats tableStats(std::vector<uint8_t> const& table) {
+    Walk const walk = walkStructures(table, table.size());
+    TableStats stats;
+    stats.count = walk.count;
+    stats.maxSize = walk.maxSize;
+    stats.cut = walk.cut;
     return stats;
+}
+
+TablePrefix wholeStructuresWithin(std::vector<uint8_t> const& table, size_t limit) {
+    Walk const walk = walkStructures(table, limit);
+    TablePrefix prefix;
+    prefix.bytes = walk.end;
+    prefix.count = walk.count;
+    prefix.maxSize = walk.maxSize;
+    return prefix;
 }
 
 }  // namespace smbiosformat

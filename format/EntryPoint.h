@@ -53,4 +53,20 @@ struct TableStats {
 // 0xFFFF.
 TableStats tableStats(std::vector<uint8_t> const& table);
 
+// The most a 2.x entry point can say a table holds: its length is a word.
+constexpr size_t MAX_2X_TABLE_LENGTH = 0xFFFF;
+
+struct TablePrefix {
+    size_t bytes = 0;      // the length of the whole structures taken
+    uint16_t count = 0;    // how many, saturating at 0xFFFF
+    uint16_t maxSize = 0;  // the largest one
+};
+
+// The whole structures at the start of a table, walked as tableStats walks
+// them, that end within its first `limit` bytes: what of a table larger
+// than a 2.x entry point can describe that such an entry point can still
+// describe (limit MAX_2X_TABLE_LENGTH). A structure that would end past the
+// limit is not taken, nor anything after it.
+TablePrefix wholeStructuresWithin(std::vector<uint8_t> const& table, size_t limit);
+
 }  // namespace smbiosformat

@@ -19,10 +19,8 @@ namespace {
 // The memory device is a character device; a regular file stands in for it
 // in tests. Anything else (a FIFO, a socket, a folder, a block device) is
 // refused without being opened, so that neither loading the library nor
-// PMemOpen can wait on it. The library has nowhere to say why, so the
-// reason is not kept.
-int openDevice(std::string const& path) {
-    std::string why;
+// PMemOpen can wait on it. why says what failed.
+int openDevice(std::string const& path, std::string& why) {
     return SD::openRegularFile(path.c_str(), why, SD::FileKinds::RegularOrCharacterDevice);
 }
 
@@ -142,9 +140,10 @@ private:
 
 DevMem::~DevMem() { close(); }
 
-bool DevMem::canOpen(std::string const& path) {
-    int const fd = openDevice(path);
+bool DevMem::canOpen(std::string const& path, std::string& why) {
+    int const fd = openDevice(path, why);
     if (fd < 0) {
+        why = path + ": " + why;
         return false;
     }
     ::close(fd);
@@ -153,7 +152,8 @@ bool DevMem::canOpen(std::string const& path) {
 
 bool DevMem::open() {
     if (fd_ < 0) {
-        fd_ = openDevice(path_);
+        std::string why;
+        fd_ = openDevice(path_, why);
     }
     return fd_ >= 0;
 }

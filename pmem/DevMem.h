@@ -19,8 +19,9 @@ public:
     DevMem& operator=(DevMem const&) = delete;
 
     // Whether the device can be opened for reading now (opened and closed
-    // again at once). Only a character device or a regular file can.
-    static bool canOpen(std::string const& path);
+    // again at once). Only a character device or a regular file can; why
+    // then names the file and the reason.
+    static bool canOpen(std::string const& path, std::string& why);
 
     // Opens the device (once; opening it again keeps it open); false for
     // anything but a character device or a regular file.

@@ -8,6 +8,9 @@
 //   devmem  the kernel's memory device, PMEM_DEVMEM_FILE (default /dev/mem)
 // PMEM_SOURCE=image|sysfs|devmem takes that source or none; without it the
 // first usable one in that order serves (image only when PMEM_IMAGE is set).
+// What it found of each source it tried, and what it cut from a table too
+// large for a 2.x entry point, it keeps for the tools (PMemSourceReport,
+// PMemTableCut).
 // Every file is opened without waiting, and only when it is a regular file
 // (or, for devmem, a character device): a FIFO, socket, folder or other
 // device makes its source unusable, as an unreadable file does.
@@ -15,6 +18,7 @@
 #include <climits>
 #include <cstdlib>
 #include <cstring>
+#include <exception>
 #include <memory>
 #include <mutex>
 #include <string>
@@ -34,77 +38,123 @@ std::string environment(char const* name) {
     return value == nullptr ? std::string() : std::string(value);
 }
 
-std::unique_ptr<Source> imageSource() {
+// What choosing a source found: one line per source tried, and what the
+// sysfs source cut from a table too large for a 2.x entry point.
+struct Findings {
+    std::string report;
+    TableCut cut;
+
+    void note(char const* source, std::string const& text) {
+        report += std::string(source) + ": " + text + "\n";
+    }
+};
+
+// Whether the memory holds an entry point where the plug-in looks: "_SM_" on
+// a 16-byte boundary in 0xF0000-0xFFFFF, else "_DMI_" in the first megabyte.
+bool holdsEntryPoint(Source& memory) {
+    unsigned char const sm[] = {'_', 'S', 'M', '_'};
+    unsigned char const dmi[] = {'_', 'D', 'M', 'I', '_'};
+    return memory.search(sm, sizeof sm, 0xF0000, 0xFFFFF, 16) != 0 ||
+           memory.search(dmi, sizeof dmi, 0, 0xFFFFF, 16) != 0;
+}
+
+std::unique_ptr<Source> imageSource(Findings& findings) {
     char const* list = std::getenv("PMEM_IMAGE");
     if (list == nullptr) {
+        findings.note("image", "PMEM_IMAGE is not set");
         return nullptr;
     }
     std::unique_ptr<RegionMemory> memory(new RegionMemory());
-    return loadImage(list, *memory) ? std::move(memory) : nullptr;
+    std::string why;
+    if (!loadImage(list, *memory, why)) {
+        findings.note("image", why);
+        return nullptr;
+    }
+    findings.note("image", holdsEntryPoint(*memory)
+                               ? std::string("serves ") + list
+                               : std::string("serves ") + list +
+                                     ", which holds no entry point in 0xF0000-0xFFFFF "
+                                     "(nor a _DMI_ one in the first megabyte)");
+    return memory;
 }
 
-std::unique_ptr<Source> sysfsSource() {
+std::unique_ptr<Source> sysfsSource(Findings& findings) {
     std::string folder = environment("PMEM_SYSFS_DIR");
     if (folder.empty()) {
         folder = "/sys/firmware/dmi/tables";
     }
     std::unique_ptr<RegionMemory> memory(new RegionMemory());
-    return loadSysfsTables(folder, *memory) ? std::move(memory) : nullptr;
+    std::string why;
+    if (!loadSysfsTables(folder, *memory, why, findings.cut)) {
+        findings.note("sysfs", why);
+        return nullptr;
+    }
+    findings.note("sysfs", "serves " + folder);
+    return memory;
 }
 
-std::unique_ptr<Source> devmemSource() {
+std::unique_ptr<Source> devmemSource(Findings& findings) {
     std::string path = environment("PMEM_DEVMEM_FILE");
     if (path.empty()) {
         path = "/dev/mem";
     }
-    if (!DevMem::canOpen(path)) {
+    std::string why;
+    if (!DevMem::canOpen(path, why)) {
+        findings.note("devmem", why);
         return nullptr;
     }
+    findings.note("devmem", "serves " + path);
     return std::unique_ptr<Source>(new DevMem(path));
 }
 
 // A source that cannot be made (a file too large to hold, say) is unusable.
-template <typename Make>
-std::unique_ptr<Source> attempt(Make make) {
+std::unique_ptr<Source> attempt(std::unique_ptr<Source> (*make)(Findings&), char const* name,
+                                Findings& findings) {
     try {
-        return make();
+        return make(findings);
+    } catch (std::exception const& e) {
+        findings.note(name, e.what());
     } catch (...) {
-        return nullptr;
+        findings.note(name, "cannot be used");
     }
+    return nullptr;
 }
 
-std::unique_ptr<Source> chooseSource() {
+std::unique_ptr<Source> chooseSource(Findings& findings) {
+    struct Candidate {
+        char const* name;
+        std::unique_ptr<Source> (*make)(Findings&);
+    };
+    Candidate const candidates[] = {
+        {"image", imageSource}, {"sysfs", sysfsSource}, {"devmem", devmemSource}};
     std::string const forced = environment("PMEM_SOURCE");
-    if (forced == "image") {
-        return attempt(imageSource);
+    for (Candidate const& candidate : candidates) {
+        if (forced.empty() || forced == candidate.name) {
+            if (std::unique_ptr<Source> source =
+                    attempt(candidate.make, candidate.name, findings)) {
+                return source;
+            }
+        }
     }
-    if (forced == "sysfs") {
-        return attempt(sysfsSource);
+    if (!forced.empty() && forced != "image" && forced != "sysfs" && forced != "devmem") {
+        // An unknown source serves nothing.
+        findings.note("PMEM_SOURCE", "'" + forced + "' names no source (image, sysfs, devmem)");
     }
-    if (forced == "devmem") {
-        return attempt(devmemSource);
-    }
-    if (!forced.empty()) {
-        return nullptr;  // an unknown source serves nothing
-    }
-    if (std::unique_ptr<Source> source = attempt(imageSource)) {
-        return source;
-    }
-    if (std::unique_ptr<Source> source = attempt(sysfsSource)) {
-        return source;
-    }
-    return attempt(devmemSource);
+    return nullptr;
 }
 
 struct Library {
+    Library() : source(chooseSource(findings)) {}
+
     std::mutex mutex;
+    Findings findings;
     std::unique_ptr<Source> source;
 };
 
 // Made on first use, which is when the library is loaded (below); undone
 // when it is unloaded.
 Library& library() {
-    static Library instance{{}, chooseSource()};
+    static Library instance;
     return instance;
 }
 
@@ -188,6 +238,34 @@ unsigned long PMemSearch(char const* anchor, unsigned long start, unsigned long 
         unsigned long const length = static_cast<unsigned long>(std::strlen(anchor));
         return lib.source->search(reinterpret_cast<unsigned char const*>(anchor), length, start,
                                   end, static_cast<unsigned long>(step));
+    } catch (...) {
+        return 0;
+    }
+}
+
+// What the library found when it chose its source, for the tools to show a
+// person; the plug-in never calls it.
+char const* PMemSourceReport(void) {
+    try {
+        return library().findings.report.c_str();
+    } catch (...) {
+        return "";
+    }
+}
+
+int PMemTableCut(unsigned long* tableBytes, unsigned long* tableStructures,
+                 unsigned long* servedBytes, unsigned long* servedStructures) {
+    try {
+        pmem::TableCut const& cut = library().findings.cut;
+        if (!cut.cut || tableBytes == nullptr || tableStructures == nullptr ||
+            servedBytes == nullptr || servedStructures == nullptr) {
+            return 0;
+        }
+        *tableBytes = static_cast<unsigned long>(cut.tableBytes);
+        *tableStructures = cut.tableStructures;
+        *servedBytes = static_cast<unsigned long>(cut.servedBytes);
+        *servedStructures = cut.servedStructures;
+        return 1;
     } catch (...) {
         return 0;
     }

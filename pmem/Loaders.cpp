@@ -104,14 +104,13 @@ bool placeEntryPointAndTable(RegionMemory& memory, std::vector<unsigned char> co
 
 }  // namespace
 
-bool readWholeFile(std::string const& path, size_t limit, std::vector<unsigned char>& bytes) {
+bool readWholeFile(std::string const& path, size_t limit, std::vector<unsigned char>& bytes,
+                   std::string& why) {
     // Only a regular file is read: a FIFO would make the load of the library
-    // wait for a writer, a device would be read to its limit. Whatever the
-    // file is, the library has nowhere to say why its source is unusable, so
-    // the reason is not kept.
-    std::string why;
+    // wait for a writer, a device would be read to its limit.
     int const fd = SD::openRegularFile(path.c_str(), why);
     if (fd < 0) {
+        why = path + ": " + why;
         return false;
     }
     bytes.clear();
@@ -123,6 +122,7 @@ bool readWholeFile(std::string const& path, size_t limit, std::vector<unsigned c
             if (errno == EINTR) {
                 continue;
             }
+            why = path + ": " + std::strerror(errno);
             ok = false;
             break;
         }
@@ -131,6 +131,7 @@ bool readWholeFile(std::string const& path, size_t limit, std::vector<unsigned c
         }
         size_t const n = static_cast<size_t>(r);
         if (n > limit - bytes.size()) {
+            why = path + ": larger than " + std::to_string(limit) + " bytes";
             ok = false;
             break;
         }
@@ -140,7 +141,7 @@ bool readWholeFile(std::string const& path, size_t limit, std::vector<unsigned c
     return ok;
 }
 
-bool loadImage(std::string const& list, RegionMemory& memory) {
+bool loadImage(std::string const& list, RegionMemory& memory, std::string& why) {
     size_t begin = 0;
     for (;;) {
         size_t const comma = list.find(',', begin);
@@ -149,17 +150,20 @@ bool loadImage(std::string const& list, RegionMemory& memory) {
         // The last '@': a file name may hold one, a base never does.
         size_t const at = item.rfind('@');
         if (at == std::string::npos || at == 0) {
+            why = "PMEM_IMAGE item '" + item + "' is not FILE@BASE";
             return false;
         }
         unsigned long base = 0;
         if (!parseBase(item.substr(at + 1), base)) {
+            why = "PMEM_IMAGE item '" + item + "': the base is not a hexadecimal address";
             return false;
         }
         std::vector<unsigned char> bytes;
-        if (!readWholeFile(item.substr(0, at), kImageFileLimit, bytes)) {
+        if (!readWholeFile(item.substr(0, at), kImageFileLimit, bytes, why)) {
             return false;
         }
         if (!memory.place(base, std::move(bytes))) {
+            why = "PMEM_IMAGE item '" + item + "' overlaps another file or passes the last address";
             return false;
         }
         if (comma == std::string::npos) {
@@ -169,13 +173,20 @@ bool loadImage(std::string const& list, RegionMemory& memory) {
     }
 }
 
-bool loadSysfsTables(std::string const& folder, RegionMemory& memory) {
+bool loadSysfsTables(std::string const& folder, RegionMemory& memory, std::string& why,
+                     TableCut& cut) {
     std::vector<unsigned char> entryPoint;
     std::vector<unsigned char> table;
-    if (!readWholeFile(folder + "/smbios_entry_point", kEntryPointFileLimit, entryPoint) ||
-        !readWholeFile(folder + "/DMI", kTableFileLimit, table) || table.empty()) {
+    std::string const entryPointPath = folder + "/smbios_entry_point";
+    if (!readWholeFile(entryPointPath, kEntryPointFileLimit, entryPoint, why) ||
+        !readWholeFile(folder + "/DMI", kTableFileLimit, table, why)) {
         return false;
     }
+    if (table.empty()) {
+        why = folder + "/DMI: empty";
+        return false;
+    }
+    std::string const shortEntryPoint = entryPointPath + ": shorter than its entry point";
     uint64_t const below4GiB = 0xFFFFFFFFu;
     uint64_t const lastAddress = ULONG_MAX;
     unsigned long address = kMovedTableAddress;
@@ -184,8 +195,25 @@ bool loadSysfsTables(std::string const& folder, RegionMemory& memory) {
         // 0x06 length, 0x07 major, 0x08 minor, 0x0C maximum table size,
         // 0x10 the 64-bit table address.
         if (entryPoint.size() < smbiosformat::SM3_ENTRY_POINT_SIZE ||
-            entryPoint[6] < smbiosformat::SM3_ENTRY_POINT_SIZE || table.size() > 0xFFFF) {
+            entryPoint[6] < smbiosformat::SM3_ENTRY_POINT_SIZE) {
+            why = shortEntryPoint;
             return false;
+        }
+        if (table.size() > smbiosformat::MAX_2X_TABLE_LENGTH) {
+            // A 2.x entry point states at most 65535 bytes: serve the whole
+            // structures of the table's start that fit, and say so.
+            smbiosformat::TablePrefix const prefix =
+                smbiosformat::wholeStructuresWithin(table, smbiosformat::MAX_2X_TABLE_LENGTH);
+            cut.cut = true;
+            cut.tableBytes = table.size();
+            cut.tableStructures = smbiosformat::tableStats(table).count;
+            cut.servedBytes = prefix.bytes;
+            cut.servedStructures = prefix.count;
+            if (prefix.bytes == 0) {
+                why = folder + "/DMI: no whole structure in its first 65535 bytes";
+                return false;
+            }
+            table.resize(prefix.bytes);
         }
         uint64_t const stated = smbiosformat::getQword(entryPoint, 0x10);
         if (canServeAt(stated, table.size(), std::min(below4GiB, lastAddress),
@@ -200,6 +228,7 @@ bool loadSysfsTables(std::string const& folder, RegionMemory& memory) {
         // 0x05 length, 0x15 intermediate checksum over 0x10-0x1E, 0x18 the
         // 32-bit table address. The kernel copies 30 to 32 bytes.
         if (entryPoint.size() < 0x1E) {
+            why = shortEntryPoint;
             return false;
         }
         presented = entryPoint;
@@ -214,6 +243,7 @@ bool loadSysfsTables(std::string const& folder, RegionMemory& memory) {
     } else if (startsWith(entryPoint, "_DMI_")) {
         // 15 bytes: 0x05 checksum, 0x08 the 32-bit table address.
         if (entryPoint.size() < smbiosformat::DMI_ENTRY_POINT_SIZE) {
+            why = shortEntryPoint;
             return false;
         }
         presented = entryPoint;
@@ -225,9 +255,14 @@ bool loadSysfsTables(std::string const& folder, RegionMemory& memory) {
             setChecksum(presented, 0x05, 0, smbiosformat::DMI_ENTRY_POINT_SIZE);
         }
     } else {
+        why = entryPointPath + ": neither a _SM3_, _SM_ nor _DMI_ entry point";
         return false;
     }
-    return placeEntryPointAndTable(memory, presented, address, std::move(table));
+    if (!placeEntryPointAndTable(memory, presented, address, std::move(table))) {
+        why = folder + "/DMI: cannot be served at its address";
+        return false;
+    }
+    return true;
 }
 
 }  // namespace pmem

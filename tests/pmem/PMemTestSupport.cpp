@@ -51,6 +51,16 @@ unsigned long PMemLibrary::search(char const* anchor, unsigned long start, unsig
     return functions_.search ? functions_.search(anchor, start, end, step) : 0;
 }
 
+std::string PMemLibrary::sourceReport() const {
+    return functions_.sourceReport ? functions_.sourceReport() : "(no PMemSourceReport)";
+}
+
+bool PMemLibrary::tableCut(TableCutFigures& figures) const {
+    return functions_.tableCut &&
+           functions_.tableCut(&figures.tableBytes, &figures.tableStructures, &figures.servedBytes,
+                               &figures.servedStructures) != 0;
+}
+
 std::vector<uint8_t> PMemLibrary::bytes(unsigned long address, size_t n, int& status) const {
     std::vector<uint8_t> out(n, 0);
     status = read(out.data(), address, static_cast<long>(n));

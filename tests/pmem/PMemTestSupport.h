@@ -20,6 +20,14 @@
 
 namespace pmemtest {
 
+// What PMemTableCut says of a table too large for a 2.x entry point.
+struct TableCutFigures {
+    unsigned long tableBytes = 0;
+    unsigned long tableStructures = 0;
+    unsigned long servedBytes = 0;
+    unsigned long servedStructures = 0;
+};
+
 // SMBIOS_OUT_DIR, the folder of the built libraries; "" when unset.
 std::string outDir();
 // The built libpmem.so.
@@ -43,6 +51,10 @@ public:
     int read(void* buffer, unsigned long address, long count) const;
     unsigned long search(char const* anchor, unsigned long start, unsigned long end,
                          long step) const;
+    // PMemSourceReport's text.
+    std::string sourceReport() const;
+    // PMemTableCut: true, with its figures, when the table served is cut.
+    bool tableCut(TableCutFigures& figures) const;
     // `n` bytes read at `address`; `status` is PMemRead's result.
     std::vector<uint8_t> bytes(unsigned long address, size_t n, int& status) const;
 

@@ -84,6 +84,58 @@ TEST_F(SourceChoice, NoSourceAtAllWhenSysfsIsForcedOnAnEmptyFolder) {
 
 TEST_F(SourceChoice, NoSourceAtAllWhenNoneIsOffered) { EXPECT_EQ(load().isInitialized(), 0); }
 
+// With no source at all, the report says for each source, in the order they
+// are tried, why it cannot serve.
+TEST_F(SourceChoice, NoSourceAtAllReportsWhyForEverySourceTried) {
+    PMemLibrary& pm = load();
+    EXPECT_EQ(pm.isInitialized(), 0);
+    EXPECT_EQ(pm.sourceReport(),
+              "image: PMEM_IMAGE is not set\n"
+              "sysfs: " +
+                  emptySysfs_.path() +
+                  "/smbios_entry_point: No such file or directory\n"
+                  "devmem: " +
+                  work_.file("no-such-device") + ": No such file or directory\n");
+    pmemtest::TableCutFigures cut;
+    EXPECT_FALSE(pm.tableCut(cut));
+}
+
+// The source that serves ends the report, with what it serves.
+TEST_F(SourceChoice, ReportEndsWithTheSourceThatServes) {
+    offerDevice();
+    PMemLibrary& pm = load();
+    EXPECT_NE(pm.isInitialized(), 0);
+    std::string const report = pm.sourceReport();
+    EXPECT_EQ(report.substr(0, report.find('\n') + 1), "image: PMEM_IMAGE is not set\n");
+    std::string const last =
+        "devmem: serves " + std::string(std::getenv("PMEM_DEVMEM_FILE")) + "\n";
+    ASSERT_GE(report.size(), last.size());
+    EXPECT_EQ(report.substr(report.size() - last.size()), last) << report;
+}
+
+// An image without an entry point where the plug-in looks serves all the
+// same, and the report says it holds none.
+TEST_F(SourceChoice, ImageWithoutAnEntryPointIsReportedSo) {
+    PMemLibrary& pm = loadSmallImage();
+    EXPECT_NE(pm.sourceReport().find("which holds no entry point in 0xF0000-0xFFFFF"),
+              std::string::npos)
+        << pm.sourceReport();
+}
+
+// Malformed and unreadable image items are named with what is wrong.
+TEST_F(SourceChoice, UnusableImageItemsAreReportedWithTheirReason) {
+    env("PMEM_SOURCE", "image");
+    env("PMEM_IMAGE", "no-at-sign");
+    EXPECT_EQ(load().sourceReport(), "image: PMEM_IMAGE item 'no-at-sign' is not FILE@BASE\n");
+}
+
+TEST_F(SourceChoice, MissingImageFileIsReportedWithTheSystemsReason) {
+    env("PMEM_SOURCE", "image");
+    env("PMEM_IMAGE", work_.file("missing.bin") + "@F0000");
+    EXPECT_EQ(load().sourceReport(),
+              "image: " + work_.file("missing.bin") + ": No such file or directory\n");
+}
+
 TEST_F(SourceChoice, ImageComesBeforeSysfsAndDevMem) {
     offerImage();
     offerSysfs();
@@ -133,7 +185,9 @@ TEST_F(SourceChoice, UnknownPMemSourceServesNothing) {
     offerImage();
     offerSysfs();
     env("PMEM_SOURCE", "memory");
-    EXPECT_EQ(load().isInitialized(), 0);
+    PMemLibrary& pm = load();
+    EXPECT_EQ(pm.isInitialized(), 0);
+    EXPECT_EQ(pm.sourceReport(), "PMEM_SOURCE: 'memory' names no source (image, sysfs, devmem)\n");
 }
 
 TEST_F(SourceChoice, ReadWithNullBufferFails) {
@@ -287,22 +341,28 @@ std::vector<std::string> versionScriptGlobals(std::string const& text) {
     return names;
 }
 
-// The contract's required exports, sorted.
+// The contract's exports, required and reporting, sorted.
 std::vector<std::string> contractExports() {
     std::vector<std::string> names(std::begin(pmem::kRequiredExports),
                                    std::end(pmem::kRequiredExports));
+    names.insert(names.end(), std::begin(pmem::kReportExports), std::end(pmem::kReportExports));
     std::sort(names.begin(), names.end());
     return names;
 }
 
 }  // namespace
 
-// The built library exports the contract's functions and nothing else, and
-// the contract names the five functions the plug-in binds.
-TEST(PMemExports, ExactlyTheFiveFunctions) {
+// The built library exports the contract's functions and nothing else: the
+// five the plug-in binds and the two that tell the tools what it found.
+TEST(PMemExports, TheFiveFunctionsAndTheTwoReports) {
     EXPECT_EQ(exportedSymbols(pmemtest::libraryPath()), contractExports());
-    EXPECT_EQ(contractExports(), (std::vector<std::string>{"PMemClose", "PMemIsInitialized",
-                                                           "PMemOpen", "PMemRead", "PMemSearch"}));
+    EXPECT_EQ(contractExports(),
+              (std::vector<std::string>{"PMemClose", "PMemIsInitialized", "PMemOpen", "PMemRead",
+                                        "PMemSearch", "PMemSourceReport", "PMemTableCut"}));
+    std::vector<std::string> required(std::begin(pmem::kRequiredExports),
+                                      std::end(pmem::kRequiredExports));
+    EXPECT_EQ(required, (std::vector<std::string>{"PMemIsInitialized", "PMemOpen", "PMemClose",
+                                                  "PMemRead", "PMemSearch"}));
 }
 
 // The version script, which decides what the library exports, lists the

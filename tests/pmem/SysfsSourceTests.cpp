@@ -3,6 +3,7 @@
 // would: the entry point at 0xF0000, the table at the address it names, a
 // 3.x entry point as the equivalent 2.x "_SM_" one.
 #include <climits>
+#include <cstdlib>
 #include <cstring>
 
 #include "PMemTestSupport.h"
@@ -179,12 +180,50 @@ TEST_F(SysfsSource, Sm3TableOf65535BytesIsServed) {
     EXPECT_TRUE(readsBytes(pm, kTableAddress, table));
 }
 
-TEST_F(SysfsSource, Sm3TableLongerThan65535BytesMakesTheSourceUnusable) {
-    serve(pmemtest::sm3EntryPoint(3, 3, 0, 0x20000, kTableAddress), tableOfSize(0x10000));
-    env("PMEM_SOURCE", "sysfs");
+// A 3.x table longer than a 2.x entry point can state is served as the
+// whole structures of its start that fit in 65535 bytes, and the library
+// says what it cut.
+TEST_F(SysfsSource, Sm3TableLongerThan65535BytesIsServedAsTheWholeStructuresThatFit) {
+    std::vector<uint8_t> const table = smbiostest::largeServerTable(1100);
+    size_t const headSize = smbiostest::largeServerTable(0).size() - 6;  // less end-of-table
+    size_t const deviceSize = smbiostest::largeServerTable(1).size() - 6 - headSize;
+    ASSERT_GT(table.size(), 95000u);
+    // The devices that fit after the head; the 5 head structures before them.
+    size_t const devicesServed = (0xFFFF - headSize) / deviceSize;
+    size_t const served = headSize + devicesServed * deviceSize;
+    serve(pmemtest::sm3EntryPoint(3, 3, 0, static_cast<uint32_t>(table.size()), kTableAddress),
+          table);
     PMemLibrary& pm = load();
-    EXPECT_EQ(pm.isInitialized(), 0);
-    EXPECT_EQ(pm.search("_SM_", 0xF0000, 0xFFFFF, 16), 0ul);
+    ASSERT_NE(pm.isInitialized(), 0) << pm.sourceReport();
+    std::vector<uint8_t> const ep = presentedSm(pm);
+    expectEquivalentSm(ep, 3, 3, served);
+    EXPECT_EQ(word(ep, 0x1C), 5 + devicesServed) << "structure count";
+    EXPECT_EQ(word(ep, 0x08), deviceSize) << "largest structure";
+    EXPECT_TRUE(readsBytes(pm, dword(ep, 0x18), slice(table, 0, served)));
+    pmemtest::TableCutFigures cut;
+    ASSERT_TRUE(pm.tableCut(cut));
+    EXPECT_EQ(cut.tableBytes, table.size());
+    EXPECT_EQ(cut.tableStructures, 5u + 1100u + 1u);
+    EXPECT_EQ(cut.servedBytes, served);
+    EXPECT_EQ(cut.servedStructures, 5 + devicesServed);
+    EXPECT_NE(pm.sourceReport().find("sysfs: serves "), std::string::npos) << pm.sourceReport();
+}
+
+// A table that fits is served whole and nothing is said to be cut.
+TEST_F(SysfsSource, Sm3TableJustUnder64KiBIsServedWholeAndNotCut) {
+    std::vector<uint8_t> const table = smbiostest::largeServerTable(680);
+    ASSERT_GT(table.size(), 60000u);
+    ASSERT_LE(table.size(), 0xFFFFu);
+    serve(pmemtest::sm3EntryPoint(3, 3, 0, static_cast<uint32_t>(table.size()), kTableAddress),
+          table);
+    PMemLibrary& pm = load();
+    ASSERT_NE(pm.isInitialized(), 0) << pm.sourceReport();
+    std::vector<uint8_t> const ep = presentedSm(pm);
+    expectEquivalentSm(ep, 3, 3, table.size());
+    EXPECT_EQ(word(ep, 0x1C), 5u + 680u + 1u);
+    EXPECT_TRUE(readsBytes(pm, dword(ep, 0x18), table));
+    pmemtest::TableCutFigures cut;
+    EXPECT_FALSE(pm.tableCut(cut));
 }
 
 TEST_F(SysfsSource, LegacyDmiEntryPointIsPresentedAsItIs) {
@@ -224,6 +263,7 @@ struct BadSysfs {
     std::vector<uint8_t> entryPoint;  // empty: no smbios_entry_point file
     size_t tableSize;                 // 0 with hasTable: an empty DMI file
     bool hasTable;
+    char const* why;  // what the library's report says after "sysfs: FOLDER/"
 };
 
 void PrintTo(BadSysfs const& bad, std::ostream* out) { *out << bad.name; }
@@ -242,6 +282,9 @@ TEST_P(BadSysfsFolder, MakesTheSysfsSourceUnusable) {
     unsigned char buffer[16] = {};
     EXPECT_NE(pm.read(buffer, kBiosArea, 16), 0);
     EXPECT_EQ(pm.search("_SM_", 0xF0000, 0xFFFFF, 16), 0ul);
+    // The report names the file and what is wrong with it.
+    std::string const folder = std::getenv("PMEM_SYSFS_DIR");
+    EXPECT_EQ(pm.sourceReport(), "sysfs: " + folder + "/" + bad.why + "\n");
 }
 
 namespace {
@@ -262,18 +305,21 @@ std::vector<uint8_t> withAnchor(char const* anchor) {
 INSTANTIATE_TEST_SUITE_P(
     SysfsSource, BadSysfsFolder,
     ::testing::Values(
-        BadSysfs{"EmptyFolder", {}, 0, false},
-        BadSysfs{"NoEntryPoint", {}, 64, true},
+        BadSysfs{"EmptyFolder", {}, 0, false, "smbios_entry_point: No such file or directory"},
+        BadSysfs{"NoEntryPoint", {}, 64, true, "smbios_entry_point: No such file or directory"},
         BadSysfs{"NoTable", pmemtest::smEntryPoint(std::vector<uint8_t>(64, 0), 2, 7, 0x100000),
-                 0, false},
+                 0, false, "DMI: No such file or directory"},
         BadSysfs{"EmptyTable",
-                 pmemtest::smEntryPoint(std::vector<uint8_t>(64, 0), 2, 7, 0x100000), 0, true},
-        BadSysfs{"UnknownAnchor", withAnchor("_XM_"), 64, true},
+                 pmemtest::smEntryPoint(std::vector<uint8_t>(64, 0), 2, 7, 0x100000), 0, true,
+                 "DMI: empty"},
+        BadSysfs{"UnknownAnchor", withAnchor("_XM_"), 64, true,
+                 "smbios_entry_point: neither a _SM3_, _SM_ nor _DMI_ entry point"},
         BadSysfs{"ShortSmEntryPoint",
                  sized(pmemtest::smEntryPoint(std::vector<uint8_t>(64, 0), 2, 7, 0x100000), 0x1D),
-                 64, true},
+                 64, true, "smbios_entry_point: shorter than its entry point"},
         BadSysfs{"ShortSm3EntryPoint",
-                 sized(pmemtest::sm3EntryPoint(3, 0, 0, 64, 0x100000), 0x17), 64, true},
+                 sized(pmemtest::sm3EntryPoint(3, 0, 0, 64, 0x100000), 0x17), 64, true,
+                 "smbios_entry_point: shorter than its entry point"},
         BadSysfs{"Sm3EntryPointStatingAShortLength",
                  [] {
                      std::vector<uint8_t> ep = pmemtest::sm3EntryPoint(3, 0, 0, 64, 0x100000);
@@ -281,7 +327,8 @@ INSTANTIATE_TEST_SUITE_P(
                      pmemtest::setChecksum(ep, 5, 0, 0x18);
                      return ep;
                  }(),
-                 64, true},
+                 64, true, "smbios_entry_point: shorter than its entry point"},
         BadSysfs{"ShortDmiEntryPoint",
-                 sized(smbiosdump::makeDmiEntryPoint(0x21, 64, 0x100000, 1), 14), 64, true}),
+                 sized(smbiosdump::makeDmiEntryPoint(0x21, 64, 0x100000, 1), 14), 64, true,
+                 "smbios_entry_point: shorter than its entry point"}),
     [](::testing::TestParamInfo<BadSysfs> const& info) { return std::string(info.param.name); });

@@ -137,7 +137,8 @@ int PMemOpen(void) {
     }
     if (char const* image = std::getenv("FAKE_PMEM_IMAGE")) {
         std::unique_ptr<pmem::RegionMemory> regions(new pmem::RegionMemory());
-        if (!pmem::loadImage(image, *regions)) {
+        std::string why;
+        if (!pmem::loadImage(image, *regions, why)) {
             return 0;
         }
         fake.regions = std::move(regions);

@@ -235,4 +235,59 @@ bool dmidecodeVersion(std::string const& name, unsigned int& major, unsigned int
     return false;
 }
 
+namespace {
+
+// n in decimal, zero-padded to width digits.
+std::string padded(unsigned n, int width) {
+    std::string text = std::to_string(n);
+    return std::string(text.size() < static_cast<size_t>(width) ? width - text.size() : 0, '0') +
+           text;
+}
+
+}  // namespace
+
+std::vector<uint8_t> largeServerTable(unsigned devices) {
+    TableBuilder table;
+    table.add(Structure(0, 0x0000).str("Corvane").str("CVE2.10").word(0xE800).str("01/15/2026"));
+    table.add(Structure(1, 0x0001).str("Corvane").str("RS-9900").str("2.0").str("CZ2026LARGE"));
+    table.add(Structure(2, 0x0002).str("Corvane").str("RS-9900-MB").str("1.0").str("MB0001"));
+    table.add(Structure(3, 0x0003).str("Corvane").byte(0x17).str("1.0").str("CH0001"));
+    // Memory array: location, use, error correction, maximum capacity,
+    // error handle, number of devices.
+    table.add(Structure(16, 0x1000)
+                  .byte(3)
+                  .byte(3)
+                  .byte(6)
+                  .dword(0x80000000u)
+                  .word(0xFFFE)
+                  .word(static_cast<uint16_t>(devices > 0xFFFF ? 0xFFFF : devices)));
+    for (unsigned n = 0; n < devices; ++n) {
+        table.add(Structure(17, static_cast<uint16_t>(0x1100 + n))
+                      .word(0x1000)  // memory array
+                      .word(0xFFFE)  // no error information
+                      .word(72)      // total width
+                      .word(64)      // data width
+                      .word(0x4000)  // 16384 MB
+                      .byte(0x09)    // DIMM
+                      .byte(0)       // no device set
+                      .str("DIMM_" + padded(n, 4))
+                      .str("NODE " + padded(n / 64, 2))
+                      .byte(0x1A)    // DDR4
+                      .word(0x0080)  // synchronous
+                      .word(2666)    // MT/s
+                      .str("Corvane")
+                      .str("SN" + padded(n, 8))
+                      .str("")  // no asset tag
+                      .str("CV-16G-2666")
+                      .byte(2)     // rank
+                      .dword(0)    // extended size
+                      .word(2666)  // configured speed
+                      .word(1200)
+                      .word(1200)
+                      .word(1200));
+    }
+    table.endOfTable(0xFFFE);
+    return table.build();
+}
+
 }  // namespace smbiostest

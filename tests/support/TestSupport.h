@@ -100,4 +100,11 @@ std::vector<std::string> commandLine(std::string const& program,
 void writeOverrideDir(std::string const& dataDir, std::vector<uint8_t> const& header,
                       std::vector<uint8_t> const& table);
 
+// The table of a large server: BIOS, system, baseboard, chassis, one
+// memory array, then `devices` memory devices of 16 GB (type 17, all of one
+// length: locator "DIMM_<nnnn>", bank "NODE <nn>", maker, serial "SN<nnnnnnnn>",
+// part number) and the end-of-table structure. 1,100 devices make a table
+// of about 100,000 bytes, more than a 2.x entry point can describe.
+std::vector<uint8_t> largeServerTable(unsigned devices);
+
 }  // namespace smbiostest

@@ -33,6 +33,20 @@ extern "C" __attribute__((visibility("default"))) unsigned long PMemSearch(char 
                                                                            unsigned long end,
                                                                            long step);
 
+// What the library found when it chose its source, for a person: one line
+// per source it tried, in order, saying why that source cannot serve
+// ("sysfs: /sys/firmware/dmi/tables/DMI: Permission denied") or what it
+// serves ("sysfs: serves /sys/firmware/dmi/tables"). Never null. The tools
+// show it; the plug-in never calls it.
+extern "C" __attribute__((visibility("default"))) char const* PMemSourceReport(void);
+// Non-zero when the table the library serves is the start of a larger one
+// that a 2.x entry point cannot describe (over 65535 bytes): the whole
+// table's bytes and structures, and those of the whole structures served.
+extern "C" __attribute__((visibility("default"))) int PMemTableCut(unsigned long* tableBytes,
+                                                                   unsigned long* tableStructures,
+                                                                   unsigned long* servedBytes,
+                                                                   unsigned long* servedStructures);
+
 namespace pmem {
 
 using IsInitializedFn = decltype(&PMemIsInitialized);
@@ -40,6 +54,8 @@ using OpenFn = decltype(&PMemOpen);
 using CloseFn = decltype(&PMemClose);
 using ReadFn = decltype(&PMemRead);
 using SearchFn = decltype(&PMemSearch);
+using SourceReportFn = decltype(&PMemSourceReport);
+using TableCutFn = decltype(&PMemTableCut);
 
 // The symbol names, as the library exports them and a loader looks them up.
 constexpr char kIsInitializedName[] = "PMemIsInitialized";
@@ -47,6 +63,8 @@ constexpr char kOpenName[] = "PMemOpen";
 constexpr char kCloseName[] = "PMemClose";
 constexpr char kReadName[] = "PMemRead";
 constexpr char kSearchName[] = "PMemSearch";
+constexpr char kSourceReportName[] = "PMemSourceReport";
+constexpr char kTableCutName[] = "PMemTableCut";
 
 // Every function a usable library exports, in the order they are bound (and
 // a missing one reported). A function the library may lack without being
@@ -54,6 +72,9 @@ constexpr char kSearchName[] = "PMemSearch";
 // the version script exports both lists.
 constexpr char const* kRequiredExports[] = {kIsInitializedName, kOpenName, kCloseName, kReadName,
                                             kSearchName};
+// What the library tells the tools beyond the contract; a library without
+// them is still usable.
+constexpr char const* kReportExports[] = {kSourceReportName, kTableCutName};
 
 // The functions of a loaded library; null where it lacks one.
 struct Functions {
@@ -62,6 +83,8 @@ struct Functions {
     CloseFn close = nullptr;
     ReadFn read = nullptr;
     SearchFn search = nullptr;
+    SourceReportFn sourceReport = nullptr;
+    TableCutFn tableCut = nullptr;
 };
 
 // The function `name` of the library loaded as `handle` (from dlopen), null
@@ -80,6 +103,8 @@ inline char const* bindFunctions(void* handle, Functions& out) {
     out.close = lookUp<CloseFn>(handle, kCloseName);
     out.read = lookUp<ReadFn>(handle, kReadName);
     out.search = lookUp<SearchFn>(handle, kSearchName);
+    out.sourceReport = lookUp<SourceReportFn>(handle, kSourceReportName);
+    out.tableCut = lookUp<TableCutFn>(handle, kTableCutName);
     bool const found[] = {out.isInitialized != nullptr, out.open != nullptr, out.close != nullptr,
                           out.read != nullptr, out.search != nullptr};
     static_assert(std::size(found) == std::size(kRequiredExports),
