@@ -1,5 +1,6 @@
 #include "PMemTestSupport.h"
 
+#include <grp.h>
 #include <signal.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
@@ -115,6 +116,19 @@ int runInChild(std::function<int()> const& body, unsigned seconds) {
         }
         std::this_thread::sleep_for(std::chrono::milliseconds(10));
     }
+}
+
+int runAsUnprivilegedUser(std::function<int()> const& body) {
+    return runInChild([&body] {
+        if (::geteuid() == 0) {
+            uid_t const nobody = 65534;
+            if (::setgroups(0, nullptr) != 0 || ::setgid(nobody) != 0 || ::setuid(nobody) != 0 ||
+                ::geteuid() == 0) {
+                return kNoUnprivilegedUser;
+            }
+        }
+        return body();
+    });
 }
 
 int isInitializedInChild() {

@@ -82,6 +82,15 @@ constexpr unsigned kChildSeconds = 10;
 // reading waits for a writer): the child is killed instead.
 int runInChild(std::function<int()> const& body, unsigned seconds = kChildSeconds);
 
+// What runAsUnprivilegedUser returns when this process, running as root,
+// cannot become the unprivileged user "nobody" (65534).
+constexpr int kNoUnprivilegedUser = 77;
+
+// runInChild, with the child running as an unprivileged user: as this
+// process's user when it is not root, else as "nobody", to whom files that
+// only root may read are unreadable as they are to an ordinary user.
+int runAsUnprivilegedUser(std::function<int()> const& body);
+
 // What isInitializedInChild returns when the library could not be loaded.
 constexpr int kNotLoaded = 3;
 

@@ -2,7 +2,10 @@
 // (smbios_entry_point and DMI in PMEM_SYSFS_DIR), presented as firmware
 // would: the entry point at 0xF0000, the table at the address it names, a
 // 3.x entry point as the equivalent 2.x "_SM_" one.
+#include <sys/stat.h>
+
 #include <climits>
+#include <cstdio>
 #include <cstdlib>
 #include <cstring>
 
@@ -255,6 +258,39 @@ TEST_F(SysfsSource, LegacyDmiTableOnTheEntryPointIsMovedAndItsChecksumKeptRight)
     EXPECT_EQ(slice(presented, 6, 8), slice(ep, 6, 8));
     EXPECT_EQ(slice(presented, 12, 15), slice(ep, 12, 15));
     EXPECT_TRUE(readsBytes(pm, 0x100000, table));
+}
+
+// As an ordinary user, on a machine whose kernel tables only root may read,
+// the source cannot serve, and the report names the file and the reason.
+TEST_F(SysfsSource, TablesOnlyRootMayReadAreReportedAsPermissionDenied) {
+    std::vector<uint8_t> const table = pmemtest::sampleTable();
+    std::vector<uint8_t> const ep = pmemtest::smEntryPoint(table, 2, 7, kTableAddress);
+    std::string const folder = sysfsFolder(&ep, &table);
+    ASSERT_EQ(::chmod((folder + "/smbios_entry_point").c_str(), 0), 0);
+    ASSERT_EQ(::chmod((folder + "/DMI").c_str(), 0), 0);
+    // The folders on the way are open to everyone, as /sys/firmware/dmi/tables is.
+    ASSERT_EQ(::chmod(work_.path().c_str(), 0755), 0);
+    env("PMEM_SYSFS_DIR", folder);
+    env("PMEM_SOURCE", "sysfs");
+    std::string const expected = "sysfs: " + folder + "/smbios_entry_point: Permission denied\n";
+    int const result = pmemtest::runAsUnprivilegedUser([&expected] {
+        PMemLibrary pm;
+        if (!pm.loaded()) {
+            return 3;
+        }
+        if (pm.isInitialized() != 0) {
+            return 4;
+        }
+        if (pm.sourceReport() != expected) {
+            std::fprintf(stderr, "report:\n%s", pm.sourceReport().c_str());
+            return 5;
+        }
+        return 0;
+    });
+    if (result == pmemtest::kNoUnprivilegedUser) {
+        GTEST_SKIP() << "cannot become an unprivileged user (nobody) here";
+    }
+    EXPECT_EQ(result, 0) << "3: not loaded, 4: initialized, 5: another report";
 }
 
 // Folders the forced sysfs source cannot serve from.
