@@ -1,0 +1,65 @@
+#include "MachineReport.h"
+
+#include "pmem/PMemContract.h"
+
+namespace smbiostool {
+
+std::string cutWarning(std::string const& subject, TableCut const& cut) {
+    return "warning: " + subject + " is " + std::to_string(cut.tableBytes) + " bytes (" +
+           std::to_string(cut.tableStructures) +
+           " structures); the 2.x entry point that the plug-in reads holds the first " +
+           std::to_string(cut.servedBytes) + " bytes (" + std::to_string(cut.servedStructures) +
+           " structures)";
+}
+
+MachineReport::MachineReport(std::string const& libraryPath) {
+    pmem::BoundLibrary library(libraryPath);
+    library.loadAndBind();
+    if (library.getHandle() == nullptr) {
+        sources_.push_back(libraryPath + ": " + library.getLastError());
+        return;
+    }
+    pmem::Functions const& functions = library.functions();
+    if (functions.sourceReport == nullptr) {
+        sources_.push_back(libraryPath + " does not say which sources it tried");
+    } else {
+        std::string const text = functions.sourceReport();
+        size_t begin = 0;
+        while (begin < text.size()) {
+            size_t end = text.find('\n', begin);
+            if (end == std::string::npos) {
+                end = text.size();
+            }
+            if (end > begin) {
+                sources_.push_back(text.substr(begin, end - begin));
+            }
+            begin = end + 1;
+        }
+    }
+    cut_ = functions.tableCut != nullptr &&
+           functions.tableCut(&figures_.tableBytes, &figures_.tableStructures,
+                              &figures_.servedBytes, &figures_.servedStructures) != 0;
+}
+
+bool MachineReport::cut(TableCut& figures) const {
+    if (cut_) {
+        figures = figures_;
+    }
+    return cut_;
+}
+
+std::vector<std::string> noTableLines(std::string const& libraryPath, MachineReport const& report,
+                                      std::string const& savedTableOptions) {
+    std::vector<std::string> lines;
+    lines.push_back("no SMBIOS table could be read from this machine; " + libraryPath +
+                    " tried:");
+    for (std::string const& source : report.sources()) {
+        lines.push_back("  " + source);
+    }
+    lines.push_back("run it as root (the kernel's tables and /dev/mem are root's), or read a "
+                    "saved table with " +
+                    savedTableOptions);
+    return lines;
+}
+
+}  // namespace smbiostool

@@ -1,0 +1,52 @@
+// What the physical-memory library found on this machine, told to a person:
+// why each source it tried could not serve, and what it cut from a table too
+// large for the 2.x entry point the plug-in reads. The host program and
+// smbios-dump say it when the machine gave no table, or only part of one.
+#pragma once
+
+#include <string>
+#include <vector>
+
+namespace smbiostool {
+
+// How much of a table a 2.x entry point describes when the table is larger
+// than 65535 bytes: the whole table, and the whole structures of its start
+// that fit.
+struct TableCut {
+    unsigned long tableBytes = 0;
+    unsigned long tableStructures = 0;
+    unsigned long servedBytes = 0;
+    unsigned long servedStructures = 0;
+};
+
+// "warning: SUBJECT is 100042 bytes (2184 structures); the 2.x entry point
+// that the plug-in reads holds the first 65500 bytes (1421 structures)".
+std::string cutWarning(std::string const& subject, TableCut const& cut);
+
+// A copy of the physical-memory library, loaded to ask it what it found.
+// Loaded afresh, it chooses its source as it did for the plug-in (the same
+// environment, the same files).
+class MachineReport {
+public:
+    explicit MachineReport(std::string const& libraryPath);
+
+    // One line per source the library tried ("sysfs: /sys/firmware/dmi/
+    // tables/DMI: Permission denied"); or one line saying why the library
+    // itself could not be loaded or asked.
+    std::vector<std::string> const& sources() const { return sources_; }
+    // Whether the table the library serves is cut, with its figures.
+    bool cut(TableCut& figures) const;
+
+private:
+    std::vector<std::string> sources_;
+    bool cut_ = false;
+    TableCut figures_;
+};
+
+// The lines that say a machine gave no table: a first line, the library's
+// lines indented, and the hint, which names the options that read a saved
+// table instead.
+std::vector<std::string> noTableLines(std::string const& libraryPath, MachineReport const& report,
+                                      std::string const& savedTableOptions);
+
+}  // namespace smbiostool
