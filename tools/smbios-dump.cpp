@@ -25,6 +25,7 @@
 #include <vector>
 
 #include "DumpFormat.h"
+#include "MachineReport.h"
 #include "ToolSupport.h"
 #include "dump/DumpInput.h"
 #include "dump/DumpOutput.h"
@@ -263,18 +264,29 @@ int captureFromFile(CommandLine const& line, smbiosdump::Capture& capture) {
 }
 
 // --from-machine: this machine's table through the physical-memory library.
-// Returns 0, or the exit status after saying why.
+// Without a table, says which sources the library tried and why each could
+// not serve; with the start of a table too large for a 2.x entry point,
+// says what was left out. Returns 0, or the exit status after saying why.
 int captureFromMachine(CommandLine const& line, smbiosdump::Capture& capture) {
     std::string const library = line.pmemPath.empty()
                                     ? smbiosdump::defaultPMemPath(smbiostool::ownFolder())
                                     : line.pmemPath;
     std::string error;
-    if (!smbiosdump::captureFromMachine(library, capture, error)) {
-        // The library's sources (the kernel's tables, /dev/mem) are root's
-        // to read.
-        complain("cannot read this machine's SMBIOS table: " + error +
-                 (geteuid() != 0 ? " (reading physical memory usually needs root)" : ""));
+    bool const captured = smbiosdump::captureFromMachine(library, capture, error);
+    // Asked afresh, the library tells what it found when it chose its source.
+    smbiostool::MachineReport const report(library.find('/') == std::string::npos ? "./" + library
+                                                                                  : library);
+    if (!captured) {
+        complain("cannot read this machine's SMBIOS table: " + error);
+        for (std::string const& text :
+             smbiostool::noTableLines(report, "--from-bin FILE (from dmidecode --dump-bin)")) {
+            complain(text);
+        }
         return smbiostool::EXIT_FAILED;
+    }
+    smbiostool::TableCut cut;
+    if (report.cut(cut)) {
+        complain(smbiostool::cutWarning("this machine's SMBIOS table", cut));
     }
     return 0;
 }

@@ -22,7 +22,9 @@
 
 #include "DumpFormat.h"
 #include "IC/Node.h"
+#include "MachineReport.h"
 #include "QNLog/QNLogger.h"
+#include "SD/PlatformUtilities.h"
 #include "SD/RegularFile.h"
 #include "ToolSupport.h"
 #include "inventory/DumpCheck.h"
@@ -252,10 +254,21 @@ void addOptions(CLI::App& app, Options& options) {
                          "Print the version and exit");
 }
 
-// The logger's thresholds and file, as the options ask. Returns 0, or the
-// exit status after saying why.
+// The logger's thresholds and file, as the options ask. Quiet unless asked:
+// without --log, --log-level or --trace-level (or QNLOG_LEVEL or
+// QNLOG_TRACE_LEVEL in the environment) the plug-in's log is not written,
+// so that standard error carries this program's own messages only. Returns
+// 0, or the exit status after saying why.
 int applyLogOptions(Options const& options) {
     int threshold = 0;
+    bool const asked = !options.logFile.empty() || !options.logLevel.empty() ||
+                       !options.traceLevel.empty() || std::getenv("QNLOG_LEVEL") != nullptr ||
+                       std::getenv("QNLOG_TRACE_LEVEL") != nullptr;
+    if (!asked && QNLog::QNLogger::parseLevel("off", threshold)) {
+        QNLog::QNLogger::setLogLevel(threshold);
+        QNLog::QNLogger::setTraceLevel(threshold);
+        return 0;
+    }
     if (QNLog::QNLogger::parseLevel(options.logLevel, threshold)) {
         QNLog::QNLogger::setLogLevel(threshold);
     }
@@ -381,6 +394,38 @@ int loadInventory(inventory::PluginHost& host, Options const& options,
     return 0;
 }
 
+// After the plug-in read this machine (no dump given): when it got no table,
+// says why (the physical-memory library's sources, or the override file in
+// the data directory) and returns 1; when it got only the start of a table
+// too large for its 2.x entry point, warns. Returns 0 otherwise.
+int checkMachineAnswer(inventory::PluginHost const& host) {
+    std::string const codeDir = SD::PlatformUtilities::getKestrelCodeDir();
+    std::string const overrideFile =
+        SD::PlatformUtilities::getKestrelDataDir() + "SmBiosOverride/smbios.txt";
+    struct stat status;
+    // The plug-in reads the file only when it is a regular file.
+    bool const fromFile = stat(overrideFile.c_str(), &status) == 0 && S_ISREG(status.st_mode);
+    if (!host.acquiredEmptyTable()) {
+        smbiostool::TableCut cut;
+        if (!fromFile && smbiostool::MachineReport(codeDir + "libpmem.so").cut(cut)) {
+            complain(smbiostool::cutWarning("this machine's SMBIOS table", cut));
+        }
+        return 0;
+    }
+    if (fromFile) {
+        complain("no SMBIOS table: the override file " + overrideFile +
+                 " holds none the plug-in can use (--log-level 3000 shows why)");
+        return smbiostool::EXIT_FAILED;
+    }
+    complain("no SMBIOS table could be read from this machine");
+    smbiostool::MachineReport const report(codeDir + "libpmem.so");
+    for (std::string const& line :
+         smbiostool::noTableLines(report, "--dump FILE or --from-bin FILE")) {
+        complain(line);
+    }
+    return smbiostool::EXIT_FAILED;
+}
+
 int run(int argc, char** argv) {
     CLI::App app{
         "Loads a management-interface plug-in the way the inventory agent does and prints "
@@ -410,7 +455,8 @@ int run(int argc, char** argv) {
     }
     inventory::PluginHost host(pluginPath(options.pluginPath));
     std::vector<IC::Node*> nodes;
-    if ((status = loadInventory(host, options, nodes)) != 0) {
+    if ((status = loadInventory(host, options, nodes)) != 0 ||
+        (!onDump && (status = checkMachineAnswer(host)) != 0)) {
         return status;
     }
     std::cout << (options.format == "json" ? inventory::renderJson(nodes)

@@ -1,5 +1,7 @@
 #include "MachineReport.h"
 
+#include <unistd.h>
+
 #include "pmem/PMemContract.h"
 
 namespace smbiostool {
@@ -12,17 +14,14 @@ std::string cutWarning(std::string const& subject, TableCut const& cut) {
            " structures)";
 }
 
-MachineReport::MachineReport(std::string const& libraryPath) {
+MachineReport::MachineReport(std::string const& libraryPath) : libraryPath_(libraryPath) {
     pmem::BoundLibrary library(libraryPath);
     library.loadAndBind();
     if (library.getHandle() == nullptr) {
-        sources_.push_back(libraryPath + ": " + library.getLastError());
         return;
     }
     pmem::Functions const& functions = library.functions();
-    if (functions.sourceReport == nullptr) {
-        sources_.push_back(libraryPath + " does not say which sources it tried");
-    } else {
+    if (functions.sourceReport != nullptr) {
         std::string const text = functions.sourceReport();
         size_t begin = 0;
         while (begin < text.size()) {
@@ -48,17 +47,22 @@ bool MachineReport::cut(TableCut& figures) const {
     return cut_;
 }
 
-std::vector<std::string> noTableLines(std::string const& libraryPath, MachineReport const& report,
+std::vector<std::string> noTableLines(MachineReport const& report,
                                       std::string const& savedTableOptions) {
     std::vector<std::string> lines;
-    lines.push_back("no SMBIOS table could be read from this machine; " + libraryPath +
-                    " tried:");
-    for (std::string const& source : report.sources()) {
-        lines.push_back("  " + source);
+    if (!report.sources().empty()) {
+        lines.push_back(report.libraryPath() + " tried:");
+        for (std::string const& source : report.sources()) {
+            lines.push_back("  " + source);
+        }
     }
-    lines.push_back("run it as root (the kernel's tables and /dev/mem are root's), or read a "
-                    "saved table with " +
-                    savedTableOptions);
+    // Root is refused nothing the machine has: then it has no table to show
+    // (a container without /sys/firmware/dmi or /dev/mem, say).
+    lines.push_back(std::string(::geteuid() == 0
+                                    ? "this machine shows no SMBIOS table, not even to root; "
+                                    : "run it as root (the kernel's SMBIOS tables and /dev/mem "
+                                      "are root's to read), or ") +
+                    "read a saved table with " + savedTableOptions);
     return lines;
 }
 

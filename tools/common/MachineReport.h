@@ -31,22 +31,25 @@ public:
     explicit MachineReport(std::string const& libraryPath);
 
     // One line per source the library tried ("sysfs: /sys/firmware/dmi/
-    // tables/DMI: Permission denied"); or one line saying why the library
-    // itself could not be loaded or asked.
+    // tables/DMI: Permission denied"); empty when the library could not be
+    // loaded or does not say.
     std::vector<std::string> const& sources() const { return sources_; }
+    // The library's file, as it was loaded.
+    std::string const& libraryPath() const { return libraryPath_; }
     // Whether the table the library serves is cut, with its figures.
     bool cut(TableCut& figures) const;
 
 private:
+    std::string libraryPath_;
     std::vector<std::string> sources_;
     bool cut_ = false;
     TableCut figures_;
 };
 
-// The lines that say a machine gave no table: a first line, the library's
-// lines indented, and the hint, which names the options that read a saved
-// table instead.
-std::vector<std::string> noTableLines(std::string const& libraryPath, MachineReport const& report,
+// What a person reads when this machine gave no table: "LIBRARY tried:" and
+// the library's lines, indented (nothing when it says nothing), then the
+// hint, which names the options that read a saved table instead.
+std::vector<std::string> noTableLines(MachineReport const& report,
                                       std::string const& savedTableOptions);
 
 }  // namespace smbiostool

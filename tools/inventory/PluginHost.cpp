@@ -110,6 +110,21 @@ bool PluginHost::makeExtraNodes(ExtraNodes const& extra, std::string& why) {
     return true;
 }
 
+bool PluginHost::acquiredEmptyTable() const {
+    if (interface_ == nullptr || !isLinkedSmBiosPlugin()) {
+        return false;
+    }
+    std::unique_ptr<IC::StructureGroups> const groups =
+        static_cast<IC::SmBiosMI*>(interface_)->groupAcquiredTable();
+    IC::TableLists const lists = groups->lists();
+    for (unsigned int type = 0; type < 256; ++type) {
+        if (!lists[type]->empty()) {
+            return false;
+        }
+    }
+    return true;
+}
+
 bool PluginHost::getNodes(std::vector<IC::Node*>& nodes, std::string& why) {
     IC::Error const mapped = interface_->getMap(nodes);
     if (mapped.getStatus() != 0) {

@@ -44,6 +44,10 @@ public:
     // Only for the linked SMBIOS plug-in, after initialize.
     bool makeExtraNodes(ExtraNodes const& extra, std::string& why);
     bool getNodes(std::vector<IC::Node*>& nodes, std::string& why);
+    // After initialize, whether the linked SMBIOS plug-in acquired a table
+    // without a single structure (from no source at all, or an empty one);
+    // false for any other plug-in, which the host cannot ask.
+    bool acquiredEmptyTable() const;
 
 private:
     std::string path_;
