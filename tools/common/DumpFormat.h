@@ -6,10 +6,6 @@
 // format/OverrideText.h; hex digits in format/Hex.h.
 #pragma once
 
-#include <cstdint>
-#include <string>
-#include <vector>
-
 #include "format/DumpBin.h"
 #include "format/EntryPoint.h"
 #include "format/Hex.h"
@@ -30,14 +26,5 @@ using smbiosformat::SM3_ENTRY_POINT_SIZE;
 using smbiosformat::SM_ENTRY_POINT_SIZE;
 using smbiosformat::TableStats;
 using smbiosformat::tableStats;
-
-// Reads an override file's text. Strict: besides the grammar in
-// format/OverrideText.h (blanks and line ends between tokens, any case),
-// anything else is refused: other characters, unknown or misplaced tags, an
-// odd number of hex digits in a run, an empty entry point or table, more
-// than one <SIZE> block, text after </SHOWSMBIOS>. Returns false and a
-// message naming the line on error.
-bool parseOverride(std::string const& text, std::vector<uint8_t>& header,
-                   std::vector<uint8_t>& table, std::string& error);
 
 }  // namespace smbiosdump
