@@ -253,8 +253,8 @@ public:
             return;
         }
         folder_ = pattern;
-        overrideDir_ = folder_ + "/SmBiosOverride";
-        overrideFile_ = overrideDir_ + "/smbios.txt";
+        overrideDir_ = folder_ + "/" + smbiosformat::OVERRIDE_FOLDER;
+        overrideFile_ = overrideDir_ + "/" + smbiosformat::OVERRIDE_FILE;
         mkdir(overrideDir_.c_str(), 0700);
         std::vector<uint8_t> const table(raw.begin(), raw.end());
         std::vector<uint8_t> const header = smbiosdump::makeSmEntryPoint(

@@ -5,16 +5,24 @@
 
 namespace smbiosformat {
 
-uint16_t getWord(std::vector<uint8_t> const& bytes, size_t offset) {
+uint16_t getWord(uint8_t const* bytes, size_t offset) {
     return static_cast<uint16_t>(bytes[offset] | (bytes[offset + 1] << 8));
 }
 
-uint32_t getDword(std::vector<uint8_t> const& bytes, size_t offset) {
+uint32_t getDword(uint8_t const* bytes, size_t offset) {
     uint32_t value = 0;
     for (size_t i = 0; i < 4; ++i) {
         value |= static_cast<uint32_t>(bytes[offset + i]) << (8 * i);
     }
     return value;
+}
+
+uint16_t getWord(std::vector<uint8_t> const& bytes, size_t offset) {
+    return getWord(bytes.data(), offset);
+}
+
+uint32_t getDword(std::vector<uint8_t> const& bytes, size_t offset) {
+    return getDword(bytes.data(), offset);
 }
 
 void putWord(std::vector<uint8_t>& bytes, size_t offset, uint16_t value) {

@@ -1,8 +1,9 @@
 // The SMBIOS formats at the ground floor, shared by the physical-memory
 // library, the tools, the examples and the tests: the entry points that
-// describe a table ("_SM_", the legacy "_DMI_", "_SM3_"), their little-endian
-// fields and checksums, and the walk of a structure table. It needs nothing
-// but the standard library.
+// describe a table ("_SM_", the legacy "_DMI_", "_SM3_"), where they are
+// searched for in physical memory, their little-endian fields and checksums,
+// and the walk of a structure table. It needs nothing but the standard
+// library.
 #pragma once
 
 #include <cstddef>
@@ -18,7 +19,19 @@ constexpr size_t DMI_ENTRY_POINT_SIZE = 0x0F;
 constexpr size_t SM3_ENTRY_POINT_SIZE = 0x18;
 constexpr uint32_t DUMP_BIN_TABLE_OFFSET = 0x20;
 
+// Where the entry points are looked for in physical memory: "_SM_" on
+// 16-byte boundaries of the BIOS area 0xF0000-0xFFFFF, else the legacy
+// "_DMI_" on 16-byte boundaries of the whole first megabyte (kept wider than
+// the BIOS area: old firmware that places it lower is still found).
+constexpr unsigned long SM_SEARCH_START = 0xF0000;
+constexpr unsigned long SM_SEARCH_END = 0xFFFFF;
+constexpr unsigned long DMI_SEARCH_START = 0x0;
+constexpr unsigned long DMI_SEARCH_END = 0xFFFFF;
+constexpr long SEARCH_STEP = 16;
+
 // Little-endian fields at offset; the caller keeps the field inside bytes.
+uint16_t getWord(uint8_t const* bytes, size_t offset);
+uint32_t getDword(uint8_t const* bytes, size_t offset);
 uint16_t getWord(std::vector<uint8_t> const& bytes, size_t offset);
 uint32_t getDword(std::vector<uint8_t> const& bytes, size_t offset);
 uint64_t getQword(std::vector<uint8_t> const& bytes, size_t offset);

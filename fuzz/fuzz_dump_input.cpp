@@ -3,7 +3,7 @@
 // through the library's five functions (the bytes repeat over the whole
 // address space, so that every search and read lands somewhere). Whatever a
 // reader accepts must come back unchanged from the override file written
-// for it.
+// for it, read with the plug-in's own grammar.
 #include <cstddef>
 #include <cstdint>
 #include <cstring>
@@ -11,6 +11,8 @@
 #include <vector>
 
 #include "DumpFormat.h"
+#include "PluginRead.h"
+#include "QNLog/QNLogger.h"
 #include "dump/DumpInput.h"
 
 namespace {
@@ -58,17 +60,21 @@ void checkRoundTrip(smbiosdump::Capture const& capture) {
     if (capture.header.empty() || capture.table.empty()) {
         __builtin_trap();
     }
-    std::vector<uint8_t> header;
-    std::vector<uint8_t> table;
-    std::string error;
-    if (!smbiosdump::parseOverride(smbiosdump::formatOverride(capture.header, capture.table),
-                                   header, table, error) ||
-        header != capture.header || table != capture.table) {
+    smbiosdump::PluginRead const back =
+        smbiosdump::readOverrideText(smbiosdump::formatOverride(capture.header, capture.table));
+    if (!back.ok() || back.header != capture.header || back.table != capture.table) {
         __builtin_trap();
     }
 }
 
 }  // namespace
+
+extern "C" int LLVMFuzzerInitialize(int*, char***) {
+    // The plug-in's reader logs every token it reads.
+    QNLog::QNLogger::setLogLevel(QNLog::LEVEL_OFF);
+    QNLog::QNLogger::setTraceLevel(QNLog::LEVEL_OFF);
+    return 0;
+}
 
 extern "C" int LLVMFuzzerTestOneInput(uint8_t const* data, size_t size) {
     std::vector<uint8_t> const bytes(data, data + size);

@@ -11,6 +11,7 @@
 
 #include "SD/RegularFile.h"
 #include "format/EntryPoint.h"
+#include "format/Hex.h"
 
 namespace pmem {
 
@@ -35,21 +36,14 @@ bool parseBase(std::string const& text, unsigned long& value) {
     }
     unsigned long result = 0;
     for (; pos < text.size(); ++pos) {
-        char const c = text[pos];
-        unsigned long digit = 0;
-        if (c >= '0' && c <= '9') {
-            digit = static_cast<unsigned long>(c - '0');
-        } else if (c >= 'a' && c <= 'f') {
-            digit = static_cast<unsigned long>(c - 'a' + 10);
-        } else if (c >= 'A' && c <= 'F') {
-            digit = static_cast<unsigned long>(c - 'A' + 10);
-        } else {
+        int const digit = smbiosformat::hexValue(text[pos]);
+        if (digit < 0) {
             return false;
         }
         if (result > (ULONG_MAX >> 4)) {
             return false;
         }
-        result = (result << 4) | digit;
+        result = (result << 4) | static_cast<unsigned long>(digit);
     }
     value = result;
     return true;

@@ -8,14 +8,15 @@
 #include <vector>
 
 #include "RegionMemory.h"
+#include "format/EntryPoint.h"
 
 namespace pmem {
 
 // Where the sysfs source presents the entry point: the start of the area
-// 0xF0000-0xFFFFF that readers search, which it presents whole (zero but
-// for the entry point), as firmware does.
-constexpr unsigned long kBiosAreaFirst = 0xF0000;
-constexpr unsigned long kBiosAreaSize = 0x10000;
+// 0xF0000-0xFFFFF that readers search for "_SM_", which it presents whole
+// (zero but for the entry point), as firmware does.
+constexpr unsigned long kBiosAreaFirst = smbiosformat::SM_SEARCH_START;
+constexpr unsigned long kBiosAreaSize = smbiosformat::SM_SEARCH_END - kBiosAreaFirst + 1;
 // Where it serves a table that cannot stay at the address its entry point
 // names: right above the first megabyte.
 constexpr unsigned long kMovedTableAddress = 0x100000;

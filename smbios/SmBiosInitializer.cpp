@@ -7,6 +7,9 @@
 #include <memory>
 #include <typeinfo>
 
+#include "format/EntryPoint.h"
+#include "format/Hex.h"
+#include "format/OverrideText.h"
 #include "smbios/Logging.h"
 #include "smbios/PMem.h"
 
@@ -32,13 +35,8 @@ unsigned int const DMI_TABLE_LENGTH = 0x06;
 unsigned int const DMI_TABLE_ADDRESS = 0x08;
 unsigned int const DMI_BCD_REVISION = 0x0E;
 
-// Physical-memory search areas: the "_SM_" anchor in the BIOS area, the
-// legacy "_DMI_" anchor anywhere in the first megabyte (kept wider than the
-// BIOS area: old firmware that places it lower is still found).
-unsigned long const SM_SEARCH_START = 0xF0000;
-unsigned long const DMI_SEARCH_START = 0x0;
-unsigned long const SEARCH_END = 0xFFFFF;
-long const SEARCH_STEP = 16;
+// The bytes read at a "_SM_" anchor; an entry point that states a greater
+// length fails its checksum.
 long const SM_READ_SIZE = 64;
 
 // The 8-bit sum of bytes[0, count) is zero.
@@ -50,24 +48,14 @@ bool checksumIsZero(unsigned char const* bytes, size_t count) {
     return (sum & 0xFF) == 0;
 }
 
-unsigned int word(unsigned char const* bytes, unsigned int off) {
-    return bytes[off] | (static_cast<unsigned int>(bytes[off + 1]) << 8);
-}
-
-unsigned long dword(unsigned char const* bytes, unsigned int off) {
-    return bytes[off] | (static_cast<unsigned long>(bytes[off + 1]) << 8) |
-           (static_cast<unsigned long>(bytes[off + 2]) << 16) |
-           (static_cast<unsigned long>(bytes[off + 3]) << 24);
-}
-
 }  // namespace
 
 SmBiosInitializer::SmBiosInitializer() : SmBios(SMBIOS_MI_INIT::_empty) {
     SMBIOS_DETAIL(loggerSmBiosInitializer, "Constructor (void) entry");
     try {
         static std::string const confdir = PlatformUtilities::getKestrelDataDir();
-        std::string const path =
-            confdir + "SmBiosOverride" + PlatformUtilities::getSeparator() + "smbios.txt";
+        std::string const path = confdir + smbiosformat::OVERRIDE_FOLDER +
+                                 PlatformUtilities::getSeparator() + smbiosformat::OVERRIDE_FILE;
         SMBIOS_DETAIL(loggerSmBiosInitializer,
                       "Constructor checking for " << path << " import smbios file");
         std::vector<std::string> head;
@@ -178,7 +166,9 @@ void SmBiosInitializer::acquireFromMemory() {
     unsigned char minor = 0;
     unsigned int tableLength = 0;
     unsigned long tableAddress = 0;
-    unsigned long const smAddress = pmem->search("_SM_", SM_SEARCH_START, SEARCH_END, SEARCH_STEP);
+    unsigned long const smAddress =
+        pmem->search("_SM_", smbiosformat::SM_SEARCH_START, smbiosformat::SM_SEARCH_END,
+                     smbiosformat::SEARCH_STEP);
     if (smAddress != 0) {
         SMBIOS_DETAIL(loggerSmBiosInitializer, "Constructor found _SM_ header at " << smAddress);
         unsigned char entry[SM_READ_SIZE] = {};
@@ -195,11 +185,12 @@ void SmBiosInitializer::acquireFromMemory() {
         }
         major = entry[SM_MAJOR];
         minor = entry[SM_MINOR];
-        tableLength = word(entry, SM_TABLE_LENGTH);
-        tableAddress = dword(entry, SM_TABLE_ADDRESS);
+        tableLength = smbiosformat::getWord(entry, SM_TABLE_LENGTH);
+        tableAddress = smbiosformat::getDword(entry, SM_TABLE_ADDRESS);
     } else {
         unsigned long const dmiAddress =
-            pmem->search("_DMI_", DMI_SEARCH_START, SEARCH_END, SEARCH_STEP);
+            pmem->search("_DMI_", smbiosformat::DMI_SEARCH_START, smbiosformat::DMI_SEARCH_END,
+                         smbiosformat::SEARCH_STEP);
         if (dmiAddress == 0) {
             pmem->close();
             SMBIOS_WARNING(loggerSmBiosInitializer, "Constructor _SM_ or _DMI_ signature failed");
@@ -220,8 +211,8 @@ void SmBiosInitializer::acquireFromMemory() {
         }
         major = static_cast<unsigned char>(entry[DMI_BCD_REVISION] >> 4);
         minor = static_cast<unsigned char>(entry[DMI_BCD_REVISION] & 0x0F);
-        tableLength = word(entry, DMI_TABLE_LENGTH);
-        tableAddress = dword(entry, DMI_TABLE_ADDRESS);
+        tableLength = smbiosformat::getWord(entry, DMI_TABLE_LENGTH);
+        tableAddress = smbiosformat::getDword(entry, DMI_TABLE_ADDRESS);
     }
     std::vector<unsigned char> raw(tableLength + 2u, 0);
     if (pmem->read(raw.data(), tableAddress, static_cast<long>(tableLength)) != 0) {
@@ -439,9 +430,8 @@ int readTables(std::vector<unsigned char>& bytes, std::vector<std::string> const
 size_t oddHexRun(std::vector<std::string> const& tables) {
     size_t odd = 0;
     walkTableRuns(tables, [&odd](std::string const& run) {
-        bool const allHex = std::all_of(run.begin(), run.end(), [](char c) {
-            return std::isxdigit(static_cast<unsigned char>(c)) != 0;
-        });
+        bool const allHex = std::all_of(run.begin(), run.end(),
+                                        [](char c) { return smbiosformat::hexValue(c) >= 0; });
         if (allHex && run.size() % 2 != 0) {
             odd = run.size();
         }
@@ -456,18 +446,13 @@ int byteHex(std::string const& text, std::vector<unsigned char>& bytes) {
     bool highNibble = true;
     for (size_t i = 0; i < text.size(); ++i) {
         char const c = text[i];
-        unsigned int value = 0;
-        if (c >= '0' && c <= '9') {
-            value = static_cast<unsigned int>(c - '0');
-        } else if (c >= 'a' && c <= 'f') {
-            value = static_cast<unsigned int>(c - 'a' + 10);
-        } else if (c >= 'A' && c <= 'F') {
-            value = static_cast<unsigned int>(c - 'A' + 10);
-        } else {
+        int const digit = smbiosformat::hexValue(c);
+        if (digit < 0) {
             SMBIOS_WARNING(loggerSmBiosInitializer,
                            "byteHex: Invalid hexadecimal digit " << c << " at offset " << i);
             return 32;
         }
+        unsigned int const value = static_cast<unsigned int>(digit);
         if (highNibble) {
             accumulator = (accumulator + value) * 16;
         } else {

@@ -104,17 +104,11 @@ bool parseLocation(std::string const& text, unsigned int& code) {
     }
     unsigned int value = 0;
     for (char c : digits) {
-        unsigned int digit = 0;
-        if (c >= '0' && c <= '9') {
-            digit = static_cast<unsigned int>(c - '0');
-        } else if (hex && c >= 'a' && c <= 'f') {
-            digit = static_cast<unsigned int>(c - 'a' + 10);
-        } else if (hex && c >= 'A' && c <= 'F') {
-            digit = static_cast<unsigned int>(c - 'A' + 10);
-        } else {
+        int const digit = smbiosformat::hexValue(c);
+        if (digit < 0 || (!hex && digit > 9)) {
             return false;
         }
-        value = value * (hex ? 16u : 10u) + digit;
+        value = value * (hex ? 16u : 10u) + static_cast<unsigned int>(digit);
         if (value > kLastLocation) {
             return false;
         }

@@ -31,6 +31,7 @@
 #include "BuilderFixture.h"
 #include "DumpFormat.h"
 #include "LogLevels.h"
+#include "PluginRead.h"
 #include "TreeSnapshot.h"
 #include "mi/BuilderSkeleton.h"
 #include "smbios/Logging.h"
@@ -56,21 +57,21 @@ struct SourceTable {
     Bytes table;
 };
 
-// The demo server's table, from the checked-in override dump.
+// The demo server's table, from the checked-in override dump, read as the
+// plug-in reads it.
 SourceTable demoTable() {
     char const* source = std::getenv("SMBIOS_SOURCE_DIR");
     if (source == nullptr || *source == '\0') {
         throw std::runtime_error("SMBIOS_SOURCE_DIR is not set");
     }
-    std::string const text =
-        smbiostest::fileText(std::string(source) + "/examples/demo-server.smbios.txt");
-    Bytes header;
-    SourceTable demo{"demo-server", {}};
-    std::string error;
-    if (!smbiosdump::parseOverride(text, header, demo.table, error)) {
-        throw std::runtime_error("the demo dump does not parse: " + error);
+    smbiosdump::PluginRead const read =
+        smbiosdump::readOverrideFile(std::string(source) + "/examples/demo-server.smbios.txt");
+    if (!read.ok()) {
+        throw std::runtime_error(
+            "the demo dump does not read: import " + std::to_string(read.imported) + ", header " +
+            std::to_string(read.head) + ", table " + std::to_string(read.tables));
     }
-    return demo;
+    return SourceTable{"demo-server", read.table};
 }
 
 // The table of one corpus dump.

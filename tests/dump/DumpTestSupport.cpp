@@ -13,7 +13,6 @@
 #include <nlohmann/json.hpp>
 
 #include "TestSupport.h"
-#include "smbios/SmBiosInitializer.h"
 
 namespace dumptest {
 
@@ -57,19 +56,6 @@ std::vector<std::string> temporaryFilesOf(std::string const& folder, std::string
 
 std::string fakePMem(std::string const& variant) {
     return hosttest::outDir() + "/" + DUMP_FAKE_PMEM_FROM_OUT + "/" + variant + "/libpmem.so";
-}
-
-ReadBack readBackThroughPlugin(std::string const& path) {
-    ReadBack result;
-    std::vector<std::string> head;
-    std::vector<std::string> tables;
-    result.imported = SD::importSmBios(path, head, tables);
-    if (result.imported != 0) {
-        return result;
-    }
-    result.head = SD::readHead(result.header, head);
-    result.tables = SD::readTables(result.table, tables);
-    return result;
 }
 
 bool exists(std::string const& path) {

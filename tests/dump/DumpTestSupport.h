@@ -10,6 +10,7 @@
 #include <vector>
 
 #include "HostRunner.h"
+#include "PluginRead.h"
 #include "TestSupport.h"
 
 namespace dumptest {
@@ -43,16 +44,10 @@ std::string fakePMem(std::string const& variant);
 
 // An override dump file read the way the plug-in reads it: importSmBios,
 // then readHead and readTables (each result 0 on success).
-struct ReadBack {
-    int imported = -1;
-    int head = -1;
-    int tables = -1;
-    std::vector<unsigned char> header;
-    std::vector<unsigned char> table;
-
-    bool ok() const { return imported == 0 && head == 0 && tables == 0; }
-};
-ReadBack readBackThroughPlugin(std::string const& path);
+using ReadBack = smbiosdump::PluginRead;
+inline ReadBack readBackThroughPlugin(std::string const& path) {
+    return smbiosdump::readOverrideFile(path);
+}
 
 // The names in a folder (without "." and ".."), sorted.
 using smbiostest::folderEntries;

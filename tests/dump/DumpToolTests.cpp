@@ -13,6 +13,7 @@
 #include "DumpFormat.h"
 #include "DumpTestSupport.h"
 #include "HostRunner.h"
+#include "PluginRead.h"
 #include "TestSupport.h"
 
 using dumptest::Bytes;
@@ -111,12 +112,10 @@ TEST(DumpTool, DashWritesToStandardOutput) {
     RunResult const run = runDump({"--from-table", input.path(), "--version", "2.7", "-o", "-"});
     ASSERT_EQ(run.exitStatus, 0) << describe(run);
     Bytes const table = dumptest::sampleTable();
-    Bytes header;
-    Bytes parsedTable;
-    std::string error;
-    ASSERT_TRUE(smbiosdump::parseOverride(run.out, header, parsedTable, error)) << error;
-    EXPECT_EQ(parsedTable, table);
-    EXPECT_EQ(run.out, smbiosdump::formatOverride(header, table));
+    smbiosdump::PluginRead const back = smbiosdump::readOverrideText(run.out);
+    ASSERT_TRUE(back.ok()) << back.imported << " " << back.head << " " << back.tables;
+    EXPECT_EQ(back.table, table);
+    EXPECT_EQ(run.out, smbiosdump::formatOverride(back.header, table));
     EXPECT_EQ(run.err, wroteLine("standard output"));
     EXPECT_EQ(dumptest::folderEntries(input.dir.path()), (std::vector<std::string>{"table.bin"}));
 }

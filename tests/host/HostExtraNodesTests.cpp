@@ -12,6 +12,7 @@
 #include "DumpFormat.h"
 #include "HostRunner.h"
 #include "InventoryJson.h"
+#include "PluginRead.h"
 #include "TestSupport.h"
 
 namespace {
@@ -267,11 +268,10 @@ TEST_F(HostExtraNodes, FromBinOfTheDemoTableGivesTheDemoInventory) {
     // The example's entry point and table laid out as dmidecode --dump-bin
     // does: the entry point at 0 with its table address set to 0x20 (and
     // its checksums set again), the table from 0x20.
-    std::vector<uint8_t> header;
-    std::vector<uint8_t> table;
-    std::string error;
-    ASSERT_TRUE(smbiosdump::parseOverride(smbiostest::fileText(demoDump()), header, table, error))
-        << error;
+    smbiosdump::PluginRead const demo = smbiosdump::readOverrideFile(demoDump());
+    ASSERT_TRUE(demo.ok()) << demo.imported << " " << demo.head << " " << demo.tables;
+    std::vector<uint8_t> const& header = demo.header;
+    std::vector<uint8_t> const& table = demo.table;
     ASSERT_EQ(header.size(), smbiosdump::SM_ENTRY_POINT_SIZE);
     uint16_t const structureCount = static_cast<uint16_t>(header[0x1C] | header[0x1D] << 8);
     uint16_t const maxSize = static_cast<uint16_t>(header[0x08] | header[0x09] << 8);

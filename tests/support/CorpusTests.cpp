@@ -11,6 +11,7 @@
 #include <vector>
 
 #include "DumpFormat.h"
+#include "PluginRead.h"
 #include "TestSupport.h"
 
 namespace {
@@ -134,12 +135,10 @@ TEST(CorpusDumps, EveryDumpSurvivesOverrideRoundTrip) {
         ASSERT_TRUE(smbiosdump::readDumpBin(
             smbiostest::fileBytes(smbiostest::corpusDir() + "/" + name + ".bin"), image, error))
             << error;
-        std::vector<uint8_t> header;
-        std::vector<uint8_t> table;
-        ASSERT_TRUE(smbiosdump::parseOverride(smbiosdump::formatOverride(image.header, image.table),
-                                              header, table, error))
-            << error;
-        EXPECT_EQ(header, image.header);
-        EXPECT_EQ(table, image.table);
+        smbiosdump::PluginRead const back =
+            smbiosdump::readOverrideText(smbiosdump::formatOverride(image.header, image.table));
+        ASSERT_TRUE(back.ok()) << back.imported << " " << back.head << " " << back.tables;
+        EXPECT_EQ(back.header, image.header);
+        EXPECT_EQ(back.table, image.table);
     }
 }

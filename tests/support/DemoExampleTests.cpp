@@ -13,6 +13,7 @@
 #include <vector>
 
 #include "DumpFormat.h"
+#include "PluginRead.h"
 #include "TestSupport.h"
 
 extern char** environ;
@@ -149,13 +150,10 @@ TEST(DemoExample, GeneratorWithoutOutputArgumentFails) {
 
 TEST(DemoExample, CheckedInFileIsConsistentSmbios27Dump) {
     ASSERT_FALSE(envPath("SMBIOS_SOURCE_DIR").empty()) << "SMBIOS_SOURCE_DIR is not set";
-    std::vector<uint8_t> const bytes = smbiostest::fileBytes(checkedInPath());
-    std::vector<uint8_t> header;
-    std::vector<uint8_t> table;
-    std::string error;
-    ASSERT_TRUE(
-        smbiosdump::parseOverride(std::string(bytes.begin(), bytes.end()), header, table, error))
-        << error;
+    smbiosdump::PluginRead const back = smbiosdump::readOverrideFile(checkedInPath());
+    ASSERT_TRUE(back.ok()) << back.imported << " " << back.head << " " << back.tables;
+    std::vector<uint8_t> const& header = back.header;
+    std::vector<uint8_t> const& table = back.table;
     ASSERT_EQ(header.size(), 31u);
     uint8_t total = 0;
     for (uint8_t b : header) {

@@ -1,30 +1,31 @@
 #include <gtest/gtest.h>
 
+#include <cerrno>
 #include <cstdint>
 #include <random>
 #include <string>
 #include <vector>
 
 #include "DumpFormat.h"
+#include "PluginRead.h"
 #include "TableBuilder.h"
+#include "TestSupport.h"
 
 using smbiosdump::formatOverride;
-using smbiosdump::parseOverride;
+using smbiosdump::PluginRead;
+using smbiosdump::readOverrideFile;
+using smbiosdump::readOverrideText;
 using smbiostest::Structure;
 using smbiostest::TableBuilder;
 
 namespace {
 
-// Parses `text`, expecting a refusal whose message contains `what`; the
-// outputs stay untouched.
-void expectRefused(std::string const& text, std::string const& what) {
-    std::vector<uint8_t> header = {0x01};
-    std::vector<uint8_t> table = {0x02};
-    std::string error;
-    EXPECT_FALSE(parseOverride(text, header, table, error)) << text;
-    EXPECT_NE(error.find(what), std::string::npos) << "message: " << error << "\ntext:\n" << text;
-    EXPECT_EQ(header, std::vector<uint8_t>{0x01});
-    EXPECT_EQ(table, std::vector<uint8_t>{0x02});
+typedef std::vector<uint8_t> Bytes;
+
+// The codes of the import, the header and the table section, for messages.
+std::string codes(PluginRead const& read) {
+    return "import " + std::to_string(read.imported) + ", header " + std::to_string(read.head) +
+           ", table " + std::to_string(read.tables);
 }
 
 std::string const GOOD_HEAD = "<SHOWSMBIOS>\n<EPHEADER>\nAABB\n</EPHEADER>\n";
@@ -65,7 +66,13 @@ TEST(FormatOverride, ZeroBytesPerLinePutsTableOnOneLine) {
               "</SHOWSMBIOS>\n");
 }
 
-TEST(ParseOverride, ReadsBlanksMixedCaseAndRunsSpanningLines) {
+// ---------------------------------------------------------------------------
+// Override text read as the plug-in reads it, in the shapes an edited or
+// damaged file may take: the import, header and table codes say what the
+// plug-in does with each (8: it reads the machine's own table instead; any
+// other failure: an empty table).
+
+TEST(PluginReadOfText, ReadsBlanksMixedCaseAndRunsSpanningLines) {
     std::string const text =
         "  <showsmbios>\n"
         "< EPHeader >\n"
@@ -77,86 +84,165 @@ TEST(ParseOverride, ReadsBlanksMixedCaseAndRunsSpanningLines) {
         "</SIZE>\n"
         "0b0C\n"
         "  </ShowSmbios >  \n";
-    std::vector<uint8_t> header;
-    std::vector<uint8_t> table;
-    std::string error;
-    ASSERT_TRUE(parseOverride(text, header, table, error)) << error;
-    EXPECT_EQ(header, (std::vector<uint8_t>{0x5F, 0x53, 0x4D, 0x5F}));
-    EXPECT_EQ(table, (std::vector<uint8_t>{0x00, 0x0A, 0x0B, 0x0C}));
+    PluginRead const read = readOverrideText(text);
+    ASSERT_TRUE(read.ok()) << codes(read);
+    EXPECT_EQ(read.header, (Bytes{0x5F, 0x53, 0x4D, 0x5F}));
+    EXPECT_EQ(read.table, (Bytes{0x00, 0x0A, 0x0B, 0x0C}));
 }
 
-TEST(ParseOverride, SizeBlockIsOptionalAndItsContentIgnored) {
-    std::vector<uint8_t> header;
-    std::vector<uint8_t> table;
-    std::string error;
-    ASSERT_TRUE(parseOverride(GOOD_HEAD + "0102\n</SHOWSMBIOS>", header, table, error)) << error;
-    EXPECT_EQ(table, (std::vector<uint8_t>{0x01, 0x02}));
-    ASSERT_TRUE(parseOverride(GOOD_HEAD + "<SIZE>not a number: xyz\n</SIZE>03\n</SHOWSMBIOS>",
-                              header, table, error))
-        << error;
-    EXPECT_EQ(header, (std::vector<uint8_t>{0xAA, 0xBB}));
-    EXPECT_EQ(table, (std::vector<uint8_t>{0x03}));
+TEST(PluginReadOfText, SizeBlockIsOptionalAndItsContentIgnored) {
+    PluginRead const without = readOverrideText(GOOD_HEAD + "0102\n</SHOWSMBIOS>");
+    ASSERT_TRUE(without.ok()) << codes(without);
+    EXPECT_EQ(without.table, (Bytes{0x01, 0x02}));
+    PluginRead const notNumber =
+        readOverrideText(GOOD_HEAD + "<SIZE>not a number: xyz\n</SIZE>03\n</SHOWSMBIOS>");
+    ASSERT_TRUE(notNumber.ok()) << codes(notNumber);
+    EXPECT_EQ(notNumber.header, (Bytes{0xAA, 0xBB}));
+    EXPECT_EQ(notNumber.table, (Bytes{0x03}));
 }
 
-TEST(ParseOverride, RefusesMissingStartTag) {
-    expectRefused("", "expected <SHOWSMBIOS>, found the end of the file");
-    expectRefused("00<SHOWSMBIOS>", "expected <SHOWSMBIOS>, found a data run");
-    expectRefused("<EPHEADER>", "expected <SHOWSMBIOS>, found <EPHEADER>");
+TEST(PluginReadOfText, SecondSizeBlockIsSkippedLikeTheFirst) {
+    PluginRead const read =
+        readOverrideText(GOOD_HEAD + "<SIZE>1</SIZE>01<SIZE>1</SIZE>02</SHOWSMBIOS>");
+    ASSERT_TRUE(read.ok()) << codes(read);
+    EXPECT_EQ(read.table, (Bytes{0x01, 0x02}));
 }
 
-TEST(ParseOverride, RefusesMissingEndTag) {
-    expectRefused(GOOD_HEAD + "0102\n", "ends without </SHOWSMBIOS>");
+TEST(PluginReadOfText, TextWithoutEndOfHeaderIsNotImported) {
+    // Import code 8: the plug-in reads the machine's own table instead.
+    for (std::string const& text : {std::string("00<SHOWSMBIOS>"), std::string("<EPHEADER>"),
+                                    std::string("<SHOWSMBIOS>\n<EPHEADER>\nAA\n<SIZE>\n"),
+                                    std::string("<SHOWSMBIOS\n>"), std::string("<SHOW<SMBIOS>")}) {
+        PluginRead const read = readOverrideText(text);
+        EXPECT_EQ(read.imported, 8) << text;
+        EXPECT_EQ(read.head, -1) << text;
+    }
 }
 
-TEST(ParseOverride, RefusesAnythingAfterEndTag) {
-    expectRefused(GOOD_HEAD + "0102\n</SHOWSMBIOS>\n03\n", "a data run after </SHOWSMBIOS>");
-    expectRefused(GOOD_HEAD + "0102\n</SHOWSMBIOS><SHOWSMBIOS>", "after </SHOWSMBIOS>");
+TEST(PluginReadOfText, NothingReadAfterTheHeaderIsNotImported) {
+    // The table's run reaches the end of the text without a tag after it,
+    // so the tokenizer never delivers it.
+    PluginRead const read = readOverrideText(GOOD_HEAD + "0102\n");
+    EXPECT_EQ(read.imported, 8);
+    EXPECT_EQ(read.head, -1);
 }
 
-TEST(ParseOverride, RefusesOddNumberOfHexDigits) {
-    expectRefused(GOOD_HEAD + "010\n</SHOWSMBIOS>\n", "line 5: data run has an odd number");
-    expectRefused("<SHOWSMBIOS><EPHEADER>ABC</EPHEADER>01</SHOWSMBIOS>", "odd number");
+TEST(PluginReadOfText, MissingOrWrongStartTagIsHead4) {
+    for (std::string const& start : {std::string(""), std::string("00")}) {
+        PluginRead const read =
+            readOverrideText(start + "<EPHEADER>\nAABB\n</EPHEADER>\n01\n</SHOWSMBIOS>\n");
+        EXPECT_EQ(read.imported, 0) << start;
+        EXPECT_EQ(read.head, 4) << start;
+        EXPECT_TRUE(read.header.empty()) << start;
+        EXPECT_EQ(read.tables, 0) << start;
+    }
 }
 
-TEST(ParseOverride, RefusesForeignCharacters) {
-    expectRefused(GOOD_HEAD + "01G2\n</SHOWSMBIOS>\n", "line 5: unexpected character 'G'");
-    expectRefused(GOOD_HEAD + "01\t02\n</SHOWSMBIOS>\n", "unexpected character 0x09");
-    expectRefused(GOOD_HEAD + "0102\r\n</SHOWSMBIOS>\n", "unexpected character 0x0D");
-    expectRefused(GOOD_HEAD + "x\n</SHOWSMBIOS>\n", "unexpected character 'x'");
+TEST(PluginReadOfText, EmptyEntryPointIsHead12) {
+    PluginRead const read =
+        readOverrideText("<SHOWSMBIOS>\n<EPHEADER>\n</EPHEADER>\n01\n</SHOWSMBIOS>\n");
+    EXPECT_EQ(read.imported, 0);
+    EXPECT_EQ(read.head, 12);
+    EXPECT_TRUE(read.header.empty());
 }
 
-TEST(ParseOverride, RefusesUnknownOrMisplacedTags) {
-    expectRefused(GOOD_HEAD + "01\n<FOO>\n</SHOWSMBIOS>\n", "unexpected tag <FOO>");
-    expectRefused(GOOD_HEAD + "01\n<EPHEADER>\n</SHOWSMBIOS>\n", "unexpected tag <EPHEADER>");
-    expectRefused(GOOD_HEAD + "01\n</SIZE>\n</SHOWSMBIOS>\n", "unexpected tag </SIZE>");
-    expectRefused("<SHOWSMBIOS>\n<EPHEADER>\nAA\n<SIZE>\n", "expected </EPHEADER>, found <SIZE>");
+TEST(PluginReadOfText, OddEntryPointIsHead16) {
+    PluginRead const read = readOverrideText("<SHOWSMBIOS><EPHEADER>ABC</EPHEADER>01</SHOWSMBIOS>");
+    EXPECT_EQ(read.imported, 0);
+    EXPECT_EQ(read.head, 16);
+    EXPECT_TRUE(read.header.empty());
+    EXPECT_EQ(read.tables, 0);
+    EXPECT_EQ(read.table, (Bytes{0x01}));
 }
 
-TEST(ParseOverride, RefusesEmptyEntryPoint) {
-    expectRefused("<SHOWSMBIOS>\n<EPHEADER>\n</EPHEADER>\n01\n</SHOWSMBIOS>\n",
-                  "expected the entry point's bytes, found </EPHEADER>");
+TEST(PluginReadOfText, UnclosedEndTagIsTables55) {
+    PluginRead const read = readOverrideText(GOOD_HEAD + "01</SHOWSMBIOS");
+    EXPECT_EQ(read.imported, 0);
+    EXPECT_EQ(read.head, 0);
+    EXPECT_EQ(read.tables, 55);
+    EXPECT_EQ(read.table, (Bytes{0x01}));
 }
 
-TEST(ParseOverride, RefusesEmptyTable) {
-    expectRefused(GOOD_HEAD + "<SIZE>0</SIZE>\n</SHOWSMBIOS>\n", "the table section holds no data");
+TEST(PluginReadOfText, UnclosedSizeBlockIsTables55) {
+    PluginRead const read = readOverrideText(GOOD_HEAD + "01<SIZE>1\n</SHOWSMBIOS>");
+    EXPECT_EQ(read.imported, 0);
+    EXPECT_EQ(read.tables, 55);
+    EXPECT_EQ(read.table, (Bytes{0x01}));
 }
 
-TEST(ParseOverride, RefusesSecondSizeBlock) {
-    expectRefused(GOOD_HEAD + "<SIZE>1</SIZE>01<SIZE>1</SIZE></SHOWSMBIOS>",
-                  "a second <SIZE> block");
+TEST(PluginReadOfText, TextAfterTheEndTagIsIgnored) {
+    for (std::string const& after : {std::string("\n03\n"), std::string("<SHOWSMBIOS>")}) {
+        PluginRead const read = readOverrideText(GOOD_HEAD + "0102\n</SHOWSMBIOS>" + after);
+        ASSERT_TRUE(read.ok()) << codes(read) << " after " << after;
+        EXPECT_EQ(read.table, (Bytes{0x01, 0x02})) << after;
+    }
 }
 
-TEST(ParseOverride, RefusesUnclosedSizeBlock) {
-    expectRefused(GOOD_HEAD + "01<SIZE>1\n</SHOWSMBIOS>", "expected </SIZE>, found </SHOWSMBIOS>");
+TEST(PluginReadOfText, OddRunPairsItsDigitsFromItsStart) {
+    // The last digit is dropped; a digit missing in the middle shifts every
+    // byte after it.
+    PluginRead const last = readOverrideText(GOOD_HEAD + "010\n</SHOWSMBIOS>\n");
+    ASSERT_TRUE(last.ok()) << codes(last);
+    EXPECT_EQ(last.table, (Bytes{0x01}));
+    PluginRead const middle = readOverrideText(GOOD_HEAD + "0102 3 0405\n</SHOWSMBIOS>\n");
+    ASSERT_TRUE(middle.ok()) << codes(middle);
+    EXPECT_EQ(middle.table, (Bytes{0x01, 0x02, 0x30, 0x40}));
 }
 
-TEST(ParseOverride, RefusesUnclosedTags) {
-    expectRefused("<SHOWSMBIOS\n>", "line 1: tag not closed on its line");
-    expectRefused(GOOD_HEAD + "01</SHOWSMBIOS", "tag not closed at the end of the file");
-    expectRefused("<SHOW<SMBIOS>", "'<' inside a tag");
+TEST(PluginReadOfText, ForeignCharacterInTheTableIsTables55) {
+    struct Case {
+        std::string run;
+        Bytes before;  // what was decoded before the character
+    };
+    for (Case const& c : {Case{"01G2", {0x01}}, Case{"01\t02", {0x01}}, Case{"x", {}}}) {
+        PluginRead const read = readOverrideText(GOOD_HEAD + c.run + "\n</SHOWSMBIOS>\n");
+        EXPECT_EQ(read.imported, 0) << c.run;
+        EXPECT_EQ(read.head, 0) << c.run;
+        EXPECT_EQ(read.tables, 55) << c.run;
+        EXPECT_EQ(read.table, c.before) << c.run;
+    }
 }
 
-TEST(OverrideRoundTrip, RandomTablesSurviveFormatAndParse) {
+TEST(PluginReadOfText, CarriageReturnsAreLineEnds) {
+    PluginRead const read = readOverrideText(GOOD_HEAD + "0102\r\n</SHOWSMBIOS>\r\n");
+    ASSERT_TRUE(read.ok()) << codes(read);
+    EXPECT_EQ(read.table, (Bytes{0x01, 0x02}));
+}
+
+TEST(PluginReadOfText, UnknownOrMisplacedTagsInTheTableAreSkipped) {
+    for (std::string const& tag :
+         {std::string("<FOO>"), std::string("<EPHEADER>"), std::string("</SIZE>")}) {
+        PluginRead const read = readOverrideText(GOOD_HEAD + "01\n" + tag + "\n02</SHOWSMBIOS>\n");
+        ASSERT_TRUE(read.ok()) << codes(read) << " with " << tag;
+        EXPECT_EQ(read.table, (Bytes{0x01, 0x02})) << tag;
+    }
+}
+
+TEST(PluginReadOfText, EmptyTableSectionReadsAsNoBytes) {
+    PluginRead const read = readOverrideText(GOOD_HEAD + "<SIZE>0</SIZE>\n</SHOWSMBIOS>\n");
+    ASSERT_TRUE(read.ok()) << codes(read);
+    EXPECT_EQ(read.header, (Bytes{0xAA, 0xBB}));
+    EXPECT_TRUE(read.table.empty());
+}
+
+TEST(PluginReadOfText, TemporaryFileIsRemoved) {
+    smbiostest::TempDir tmp;
+    smbiostest::ScopedEnv env("TMPDIR", tmp.path());
+    PluginRead const read = readOverrideText(GOOD_HEAD + "01\n</SHOWSMBIOS>\n");
+    ASSERT_TRUE(read.ok()) << codes(read);
+    EXPECT_TRUE(smbiostest::folderEntries(tmp.path()).empty());
+}
+
+TEST(PluginReadOfFile, MissingFileGivesTheOpenCodeAndDecodesNothing) {
+    smbiostest::TempDir dir;
+    PluginRead const read = readOverrideFile(dir.file("absent.txt"));
+    EXPECT_EQ(read.imported, ENOENT);
+    EXPECT_EQ(read.head, -1);
+    EXPECT_EQ(read.tables, -1);
+    EXPECT_FALSE(read.ok());
+}
+
+TEST(OverrideRoundTrip, RandomTablesSurviveFormatAndPluginRead) {
     std::mt19937 random(20240611u);
     auto below = [&random](uint32_t n) { return static_cast<uint32_t>(random() % n); };
     for (int round = 0; round < 200; ++round) {
@@ -195,12 +281,10 @@ TEST(OverrideRoundTrip, RandomTablesSurviveFormatAndParse) {
         }
         size_t const bytesPerLine = round % 3 == 0 ? 32 : below(80);
         std::string const text = formatOverride(header, table, bytesPerLine);
-        std::vector<uint8_t> readHeader;
-        std::vector<uint8_t> readTable;
-        std::string error;
-        ASSERT_TRUE(parseOverride(text, readHeader, readTable, error)) << error;
-        EXPECT_EQ(readHeader, header);
-        EXPECT_EQ(readTable, table);
-        EXPECT_EQ(smbiosdump::tableStats(readTable).count, structures + 1);
+        PluginRead const read = readOverrideText(text);
+        ASSERT_TRUE(read.ok()) << codes(read);
+        EXPECT_EQ(read.header, header);
+        EXPECT_EQ(read.table, table);
+        EXPECT_EQ(smbiosdump::tableStats(read.table).count, structures + 1);
     }
 }

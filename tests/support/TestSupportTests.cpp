@@ -7,6 +7,7 @@
 #include <vector>
 
 #include "DumpFormat.h"
+#include "PluginRead.h"
 #include "QNLog/QNLogger.h"
 #include "QNLog/QNMessageBuffer.h"
 #include "TestSupport.h"
@@ -150,12 +151,10 @@ TEST(WriteOverrideDir, WritesParsableSmbiosTxtInSmBiosOverride) {
         std::vector<uint8_t> const bytes = smbiostest::fileBytes(path);
         std::string const text(bytes.begin(), bytes.end());
         EXPECT_EQ(text, smbiosdump::formatOverride(header, table));
-        std::vector<uint8_t> readHeader;
-        std::vector<uint8_t> readTable;
-        std::string error;
-        ASSERT_TRUE(smbiosdump::parseOverride(text, readHeader, readTable, error)) << error;
-        EXPECT_EQ(readHeader, header);
-        EXPECT_EQ(readTable, table);
+        smbiosdump::PluginRead const back = smbiosdump::readOverrideFile(path);
+        ASSERT_TRUE(back.ok()) << back.imported << " " << back.head << " " << back.tables;
+        EXPECT_EQ(back.header, header);
+        EXPECT_EQ(back.table, table);
     }
 }
 

@@ -15,6 +15,7 @@
 #include <vector>
 
 #include "ToolSupport.h"
+#include "format/EntryPoint.h"
 #include "pmem/PMemContract.h"
 
 namespace smbiosdump {
@@ -52,11 +53,11 @@ using PMemFunctions = pmem::Functions;
 // Where the entry points are looked for in physical memory: "_SM_" on
 // 16-byte boundaries of the BIOS area, else the legacy "_DMI_" anywhere in
 // the first megabyte, as the plug-in itself searches.
-constexpr unsigned long SM_SEARCH_START = 0xF0000;
-constexpr unsigned long SM_SEARCH_END = 0xFFFFF;
-constexpr unsigned long DMI_SEARCH_START = 0x0;
-constexpr unsigned long DMI_SEARCH_END = 0xFFFFF;
-constexpr long SEARCH_STEP = 16;
+using smbiosformat::DMI_SEARCH_END;
+using smbiosformat::DMI_SEARCH_START;
+using smbiosformat::SEARCH_STEP;
+using smbiosformat::SM_SEARCH_END;
+using smbiosformat::SM_SEARCH_START;
 
 // Reads the entry point and the table through the library's functions:
 // checks that it initialized, opens, searches, reads, closes. Any function

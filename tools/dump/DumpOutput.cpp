@@ -124,11 +124,11 @@ std::string dataDirectory(std::string const& option) {
 }
 
 std::string overrideFolder(std::string const& dataDir) {
-    return withSeparator(dataDir) + "SmBiosOverride";
+    return withSeparator(dataDir) + smbiosformat::OVERRIDE_FOLDER;
 }
 
 std::string overridePath(std::string const& dataDir) {
-    return overrideFolder(dataDir) + "/smbios.txt";
+    return overrideFolder(dataDir) + "/" + smbiosformat::OVERRIDE_FILE;
 }
 
 bool makeOverrideFolder(std::string const& dataDir, std::string& error) {

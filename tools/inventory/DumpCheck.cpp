@@ -47,15 +47,12 @@ std::string importFailure(std::vector<std::string> const& head, std::string cons
 // The structure count that the entry point announces; false when it is
 // neither a "_SM_" nor a "_DMI_" entry point long enough to hold one.
 bool announcedCount(std::vector<unsigned char> const& header, unsigned int& count) {
-    auto word = [&header](size_t offset) {
-        return static_cast<unsigned int>(header[offset] | (header[offset + 1] << 8));
-    };
     if (header.size() >= SM_STRUCTURE_COUNT + 2 && std::memcmp(header.data(), "_SM_", 4) == 0) {
-        count = word(SM_STRUCTURE_COUNT);
+        count = smbiosdump::getWord(header, SM_STRUCTURE_COUNT);
         return true;
     }
     if (header.size() >= DMI_STRUCTURE_COUNT + 2 && std::memcmp(header.data(), "_DMI_", 5) == 0) {
-        count = word(DMI_STRUCTURE_COUNT);
+        count = smbiosdump::getWord(header, DMI_STRUCTURE_COUNT);
         return true;
     }
     return false;

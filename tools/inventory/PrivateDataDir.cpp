@@ -10,6 +10,8 @@
 #include <fstream>
 #include <vector>
 
+#include "format/OverrideText.h"
+
 namespace inventory {
 
 namespace {
@@ -131,13 +133,13 @@ bool PrivateDataDir::create(std::string const& content, std::string& why) {
     if (path_.empty()) {
         return false;
     }
-    std::string const overrideDir = path_ + "/SmBiosOverride";
+    std::string const overrideDir = path_ + "/" + smbiosformat::OVERRIDE_FOLDER;
     std::error_code error;
     if (!std::filesystem::create_directory(overrideDir, error)) {
         why = "cannot create " + overrideDir + ": " + error.message();
         return false;
     }
-    overrideFile_ = overrideDir + "/smbios.txt";
+    overrideFile_ = overrideDir + "/" + smbiosformat::OVERRIDE_FILE;
     removeOnEndSignals(path_, overrideDir, overrideFile_);
     return writeWholeFile(overrideFile_, content, why);
 }
