@@ -116,19 +116,29 @@ bool readSm3(std::vector<uint8_t> const& file, DumpImage& image, std::string& er
     }
     // The maximum size is an upper bound: take what the file holds of it.
     uint64_t const tableSize = std::min(maxSize, size - address);
-    if (tableSize > 0xFFFF) {
-        error = "SMBIOS 3.x table of " + std::to_string(tableSize) +
-                " bytes does not fit a 2.x entry point";
-        return false;
-    }
     if (!cutTable(file, address, tableSize, image.table, error)) {
         return false;
+    }
+    if (image.table.size() > MAX_2X_TABLE_LENGTH) {
+        // A 2.x entry point states at most 65535 bytes: keep the whole
+        // structures of the table's start that fit, and say what was left.
+        TablePrefix const prefix = wholeStructuresWithin(image.table, MAX_2X_TABLE_LENGTH);
+        if (prefix.bytes == 0) {
+            error = "SMBIOS 3.x table of " + std::to_string(image.table.size()) +
+                    " bytes has no whole structure in its first 65535 bytes";
+            return false;
+        }
+        image.cut = true;
+        image.wholeTableBytes = image.table.size();
+        image.wholeTableStructures = tableStats(image.table).count;
+        image.table.resize(prefix.bytes);
     }
     image.major = file[7];
     image.minor = file[8];
     TableStats const stats = tableStats(image.table);
-    image.header = makeSmEntryPoint(image.major, image.minor, static_cast<uint16_t>(tableSize),
-                                    DUMP_BIN_TABLE_OFFSET, stats.count, stats.maxSize);
+    image.header =
+        makeSmEntryPoint(image.major, image.minor, static_cast<uint16_t>(image.table.size()),
+                         DUMP_BIN_TABLE_OFFSET, stats.count, stats.maxSize);
     return true;
 }
 

@@ -260,6 +260,12 @@ int captureFromFile(CommandLine const& line, smbiosdump::Capture& capture) {
         complain(path + ": " + error);
         return smbiostool::EXIT_FAILED;
     }
+    if (capture.cut) {
+        complain(smbiostool::cutWarning(
+            "the SMBIOS table in " + path,
+            smbiostool::imageCut(capture.wholeTableBytes, capture.wholeTableStructures,
+                                 capture.table)));
+    }
     return 0;
 }
 

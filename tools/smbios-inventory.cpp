@@ -306,6 +306,11 @@ bool readDumpContent(Options const& options, std::string& content) {
         complain("--from-bin: " + options.binFile + ": " + why);
         return false;
     }
+    if (image.cut) {
+        complain(smbiostool::cutWarning(
+            "the SMBIOS table in " + options.binFile,
+            smbiostool::imageCut(image.wholeTableBytes, image.wholeTableStructures, image.table)));
+    }
     content = smbiosdump::formatOverride(image.header, image.table);
     return true;
 }

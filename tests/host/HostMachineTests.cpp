@@ -244,3 +244,56 @@ TEST(HostOnThisMachine, PluginLogIsWrittenOnlyWhenAsked) {
     EXPECT_NE(asked.err.find("initialize entry"), std::string::npos) << hosttest::describe(asked);
     EXPECT_EQ(asked.out, quiet.out) << "the log never changes the inventory";
 }
+
+namespace {
+
+// A dmidecode --dump-bin image of a 3.x table: the "_SM3_" entry point at 0
+// naming the table at 0x20.
+std::vector<uint8_t> dumpBin3(std::vector<uint8_t> const& table) {
+    std::vector<uint8_t> file(0x20, 0);
+    std::copy_n("_SM3_", 5, file.begin());
+    file[6] = 0x18;
+    file[7] = 3;
+    file[8] = 2;
+    file[0x0A] = 1;
+    uint32_t const size = static_cast<uint32_t>(table.size());
+    for (int i = 0; i < 4; ++i) {
+        file[0x0C + i] = static_cast<uint8_t>(size >> (8 * i));
+    }
+    file[0x10] = 0x20;
+    file.insert(file.end(), table.begin(), table.end());
+    return file;
+}
+
+}  // namespace
+
+// --from-bin of a large 3.x table takes the structures of its first 65535
+// bytes and names the file in the warning.
+TEST(HostOnThisMachine, FromBinOfALargeTableIsReadUpTo65535BytesWithOneWarning) {
+    Machine machine;
+    LargeTable const large(1100);
+    std::string const bin = machine.scratch().file("large.bin");
+    smbiostest::writeFile(bin, dumpBin3(large.bytes));
+    hosttest::RunResult const run =
+        hosttest::runHost({"--from-bin", bin, "--format", "json"}, machine.env());
+    ASSERT_EQ(run.exitStatus, 0) << hosttest::describe(run);
+    EXPECT_EQ(run.err, "smbios-inventory: " + expectedWarning("the SMBIOS table in " + bin, large));
+    EXPECT_EQ(memoryDevices(run.out), large.devicesIn65535());
+}
+
+TEST(DumpOnThisMachine, FromBinOfALargeTableIsCapturedUpTo65535BytesWithOneWarning) {
+    Machine machine;
+    LargeTable const large(1100);
+    std::string const bin = machine.scratch().file("large.bin");
+    smbiostest::writeFile(bin, dumpBin3(large.bytes));
+    std::string const out = machine.scratch().file("smbios.txt");
+    hosttest::RunResult const run =
+        hosttest::runProgram(dumpToolPath(), {"--from-bin", bin, "-o", out}, machine.env());
+    ASSERT_EQ(run.exitStatus, 0) << hosttest::describe(run);
+    EXPECT_NE(run.err.find("smbios-dump: " + expectedWarning("the SMBIOS table in " + bin, large)),
+              std::string::npos)
+        << hosttest::describe(run);
+    hosttest::RunResult const view = hosttest::runHost({"--dump", out, "--format", "json"});
+    ASSERT_EQ(view.exitStatus, 0) << hosttest::describe(view);
+    EXPECT_EQ(memoryDevices(view.out), large.devicesIn65535());
+}

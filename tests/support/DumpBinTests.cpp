@@ -7,6 +7,7 @@
 
 #include "DumpFormat.h"
 #include "TableBuilder.h"
+#include "TestSupport.h"
 
 using smbiosdump::DumpImage;
 using smbiosdump::readDumpBin;
@@ -166,10 +167,46 @@ TEST(ReadDumpBin, Sm3TableIsCutAtMaximumSize) {
     EXPECT_EQ(out.header[0x16] | (out.header[0x17] << 8), static_cast<int>(table.size()));
 }
 
-TEST(ReadDumpBin, Sm3TableOver65535BytesIsRefused) {
+// Of a 3.x table over 65535 bytes, which a 2.x entry point cannot describe,
+// the whole structures of its first 65535 bytes are kept, and the image
+// says what the whole table was.
+TEST(ReadDumpBin, Sm3TableOver65535BytesKeepsTheWholeStructuresThatFit) {
+    std::vector<uint8_t> const table = smbiostest::largeServerTable(1100);
+    size_t const head = smbiostest::largeServerTable(0).size() - 6;
+    size_t const device = smbiostest::largeServerTable(1).size() - 6 - head;
+    size_t const kept = head + (0xFFFF - head) / device * device;
+    DumpImage out;
+    std::string error;
+    ASSERT_TRUE(readDumpBin(
+        image(sm3EntryPoint(3, 3, static_cast<uint32_t>(table.size()), 0x20), table), out, error))
+        << error;
+    EXPECT_EQ(out.table, std::vector<uint8_t>(table.begin(), table.begin() + kept));
+    EXPECT_TRUE(out.cut);
+    EXPECT_EQ(out.wholeTableBytes, table.size());
+    EXPECT_EQ(out.wholeTableStructures, 5u + 1100u + 1u);
+    EXPECT_EQ(out.header[0x16] | (out.header[0x17] << 8), static_cast<int>(kept));
+    EXPECT_EQ(out.header[0x1C] | (out.header[0x1D] << 8),
+              static_cast<int>(5 + (kept - head) / device));
+}
+
+// A table of exactly 65535 bytes is kept whole, not cut.
+TEST(ReadDumpBin, Sm3TableThatFitsIsNotCut) {
+    std::vector<uint8_t> const table = smbiostest::largeServerTable(700);
+    ASSERT_LE(table.size(), 0xFFFFu);
+    DumpImage out;
+    std::string error;
+    ASSERT_TRUE(readDumpBin(
+        image(sm3EntryPoint(3, 3, static_cast<uint32_t>(table.size()), 0x20), table), out, error))
+        << error;
+    EXPECT_EQ(out.table, table);
+    EXPECT_FALSE(out.cut);
+}
+
+TEST(ReadDumpBin, Sm3TableOver65535BytesWithoutAWholeStructureIsRefused) {
     std::vector<uint8_t> const table(70000, 0);
     expectRefused(image(sm3EntryPoint(3, 3, 0x20000, 0x20), table),
-                  "SMBIOS 3.x table of 70000 bytes does not fit a 2.x entry point");
+                  "SMBIOS 3.x table of 70000 bytes has no whole structure in its first 65535 "
+                  "bytes");
 }
 
 TEST(ReadDumpBin, RefusesEmptyFile) { expectRefused({}, "too short"); }

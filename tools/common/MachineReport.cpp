@@ -2,9 +2,20 @@
 
 #include <unistd.h>
 
+#include "format/EntryPoint.h"
 #include "pmem/PMemContract.h"
 
 namespace smbiostool {
+
+TableCut imageCut(size_t wholeTableBytes, unsigned wholeTableStructures,
+                  std::vector<unsigned char> const& keptTable) {
+    TableCut cut;
+    cut.tableBytes = static_cast<unsigned long>(wholeTableBytes);
+    cut.tableStructures = wholeTableStructures;
+    cut.servedBytes = static_cast<unsigned long>(keptTable.size());
+    cut.servedStructures = smbiosformat::tableStats(keptTable).count;
+    return cut;
+}
 
 std::string cutWarning(std::string const& subject, TableCut const& cut) {
     return "warning: " + subject + " is " + std::to_string(cut.tableBytes) + " bytes (" +

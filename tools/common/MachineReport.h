@@ -4,6 +4,7 @@
 // smbios-dump say it when the machine gave no table, or only part of one.
 #pragma once
 
+#include <cstddef>
 #include <string>
 #include <vector>
 
@@ -18,6 +19,10 @@ struct TableCut {
     unsigned long servedBytes = 0;
     unsigned long servedStructures = 0;
 };
+
+// What a --dump-bin image kept of a table over 65535 bytes (its cut is set).
+TableCut imageCut(size_t wholeTableBytes, unsigned wholeTableStructures,
+                  std::vector<unsigned char> const& keptTable);
 
 // "warning: SUBJECT is 100042 bytes (2184 structures); the 2.x entry point
 // that the plug-in reads holds the first 65500 bytes (1421 structures)".

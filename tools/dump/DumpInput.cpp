@@ -125,6 +125,9 @@ bool captureFromDumpBin(std::vector<uint8_t> const& file, Capture& out, std::str
     out.table = std::move(image.table);
     out.major = image.major;
     out.minor = image.minor;
+    out.cut = image.cut;
+    out.wholeTableBytes = image.wholeTableBytes;
+    out.wholeTableStructures = image.wholeTableStructures;
     return true;
 }
 

@@ -26,6 +26,12 @@ struct Capture {
     std::vector<uint8_t> table;   // the structure table
     uint8_t major = 0;            // the SMBIOS version the entry point states
     uint8_t minor = 0;
+    // A --dump-bin image's 3.x table over 65535 bytes is kept as the whole
+    // structures of its first 65535 bytes; then cut is set, with the whole
+    // table's figures.
+    bool cut = false;
+    size_t wholeTableBytes = 0;
+    unsigned wholeTableStructures = 0;
 };
 
 // The whole input file, up to the tools' common limit.
