@@ -9,17 +9,7 @@
 
 #include "BuilderFixture.h"
 
-using buildertest::childrenOf;
-using buildertest::hasNodeType;
-using buildertest::hasString;
-using buildertest::hasUnsigned;
-using buildertest::nodesOfType;
-using buildertest::propertyIds;
-using buildertest::StructureLists;
-using buildertest::TestMI;
-using smbiostest::LogCapture;
-using smbiostest::Structure;
-using smbiostest::TableBuilder;
+using namespace buildertest;
 
 namespace {
 
@@ -50,10 +40,6 @@ Structure biosInformation(uint16_t handle) {
         .byte(0x05)
         .byte(0x01)
         .byte(0x02);
-}
-
-Structure oemStrings(uint16_t handle, std::string const& text) {
-    return Structure(11, handle).byte(1).addString(text);
 }
 
 // A System Event Log structure (type 15) of a valid, full log.
@@ -101,16 +87,6 @@ Structure eventLog(uint16_t handle) {
         return shape;
     }
     return hasUnsigned(node, 37, 0x0800);
-}
-
-size_t loggedCount(std::string const& text) {
-    size_t count = 0;
-    for (std::string const& logged : frametest::loggedTexts()) {
-        if (logged.find(text) != std::string::npos) {
-            ++count;
-        }
-    }
-    return count;
 }
 
 // The position of the first logged text that contains text, or the number
@@ -192,7 +168,7 @@ TEST(BmcNodes, TwoIpmiStructuresMakeTwoBmcNodesEachWithItsOwnLogAndFirmwareNodes
     TestMI mi;
     TableBuilder builder;
     builder.add(ipmiDevice(0x2600));
-    builder.add(oemStrings(0x0B00, "Corvane Diagnostics -[D1-2.10]-"));
+    builder.add(oemStrings(0x0B00, {"Corvane Diagnostics -[D1-2.10]-"}));
     builder.add(biosInformation(0x0000));
     builder.add(eventLog(0x0F00));
     builder.add(ipmiDevice(0x2601));

@@ -1,12 +1,16 @@
 // Shared by the tests of the component builders: on top of the frame's
 // fixture (a plug-in object with its base state in reach, structure lists,
-// property checks), checks for the remaining property kinds and lookups of
-// the nodes a builder made.
+// property checks), checks for the remaining property kinds, lookups of the
+// nodes a builder made, the structures several builders read, and the log
+// texts of one builder. A test file takes the whole vocabulary with
+// `using namespace buildertest;`.
 #pragma once
 
 #include <gtest/gtest.h>
 
 #include <cmath>
+#include <cstddef>
+#include <cstdint>
 #include <string>
 #include <vector>
 
@@ -16,15 +20,22 @@
 
 namespace buildertest {
 
+using frametest::firstLogged;
 using frametest::hasNodeType;
 using frametest::hasStrings;
 using frametest::hasUnsigned;
 using frametest::hasUnsignedList;
 using frametest::hasVersion;
 using frametest::lacksProperty;
+using frametest::loggedLevels;
+using frametest::loggedTexts;
+using frametest::OverrideTable;
 using frametest::readProperty;
 using frametest::StructureLists;
 using frametest::TestMI;
+using smbiostest::LogCapture;
+using smbiostest::Structure;
+using smbiostest::TableBuilder;
 
 // Property id holds text equal to expected.
 inline ::testing::AssertionResult hasString(IC::Node const* node, unsigned int id,
@@ -47,8 +58,8 @@ inline ::testing::AssertionResult hasString(IC::Node const* node, unsigned int i
 
 // Property id holds an IC::EnumValue of the given width (1, 2 or 4 bytes)
 // and value.
-inline ::testing::AssertionResult hasEnum(IC::Node const* node, unsigned int id,
-                                          unsigned int width, long long expected) {
+inline ::testing::AssertionResult hasEnum(IC::Node const* node, unsigned int id, unsigned int width,
+                                          long long expected) {
     IC::PropertyValue value;
     ::testing::AssertionResult read = readProperty(node, id, value);
     if (!read) {
@@ -61,8 +72,7 @@ inline ::testing::AssertionResult hasEnum(IC::Node const* node, unsigned int id,
     if (value.getEnum().getWidth() != width || value.getEnum().getValue() != expected) {
         return ::testing::AssertionFailure()
                << "property " << id << " is " << value.getEnum().getValue() << " of width "
-               << value.getEnum().getWidth() << ", expected " << expected << " of width "
-               << width;
+               << value.getEnum().getWidth() << ", expected " << expected << " of width " << width;
     }
     return ::testing::AssertionSuccess();
 }
@@ -78,13 +88,13 @@ inline ::testing::AssertionResult hasDouble(IC::Node const* node, unsigned int i
     }
     if (value.getKind() != IC::PropertyValue::NUMBER ||
         value.getNumber().getKind() != IC::Number::DOUBLE) {
-        return ::testing::AssertionFailure() << "property " << id << " is " << value
-                                             << ", not a double number";
+        return ::testing::AssertionFailure()
+               << "property " << id << " is " << value << ", not a double number";
     }
     if (std::fabs(value.getNumber().getDouble() - expected) > 1e-6) {
-        return ::testing::AssertionFailure() << "property " << id << " is "
-                                             << value.getNumber().getDouble() << ", expected "
-                                             << expected;
+        return ::testing::AssertionFailure()
+               << "property " << id << " is " << value.getNumber().getDouble() << ", expected "
+               << expected;
     }
     return ::testing::AssertionSuccess();
 }
@@ -98,13 +108,13 @@ inline ::testing::AssertionResult hasBool(IC::Node const* node, unsigned int id,
     }
     if (value.getKind() != IC::PropertyValue::NUMBER ||
         value.getNumber().getKind() != IC::Number::BOOL) {
-        return ::testing::AssertionFailure() << "property " << id << " is " << value
-                                             << ", not a boolean number";
+        return ::testing::AssertionFailure()
+               << "property " << id << " is " << value << ", not a boolean number";
     }
     if (value.getNumber().getBool() != expected) {
-        return ::testing::AssertionFailure() << "property " << id << " is "
-                                             << value.getNumber().getBool() << ", expected "
-                                             << expected;
+        return ::testing::AssertionFailure()
+               << "property " << id << " is " << value.getNumber().getBool() << ", expected "
+               << expected;
     }
     return ::testing::AssertionSuccess();
 }
@@ -122,9 +132,8 @@ inline ::testing::AssertionResult hasBytes(IC::Node const* node, unsigned int id
                << "property " << id << " is of kind " << value.getKind() << ", not bytes";
     }
     if (value.getBytes() != expected) {
-        return ::testing::AssertionFailure()
-               << "property " << id << " is " << value << ", expected "
-               << IC::PropertyValue(expected, true);
+        return ::testing::AssertionFailure() << "property " << id << " is " << value
+                                             << ", expected " << IC::PropertyValue(expected, true);
     }
     return ::testing::AssertionSuccess();
 }
@@ -172,6 +181,66 @@ inline IC::MutableNode* addParent(TestMI& mi, unsigned int type = 41) {
     IC::Node* added = parent;
     mi.addNewNode(added);
     return parent;
+}
+
+// A parsed table and its structure lists, as initialize hands them to the
+// builders.
+struct ParsedTable {
+    explicit ParsedTable(TableBuilder const& table) : parsed(table.build()), lists(parsed) {}
+    SD::SmBios parsed;
+    StructureLists lists;
+};
+
+// The captured log-output texts written under one logger, in order.
+inline std::vector<std::string> loggedBy(std::string const& loggerName) {
+    std::vector<std::string> texts;
+    for (QNLog::QNLogRecord const& record : QNLog::QNLogger::captured()) {
+        if (record.output == "log" && record.logger == loggerName) {
+            texts.push_back(record.text);
+        }
+    }
+    return texts;
+}
+
+// How many captured log-output texts contain text.
+inline size_t loggedCount(std::string const& text) {
+    size_t n = 0;
+    for (std::string const& logged : loggedTexts()) {
+        if (logged.find(text) != std::string::npos) {
+            ++n;
+        }
+    }
+    return n;
+}
+
+// A structure's formatted area cut to length bytes (header included), with
+// the given strings (the empty ones left out) as its string set; the whole
+// structure when length reaches its end.
+inline Structure cutTo(Structure const& full, size_t length,
+                       std::vector<std::string> const& strings) {
+    if (length >= full.formattedSize()) {
+        return full;
+    }
+    std::vector<uint8_t> const bytes = full.build();
+    Structure cut(full.type(), full.handle());
+    cut.bytes(std::vector<uint8_t>(bytes.begin() + 4,
+                                   bytes.begin() + static_cast<std::ptrdiff_t>(length)));
+    for (std::string const& text : strings) {
+        if (!text.empty()) {
+            cut.addString(text);
+        }
+    }
+    return cut;
+}
+
+// An OEM Strings structure (type 11) whose Count is the number of strings.
+inline Structure oemStrings(uint16_t handle, std::vector<std::string> const& strings) {
+    Structure structure(11, handle);
+    structure.byte(static_cast<uint8_t>(strings.size()));
+    for (std::string const& text : strings) {
+        structure.addString(text);
+    }
+    return structure;
 }
 
 }  // namespace buildertest

@@ -11,18 +11,7 @@
 
 #include "BuilderFixture.h"
 
-using buildertest::hasBytes;
-using buildertest::hasEnum;
-using buildertest::hasNodeType;
-using buildertest::hasString;
-using buildertest::hasUnsigned;
-using buildertest::lacksProperty;
-using buildertest::nodesOfType;
-using buildertest::propertyIds;
-using buildertest::StructureLists;
-using buildertest::TestMI;
-using smbiostest::Structure;
-using smbiostest::TableBuilder;
+using namespace buildertest;
 
 namespace {
 

@@ -22,20 +22,7 @@
 
 #include "BuilderFixture.h"
 
-using buildertest::childrenOf;
-using buildertest::hasDouble;
-using buildertest::hasEnum;
-using buildertest::hasNodeType;
-using buildertest::hasString;
-using buildertest::hasUnsignedList;
-using buildertest::lacksProperty;
-using buildertest::nodesOfType;
-using buildertest::propertyIds;
-using buildertest::StructureLists;
-using buildertest::TestMI;
-using frametest::OverrideTable;
-using smbiostest::Structure;
-using smbiostest::TableBuilder;
+using namespace buildertest;
 
 namespace {
 
@@ -144,6 +131,40 @@ struct ComputerRun {
     IC::MutableNode* root = nullptr;
 };
 
+// The structures as a table ended by an End-of-Table structure.
+TableBuilder tableOf(std::vector<Structure> const& structures) {
+    TableBuilder table;
+    for (Structure const& structure : structures) {
+        table.add(structure);
+    }
+    table.endOfTable(0xFEFF);
+    return table;
+}
+
+// The builder run over a table that the process also acquires, at the given
+// SMBIOS version, from its override file; the log is captured from the run
+// on, and computers holds the computer-system nodes made.
+struct AcquiredComputerRun {
+    AcquiredComputerRun(TableBuilder const& table, uint8_t major, uint8_t minor)
+        : override(table.build(), major, minor), run(table) {
+        computers = nodesOfType(run.mi, 40);
+    }
+
+    // The length of the first structure as the table model parsed it.
+    unsigned int firstLength() const { return run.parsed.getTables()[0].getLength(); }
+
+    OverrideTable override;
+    LogCapture log;
+    ComputerRun run;
+    std::vector<IC::Node*> computers;
+};
+
+// A System Information structure up to the serial number (SMBIOS 2.0,
+// length 8), to which a test adds the later fields.
+Structure systemUpToSerial(std::string const& product = "RS-7400") {
+    return Structure(1, 0x0100).str("Corvane").str(product).str("V1.2").str("SYS-0001");
+}
+
 // The property as stored on the node (not computed by getProperty).
 IC::PropertyValue stored(IC::Node const* node, unsigned int id) {
     auto const& properties = node->getProperties();
@@ -183,12 +204,7 @@ std::string rewritten(std::string uuid) {
 }
 
 // The table the UUID rewrite tests acquire: one System Information structure.
-std::vector<uint8_t> uuidTable() {
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.endOfTable(0xFEFF);
-    return table.build();
-}
+std::vector<uint8_t> uuidTable() { return tableOf({systemInformation(0x0100)}).build(); }
 
 }  // namespace
 
@@ -286,16 +302,13 @@ TEST(ComputerSystemBuilder, NoSystemInformationStructureMakesNoNodeAndNothingBel
 TEST(ComputerSystemBuilder,
      TwoSystemStructuresWithoutBaseboardGetIndexesZeroAndOneEachWithItsOwnChassis) {
     REQUIRE_FRESH_TABLE();
-    TableBuilder table;
-    table.add(systemInformation(0x0100, "First [1111AB1]"));
-    table.add(systemInformation(0x0101, "Second [2222AB2]"));
-    table.add(chassis(0x0300, 0x17));
-    table.endOfTable(0xFEFF);
-    OverrideTable override(table.build(), 2, 4);
-    smbiostest::LogCapture log;
-    ComputerRun run(table);
-
-    std::vector<IC::Node*> const computers = nodesOfType(run.mi, 40);
+    AcquiredComputerRun const acquired(
+        tableOf({systemInformation(0x0100, "First [1111AB1]"),
+                 systemInformation(0x0101, "Second [2222AB2]"), chassis(0x0300, 0x17)}),
+        2, 4);
+    ComputerRun const& run = acquired.run;
+    LogCapture const& log = acquired.log;
+    std::vector<IC::Node*> const& computers = acquired.computers;
     ASSERT_EQ(2u, computers.size()) << log.dump();
     EXPECT_EQ(0u, computers[0]->getIndex());
     EXPECT_EQ(1u, computers[1]->getIndex());
@@ -325,19 +338,16 @@ TEST(ComputerSystemBuilder,
 
 TEST(ComputerSystemBuilder, WithBaseboardOnlyTheFirstOfTwoSystemStructuresGetsANode) {
     REQUIRE_FRESH_TABLE();
-    TableBuilder table;
-    table.add(systemInformation(0x0100, "First [1111AB1]"));
-    table.add(systemInformation(0x0101, "Second [2222AB2]"));
-    table.add(chassis(0x0300, 0x17));
-    table.add(baseboard(0x0200));
-    table.endOfTable(0xFEFF);
-    OverrideTable override(table.build(), 2, 4);
-    smbiostest::LogCapture log;
-    ComputerRun run(table);
+    AcquiredComputerRun const acquired(tableOf({systemInformation(0x0100, "First [1111AB1]"),
+                                                systemInformation(0x0101, "Second [2222AB2]"),
+                                                chassis(0x0300, 0x17), baseboard(0x0200)}),
+                                       2, 4);
+    ComputerRun const& run = acquired.run;
+    LogCapture const& log = acquired.log;
 
     // The planar builder takes every structure over while the first
     // computer system's subtree is built; the walk then finds the list empty.
-    std::vector<IC::Node*> const computers = nodesOfType(run.mi, 40);
+    std::vector<IC::Node*> const& computers = acquired.computers;
     ASSERT_EQ(1u, computers.size()) << log.dump();
     EXPECT_EQ(0u, computers[0]->getIndex());
     EXPECT_TRUE(hasString(computers[0], 39, "First [1111AB1]"));
@@ -349,23 +359,12 @@ TEST(ComputerSystemBuilder, WithBaseboardOnlyTheFirstOfTwoSystemStructuresGetsAN
 
 TEST(ComputerSystemBuilder, Smbios21StructureOfLength0x19LacksSkuAndFamily) {
     REQUIRE_FRESH_TABLE();
-    TableBuilder table;
-    table.add(Structure(1, 0x0100)
-                  .str("Corvane")
-                  .str("RS-7400")
-                  .str("V1.2")
-                  .str("SYS-0001")
-                  .bytes(UUID_BYTES)
-                  .byte(0x06));
-    table.endOfTable(0xFEFF);
-    OverrideTable override(table.build(), 2, 3);
-    smbiostest::LogCapture log;
-    ComputerRun run(table);
-    ASSERT_EQ(0x19u, run.parsed.getTables()[0].getLength());
-
-    std::vector<IC::Node*> const computers = nodesOfType(run.mi, 40);
-    ASSERT_EQ(1u, computers.size());
-    IC::Node const* node = computers[0];
+    AcquiredComputerRun const acquired(tableOf({systemUpToSerial().bytes(UUID_BYTES).byte(0x06)}),
+                                       2, 3);
+    LogCapture const& log = acquired.log;
+    ASSERT_EQ(0x19u, acquired.firstLength());
+    ASSERT_EQ(1u, acquired.computers.size());
+    IC::Node const* node = acquired.computers[0];
     EXPECT_EQ((std::vector<unsigned int>{36, 39, 45, 50, 64, 65, 125, 126, 127, 307}),
               propertyIds(node));
     EXPECT_TRUE(lacksProperty(node, 52));
@@ -379,17 +378,11 @@ TEST(ComputerSystemBuilder, Smbios21StructureOfLength0x19LacksSkuAndFamily) {
 }
 
 TEST(ComputerSystemBuilder, Smbios20StructureOfLength8LacksUuidAndWakeUpType) {
-    TableBuilder table;
-    table.add(Structure(1, 0x0100).str("Corvane").str("8837 Blade").str("V1.2").str("SYS-0001"));
-    table.endOfTable(0xFEFF);
-    OverrideTable override(table.build(), 2, 0);
-    smbiostest::LogCapture log;
-    ComputerRun run(table);
-    ASSERT_EQ(8u, run.parsed.getTables()[0].getLength());
-
-    std::vector<IC::Node*> const computers = nodesOfType(run.mi, 40);
-    ASSERT_EQ(1u, computers.size());
-    IC::Node const* node = computers[0];
+    AcquiredComputerRun const acquired(tableOf({systemUpToSerial("8837 Blade")}), 2, 0);
+    LogCapture const& log = acquired.log;
+    ASSERT_EQ(8u, acquired.firstLength());
+    ASSERT_EQ(1u, acquired.computers.size());
+    IC::Node const* node = acquired.computers[0];
     EXPECT_EQ((std::vector<unsigned int>{36, 39, 45, 50, 125, 126, 127, 307}), propertyIds(node));
     EXPECT_TRUE(hasString(node, 36, "Corvane"));
     EXPECT_TRUE(hasString(node, 39, "8837 Blade"));
@@ -405,79 +398,47 @@ TEST(ComputerSystemBuilder, Smbios20StructureOfLength8LacksUuidAndWakeUpType) {
 TEST(ComputerSystemBuilder, StructureTooShortForTheUuidGetsNoUuidProperty) {
     // Length 0x17: the UUID field lacks its last byte.
     std::vector<uint8_t> const fifteen(UUID_BYTES.begin(), UUID_BYTES.begin() + 15);
-    TableBuilder table;
-    table.add(Structure(1, 0x0100)
-                  .str("Corvane")
-                  .str("RS-7400")
-                  .str("V1.2")
-                  .str("SYS-0001")
-                  .bytes(fifteen));
-    table.endOfTable(0xFEFF);
-    OverrideTable override(table.build(), 2, 6);
-    smbiostest::LogCapture log;
-    ComputerRun run(table);
-    ASSERT_EQ(0x17u, run.parsed.getTables()[0].getLength());
-
-    std::vector<IC::Node*> const computers = nodesOfType(run.mi, 40);
-    ASSERT_EQ(1u, computers.size());
-    EXPECT_TRUE(lacksProperty(computers[0], 64));
-    EXPECT_TRUE(lacksProperty(computers[0], 65));
-    EXPECT_TRUE(hasString(computers[0], 50, "SYS-0001"));
+    AcquiredComputerRun const acquired(tableOf({systemUpToSerial().bytes(fifteen)}), 2, 6);
+    LogCapture const& log = acquired.log;
+    ASSERT_EQ(0x17u, acquired.firstLength());
+    ASSERT_EQ(1u, acquired.computers.size());
+    IC::Node const* node = acquired.computers[0];
+    EXPECT_TRUE(lacksProperty(node, 64));
+    EXPECT_TRUE(lacksProperty(node, 65));
+    EXPECT_TRUE(hasString(node, 50, "SYS-0001"));
     EXPECT_EQ(2u, log.count("PlatformUtilities::uuid_unparse error ")) << log.dump();
     EXPECT_EQ(0u, log.count("reverse_uuid_byte_order entry")) << log.dump();
 }
 
 TEST(ComputerSystemBuilder, StructureEndingRightAfterTheUuidGetsTheUuidButNoWakeUpType) {
     REQUIRE_FRESH_TABLE();
-    TableBuilder table;
-    table.add(Structure(1, 0x0100)
-                  .str("Corvane")
-                  .str("RS-7400")
-                  .str("V1.2")
-                  .str("SYS-0001")
-                  .bytes(UUID_BYTES));
-    table.endOfTable(0xFEFF);
-    OverrideTable override(table.build(), 2, 6);
-    smbiostest::LogCapture log;
-    ComputerRun run(table);
-    ASSERT_EQ(0x18u, run.parsed.getTables()[0].getLength());
-
-    std::vector<IC::Node*> const computers = nodesOfType(run.mi, 40);
-    ASSERT_EQ(1u, computers.size());
-    EXPECT_TRUE(hasString(computers[0], 64, UUID_REORDERED));
-    EXPECT_TRUE(lacksProperty(computers[0], 65));
+    AcquiredComputerRun const acquired(tableOf({systemUpToSerial().bytes(UUID_BYTES)}), 2, 6);
+    LogCapture const& log = acquired.log;
+    ASSERT_EQ(0x18u, acquired.firstLength());
+    ASSERT_EQ(1u, acquired.computers.size());
+    IC::Node const* node = acquired.computers[0];
+    EXPECT_TRUE(hasString(node, 64, UUID_REORDERED));
+    EXPECT_TRUE(lacksProperty(node, 65));
     EXPECT_EQ(0u, log.count("PlatformUtilities::uuid_unparse error")) << log.dump();
 }
 
 TEST(ComputerSystemBuilder, Smbios24TableSetsTheUuidAsFormatted) {
     REQUIRE_FRESH_TABLE();
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.endOfTable(0xFEFF);
-    OverrideTable override(table.build(), 2, 4);
-    smbiostest::LogCapture log;
-    ComputerRun run(table);
-
-    std::vector<IC::Node*> const computers = nodesOfType(run.mi, 40);
-    ASSERT_EQ(1u, computers.size());
-    EXPECT_TRUE(hasString(computers[0], 64, UUID_AS_FORMATTED));
+    AcquiredComputerRun const acquired(tableOf({systemInformation(0x0100)}), 2, 4);
+    LogCapture const& log = acquired.log;
+    ASSERT_EQ(1u, acquired.computers.size());
+    EXPECT_TRUE(hasString(acquired.computers[0], 64, UUID_AS_FORMATTED));
     EXPECT_EQ(0u, log.count("Entering if condition UUID = ")) << log.dump();
-    EXPECT_EQ(2u, run.mi.getSmBiosMajorVersion());
-    EXPECT_EQ(4u, run.mi.getSmBiosMinorVersion());
+    EXPECT_EQ(2u, acquired.run.mi.getSmBiosMajorVersion());
+    EXPECT_EQ(4u, acquired.run.mi.getSmBiosMinorVersion());
 }
 
 TEST(ComputerSystemBuilder, Smbios26TableSetsTheUuidWithItsFirstThreeFieldsByteReversed) {
     REQUIRE_FRESH_TABLE();
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.endOfTable(0xFEFF);
-    OverrideTable override(table.build(), 2, 6);
-    smbiostest::LogCapture log;
-    ComputerRun run(table);
-
-    std::vector<IC::Node*> const computers = nodesOfType(run.mi, 40);
-    ASSERT_EQ(1u, computers.size());
-    EXPECT_TRUE(hasString(computers[0], 64, UUID_REORDERED));
+    AcquiredComputerRun const acquired(tableOf({systemInformation(0x0100)}), 2, 6);
+    LogCapture const& log = acquired.log;
+    ASSERT_EQ(1u, acquired.computers.size());
+    EXPECT_TRUE(hasString(acquired.computers[0], 64, UUID_REORDERED));
     EXPECT_EQ(2u, log.count("Entering if condition UUID = " + UUID_AS_FORMATTED)) << log.dump();
     EXPECT_EQ(2u, log.count("Exiting if condition UUID = " + UUID_REORDERED)) << log.dump();
 }
@@ -633,30 +594,6 @@ TEST(ComputerSystemNode, Property127ForKolkataIsFiveHours) {
     EXPECT_EQ(2u, log.count("   Timezone=")) << log.dump();
 }
 
-TEST(ComputerSystemNode, Property127ForPlusFiveThirtyIsFiveHours) {
-    ScopedTimeZone zone("<+0530>-5:30");
-    IC::CmptrNode node(7, 2, {1}, 40, 0);
-    EXPECT_TRUE(hasDouble(&node, 127, 5.0));
-}
-
-TEST(ComputerSystemNode, Property127ForPlusFiveFortyFiveIsFiveHours) {
-    ScopedTimeZone zone("<+0545>-5:45");
-    IC::CmptrNode node(7, 2, {1}, 40, 0);
-    EXPECT_TRUE(hasDouble(&node, 127, 5.0));
-}
-
-TEST(ComputerSystemNode, Property127ForMinusThreeThirtyTruncatesTowardZero) {
-    ScopedTimeZone zone("<-0330>3:30");
-    IC::CmptrNode node(7, 2, {1}, 40, 0);
-    EXPECT_TRUE(hasDouble(&node, 127, -3.0));
-}
-
-TEST(ComputerSystemNode, Property127ForMinusTwoThirtyTruncatesTowardZero) {
-    ScopedTimeZone zone("<-0230>2:30");
-    IC::CmptrNode node(7, 2, {1}, 40, 0);
-    EXPECT_TRUE(hasDouble(&node, 127, -2.0));
-}
-
 TEST(ComputerSystemNode, Property127ForStJohnsTruncatesTowardZero) {
     ScopedTimeZone zone("America/St_Johns");
     long const offset = localOffsetSeconds();
@@ -668,11 +605,33 @@ TEST(ComputerSystemNode, Property127ForStJohnsTruncatesTowardZero) {
     EXPECT_TRUE(hasDouble(&node, 127, offset == -12600 ? -3.0 : -2.0));
 }
 
-TEST(ComputerSystemNode, Property127ForUtcIsZero) {
-    ScopedTimeZone zone("UTC0");
+// A fixed time zone and the whole hours property 127 gives under it: the
+// offset truncated toward zero.
+struct ZoneCase {
+    char const* name;  // for the test's name
+    char const* zone;
+    double hours;
+};
+
+void PrintTo(ZoneCase const& c, std::ostream* out) { *out << c.zone << " gives " << c.hours; }
+
+class ComputerSystemNodeZone : public ::testing::TestWithParam<ZoneCase> {};
+
+TEST_P(ComputerSystemNodeZone, Property127IsTheOffsetInWholeHoursTruncatedTowardZero) {
+    ScopedTimeZone zone(GetParam().zone);
     IC::CmptrNode node(7, 2, {1}, 40, 0);
-    EXPECT_TRUE(hasDouble(&node, 127, 0.0));
+    EXPECT_TRUE(hasDouble(&node, 127, GetParam().hours));
 }
+
+INSTANTIATE_TEST_SUITE_P(Zones, ComputerSystemNodeZone,
+                         ::testing::Values(ZoneCase{"PlusFiveThirty", "<+0530>-5:30", 5.0},
+                                           ZoneCase{"PlusFiveFortyFive", "<+0545>-5:45", 5.0},
+                                           ZoneCase{"MinusThreeThirty", "<-0330>3:30", -3.0},
+                                           ZoneCase{"MinusTwoThirty", "<-0230>2:30", -2.0},
+                                           ZoneCase{"Utc", "UTC0", 0.0}),
+                         [](::testing::TestParamInfo<ZoneCase> const& info) {
+                             return std::string(info.param.name);
+                         });
 
 TEST(ComputerSystemNode, OtherIdsAreAnsweredByTheStoredProperties) {
     IC::CmptrNode node(7, 2, {1}, 40, 3);

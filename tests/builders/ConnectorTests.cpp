@@ -11,16 +11,7 @@
 #include "QNLog/QNLogger.h"
 #include "smbios/SmBios.h"
 
-using buildertest::addParent;
-using buildertest::hasEnum;
-using buildertest::hasNodeType;
-using buildertest::hasString;
-using buildertest::nodesOfType;
-using buildertest::propertyIds;
-using buildertest::StructureLists;
-using buildertest::TestMI;
-using smbiostest::Structure;
-using smbiostest::TableBuilder;
+using namespace buildertest;
 
 namespace {
 
@@ -38,17 +29,6 @@ Structure connector(uint16_t handle, std::string const& internal, uint8_t portTy
         .str(external)
         .byte(0x12)  // access bus (USB)
         .byte(portType);
-}
-
-// The texts the connector builder itself logged (log output only), in order.
-std::vector<std::string> connectorLog() {
-    std::vector<std::string> texts;
-    for (QNLog::QNLogRecord const& record : QNLog::QNLogger::captured()) {
-        if (record.output == "log" && record.logger == CONNECTOR_LOGGER) {
-            texts.push_back(record.text);
-        }
-    }
-    return texts;
 }
 
 // The connector nodes the builder makes from a table, under a planar.
@@ -94,7 +74,7 @@ TEST(ConnectorBuilder, ConnectorNodeFieldByField) {
     EXPECT_EQ(4u, setup.mi.nextNodeId);
     EXPECT_EQ((std::vector<std::string>{"makeConnectorNodes entry", "Table 8 length = 9",
                                         "makeConnectorNodes exit"}),
-              connectorLog())
+              loggedBy(CONNECTOR_LOGGER))
         << log.dump();
 }
 
@@ -241,7 +221,7 @@ TEST(ConnectorBuilder, FailureInOneConnectorIsLoggedAndTheNextStillGetsANode) {
     EXPECT_EQ(3u, nodes[0]->getNodeId());
     EXPECT_EQ(1u, nodes[0]->getIndex());
     EXPECT_TRUE(hasString(nodes[0], 108, "Compute ITE 2"));
-    std::vector<std::string> const texts = connectorLog();
+    std::vector<std::string> const texts = loggedBy(CONNECTOR_LOGGER);
     ASSERT_FALSE(texts.empty());
     EXPECT_EQ("makeConnectorNodes exit", texts.back());
 }

@@ -9,17 +9,7 @@
 
 #include "BuilderFixture.h"
 
-using buildertest::childrenOf;
-using buildertest::hasNodeType;
-using buildertest::hasString;
-using buildertest::hasUnsigned;
-using buildertest::nodesOfType;
-using buildertest::propertyIds;
-using buildertest::StructureLists;
-using buildertest::TestMI;
-using smbiostest::LogCapture;
-using smbiostest::Structure;
-using smbiostest::TableBuilder;
+using namespace buildertest;
 
 namespace {
 
@@ -32,28 +22,8 @@ std::string const NO_BLANK = "KVD string version number missing blank terminatio
 std::string const NO_BUILD = "KVD version string missing build id: ";
 std::string const NO_BUILD_END = "KVD version string missing build id end ']-': ";
 
-// An OEM Strings structure (type 11) whose Count is the number of strings.
-Structure oemStrings(uint16_t handle, std::vector<std::string> const& strings) {
-    Structure structure(11, handle);
-    structure.byte(static_cast<uint8_t>(strings.size()));
-    for (std::string const& text : strings) {
-        structure.addString(text);
-    }
-    return structure;
-}
-
 // The diagnostics nodes (type 53) in node-list order.
 std::vector<IC::Node*> kvdNodes(TestMI const& mi) { return nodesOfType(mi, 53); }
-
-size_t loggedCount(std::string const& text) {
-    size_t count = 0;
-    for (std::string const& logged : frametest::loggedTexts()) {
-        if (logged.find(text) != std::string::npos) {
-            ++count;
-        }
-    }
-    return count;
-}
 
 // Whether the exact text was logged (through the log output).
 bool loggedExactly(std::string const& text) {

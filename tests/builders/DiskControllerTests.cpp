@@ -11,17 +11,7 @@
 #include "QNLog/QNLogger.h"
 #include "smbios/SmBios.h"
 
-using buildertest::addParent;
-using buildertest::hasNodeType;
-using buildertest::hasString;
-using buildertest::hasUnsigned;
-using buildertest::hasUnsignedList;
-using buildertest::nodesOfType;
-using buildertest::propertyIds;
-using buildertest::StructureLists;
-using buildertest::TestMI;
-using smbiostest::Structure;
-using smbiostest::TableBuilder;
+using namespace buildertest;
 
 namespace {
 
@@ -29,27 +19,6 @@ char const* const DISK_LOGGER = "Quillon.IC.MI.SmBiosMI.SmBiosMIDiskCtrlr";
 unsigned int const DISK_CONTROLLER_NODE = 50;
 std::string const ENABLED = "$IS IDE Bus Enabled";
 std::string const DISABLED = "$IS IDE Bus Disabled";
-
-// An OEM Strings structure: Count (0x04) and the strings.
-Structure oemStrings(uint16_t handle, std::vector<std::string> const& strings) {
-    Structure structure(11, handle);
-    structure.byte(static_cast<uint8_t>(strings.size()));
-    for (std::string const& text : strings) {
-        structure.addString(text);
-    }
-    return structure;
-}
-
-// The texts the disk-controller builder itself logged (log output only).
-std::vector<std::string> diskLog() {
-    std::vector<std::string> texts;
-    for (QNLog::QNLogRecord const& record : QNLog::QNLogger::captured()) {
-        if (record.output == "log" && record.logger == DISK_LOGGER) {
-            texts.push_back(record.text);
-        }
-    }
-    return texts;
-}
 
 // The builder over a table, under a planar (node id 2; the next id is 3).
 struct DiskRun {
@@ -117,7 +86,7 @@ TEST(DiskControllerBuilder, EnabledIdeStringMakesAnEnabledNodeFieldByField) {
 
     EXPECT_EQ(2u, setup.mi.nodeList.size());
     EXPECT_EQ(4u, setup.mi.nextNodeId);
-    std::vector<std::string> const texts = diskLog();
+    std::vector<std::string> const texts = loggedBy(DISK_LOGGER);
     ASSERT_FALSE(texts.empty()) << log.dump();
     EXPECT_EQ("makeDiskControllerNodes entry", texts.front()) << log.dump();
     EXPECT_EQ("makeDiskControllerNodes exit", texts.back()) << log.dump();
@@ -328,7 +297,7 @@ TEST(DiskControllerBuilder, FailureIsLoggedNamingTable8AndTheNextStructureGoesOn
     ASSERT_EQ(1u, nodes.size());
     EXPECT_EQ(4u, nodes[0]->getNodeId());
     expectIdeBusNode(nodes[0], setup.planar->getNodeId(), 1);
-    std::vector<std::string> const texts = diskLog();
+    std::vector<std::string> const texts = loggedBy(DISK_LOGGER);
     ASSERT_FALSE(texts.empty());
     EXPECT_EQ("makeDiskControllerNodes exit", texts.back());
 }

@@ -14,18 +14,7 @@
 #include "QNLog/QNLogger.h"
 #include "TreeSnapshot.h"
 
-using buildertest::addParent;
-using buildertest::hasNodeType;
-using buildertest::hasString;
-using buildertest::hasUnsigned;
-using buildertest::hasUnsignedList;
-using buildertest::lacksProperty;
-using buildertest::nodesOfType;
-using buildertest::propertyIds;
-using buildertest::StructureLists;
-using buildertest::TestMI;
-using smbiostest::Structure;
-using smbiostest::TableBuilder;
+using namespace buildertest;
 
 namespace {
 
@@ -79,20 +68,9 @@ Structure eventLog(uint16_t areaLength, uint8_t status) {
 // The text a byte vector has as a property value.
 std::string bytesText(Bytes const& bytes) { return IC::PropertyValue(bytes, true).toString(); }
 
-// The texts the event-log builder itself logged (log output only), in order.
-std::vector<std::string> eventLogLog() {
-    std::vector<std::string> texts;
-    for (QNLog::QNLogRecord const& record : QNLog::QNLogger::captured()) {
-        if (record.output == "log" && record.logger == LOG_LOGGER) {
-            texts.push_back(record.text);
-        }
-    }
-    return texts;
-}
-
 // The builder's logged line that starts with label, or "".
 std::string loggedLine(std::string const& label) {
-    for (std::string const& text : eventLogLog()) {
+    for (std::string const& text : loggedBy(LOG_LOGGER)) {
         if (text.compare(0, label.size(), label) == 0) {
             return text;
         }
@@ -206,7 +184,7 @@ TEST(EventLogBuilder, HeaderFieldsAreLoggedInOrderWithTheirLabels) {
                   "Log Type Descriptors=" + bytesText({0x01, 0x00, 0x02, 0x00}),
                   "makeLogNodes exit",
               }),
-              eventLogLog())
+              loggedBy(LOG_LOGGER))
         << capture.dump();
     EXPECT_EQ("78 56 34 12", bytesText({0x78, 0x56, 0x34, 0x12}));
 }
@@ -351,7 +329,7 @@ TEST(EventLogBuilder, DescriptorListRunningPastTheStructureReadsWhatIsThereThenZ
     EXPECT_EQ("Log Type Descriptors=" + bytesText({0x05, 0x01, 'A', 'B', 0, 0, 0, 0}),
               loggedLine("Log Type Descriptors="))
         << capture.dump();
-    EXPECT_EQ("makeLogNodes exit", eventLogLog().back());
+    EXPECT_EQ("makeLogNodes exit", loggedBy(LOG_LOGGER).back());
 }
 
 TEST(EventLogBuilder, LargestDescriptorListIsReadWithoutACrash) {
@@ -370,7 +348,7 @@ TEST(EventLogBuilder, LargestDescriptorListIsReadWithoutACrash) {
     expected[0] = 0x07;
     expected[1] = 0x08;
     EXPECT_EQ("Log Type Descriptors=" + bytesText(expected), loggedLine("Log Type Descriptors="));
-    EXPECT_EQ("makeLogNodes exit", eventLogLog().back());
+    EXPECT_EQ("makeLogNodes exit", loggedBy(LOG_LOGGER).back());
 }
 
 TEST(EventLogBuilder, StructureOfLength4GivesStatus16) {
@@ -435,7 +413,7 @@ TEST(EventLogBuilder, FailureInOneStructureIsLoggedAndTheNextStructureGoesOn) {
     EXPECT_EQ(31u, nodes[1]->getStatus());
     EXPECT_TRUE(hasUnsigned(nodes[1], 37, 0x1000));
     EXPECT_TRUE(hasUnsignedList(nodes[1], 125, {30, 1, 16, 31}));
-    EXPECT_EQ("makeLogNodes exit", eventLogLog().back());
+    EXPECT_EQ("makeLogNodes exit", loggedBy(LOG_LOGGER).back());
 }
 
 // ---------------------------------------------------------------------------
@@ -520,7 +498,7 @@ TEST(EventLogLogLevels, HeaderCutAtEachFieldGivesTheSameTreeAndFailureAtEveryLev
                 EXPECT_EQ((std::vector<int>{6000}), frametest::loggedLevels("Exception="));
             } else {
                 EXPECT_EQ("", failure) << log.dump();
-                EXPECT_EQ("makeLogNodes exit", eventLogLog().back()) << log.dump();
+                EXPECT_EQ("makeLogNodes exit", loggedBy(LOG_LOGGER).back()) << log.dump();
             }
             // The header lines stop before the straddling field's own.
             EXPECT_EQ(length != 0x05, loggedLine("Handle=") != "") << log.dump();

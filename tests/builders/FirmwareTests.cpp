@@ -11,19 +11,7 @@
 
 #include "BuilderFixture.h"
 
-using buildertest::childrenOf;
-using buildertest::hasNodeType;
-using buildertest::hasString;
-using buildertest::hasUnsigned;
-using buildertest::hasVersion;
-using buildertest::lacksProperty;
-using buildertest::nodesOfType;
-using buildertest::propertyIds;
-using buildertest::StructureLists;
-using buildertest::TestMI;
-using smbiostest::LogCapture;
-using smbiostest::Structure;
-using smbiostest::TableBuilder;
+using namespace buildertest;
 
 namespace {
 
@@ -37,16 +25,6 @@ struct VersionedMI : TestMI {
         smbiosMinorVersion = minor;
     }
 };
-
-// An OEM Strings structure (type 11) whose Count is the number of strings.
-Structure oemStrings(uint16_t handle, std::vector<std::string> const& strings) {
-    Structure structure(11, handle);
-    structure.byte(static_cast<uint8_t>(strings.size()));
-    for (std::string const& text : strings) {
-        structure.addString(text);
-    }
-    return structure;
-}
 
 // A BIOS Information structure (type 0) of the given formatted length (0x14,
 // 0x16, 0x17 or 0x18): the fields up to that length.
@@ -155,16 +133,6 @@ struct FirmwareRun {
     LogCapture log;
     std::vector<IC::Node*> firmware;
 };
-
-size_t loggedCount(std::string const& text) {
-    size_t count = 0;
-    for (std::string const& logged : frametest::loggedTexts()) {
-        if (logged.find(text) != std::string::npos) {
-            ++count;
-        }
-    }
-    return count;
-}
 
 std::string const VERSION_ERROR =
     "Error reading standard format of version and build number for Planar Firmware";

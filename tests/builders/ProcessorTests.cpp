@@ -10,21 +10,7 @@
 
 #include "BuilderFixture.h"
 
-using buildertest::childrenOf;
-using buildertest::hasBool;
-using buildertest::hasBytes;
-using buildertest::hasEnum;
-using buildertest::hasNodeType;
-using buildertest::hasString;
-using buildertest::hasUnsigned;
-using buildertest::hasUnsignedList;
-using buildertest::lacksProperty;
-using buildertest::nodesOfType;
-using buildertest::propertyIds;
-using buildertest::StructureLists;
-using buildertest::TestMI;
-using smbiostest::Structure;
-using smbiostest::TableBuilder;
+using namespace buildertest;
 
 namespace {
 
@@ -150,6 +136,21 @@ Structure cache(uint16_t handle, std::string const& socket, unsigned int level) 
     return out;
 }
 
+// A table of one default processor per value, with handles from 0x0400 up,
+// each with its value set by set(cpu, value).
+template <typename Value, typename Set>
+TableBuilder oneCpuPerValue(std::vector<Value> const& values, Set set) {
+    TableBuilder table;
+    uint16_t handle = 0x0400;
+    for (Value value : values) {
+        Cpu c;
+        c.handle = handle++;
+        set(c, value);
+        table.add(cpu(c));
+    }
+    return table;
+}
+
 // makeCpuNodes run on mi over the table, under a planar node added first
 // (node id 2); cpus holds the processor nodes (type 4) it made, in order.
 struct CpuRun {
@@ -163,28 +164,6 @@ struct CpuRun {
     IC::MutableNode* planar = nullptr;
     std::vector<IC::Node*> cpus;
 };
-
-// The captured log-output texts written under one logger, in order.
-std::vector<std::string> loggedBy(std::string const& loggerName) {
-    std::vector<std::string> texts;
-    for (QNLog::QNLogRecord const& record : QNLog::QNLogger::captured()) {
-        if (record.output == "log" && record.logger == loggerName) {
-            texts.push_back(record.text);
-        }
-    }
-    return texts;
-}
-
-// How many captured log-output texts contain text.
-size_t loggedCount(std::string const& text) {
-    size_t n = 0;
-    for (std::string const& logged : frametest::loggedTexts()) {
-        if (logged.find(text) != std::string::npos) {
-            ++n;
-        }
-    }
-    return n;
-}
 
 }  // namespace
 
@@ -348,18 +327,13 @@ TEST(ProcessorNodes, StatusWithReservedBit7SetStillMakesANode) {
 // status 1 through: those processors get no node at all.
 TEST(ProcessorNodes, StatusesDisabledByUserOrFirmwareOrIdleMakeNoNode) {
     smbiostest::LogCapture log;
-    TableBuilder table;
-    uint16_t handle = 0x0400;
-    for (uint8_t status : {uint8_t{0x42}, uint8_t{0x43}, uint8_t{0x44}}) {
-        Cpu c;
-        c.handle = handle++;
-        c.status = status;
-        c.coreCount = 1;
-        c.coreEnabled = 1;
-        table.add(cpu(c));
-    }
+    std::vector<uint8_t> const statuses = {uint8_t{0x42}, uint8_t{0x43}, uint8_t{0x44}};
     TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(mi, oneCpuPerValue(statuses, [](Cpu& c, uint8_t status) {
+                         c.status = status;
+                         c.coreCount = 1;
+                         c.coreEnabled = 1;
+                     }));
 
     EXPECT_EQ(1u, mi.nodeList.size());
     EXPECT_TRUE(run.cpus.empty());
@@ -371,19 +345,13 @@ TEST(ProcessorNodes, StatusesDisabledByUserOrFirmwareOrIdleMakeNoNode) {
 // Only status 1 reaches the node-status mapping; every other combination of
 // the populated bit and the CPU status bits is left out.
 TEST(ProcessorNodes, OnlyPopulatedWithCpuStatusOneIsSelected) {
-    TableBuilder table;
     std::vector<uint8_t> const statuses = {0x00, 0x01, 0x02, 0x07, 0x40, 0x41, 0x45,
                                            0x46, 0x47, 0x49, 0x61, 0x81, 0xC1, 0xFF};
-    uint16_t handle = 0x0400;
-    for (uint8_t status : statuses) {
-        Cpu c;
-        c.handle = handle++;
-        c.status = status;
-        c.socket = "Socket " + std::to_string(status);
-        table.add(cpu(c));
-    }
     TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(mi, oneCpuPerValue(statuses, [](Cpu& c, uint8_t status) {
+                         c.status = status;
+                         c.socket = "Socket " + std::to_string(status);
+                     }));
 
     // 0x41, 0x49 (bit 3 is outside the mask), 0x61 (bit 5 likewise) and 0xC1.
     ASSERT_EQ(4u, run.cpus.size());
@@ -455,18 +423,12 @@ TEST(ProcessorNodes, ProcessorIdIsStoredAsItsEightBytesReversed) {
 
 TEST(ProcessorNodes, SteppingIsTheLowNibbleOfTheFirstIdByteAsDecimalText) {
     smbiostest::LogCapture log;
-    TableBuilder table;
     std::vector<uint8_t> const firstBytes = {0x00, 0x07, 0xA9, 0x5C};
     std::vector<std::string> const steppings = {"0", "7", "9", "12"};
-    uint16_t handle = 0x0400;
-    for (uint8_t first : firstBytes) {
-        Cpu c;
-        c.handle = handle++;
-        c.id = 0xBFEBFBFF00090600ull | first;
-        table.add(cpu(c));
-    }
     TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(mi, oneCpuPerValue(firstBytes, [](Cpu& c, uint8_t first) {
+                         c.id = 0xBFEBFBFF00090600ull | first;
+                     }));
 
     ASSERT_EQ(4u, run.cpus.size());
     for (size_t i = 0; i < run.cpus.size(); ++i) {
@@ -477,18 +439,11 @@ TEST(ProcessorNodes, SteppingIsTheLowNibbleOfTheFirstIdByteAsDecimalText) {
 }
 
 TEST(ProcessorNodes, UpgradeOtherAndUnknownGiveZeroThreeGivesOneAbove22GiveZero) {
-    TableBuilder table;
     std::vector<uint8_t> const upgrades = {1, 2, 3, 22, 23, 0x2B};
     std::vector<long long> const values = {0, 0, 1, 20, 0, 0};
-    uint16_t handle = 0x0400;
-    for (uint8_t upgrade : upgrades) {
-        Cpu c;
-        c.handle = handle++;
-        c.upgrade = upgrade;
-        table.add(cpu(c));
-    }
     TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(
+        mi, oneCpuPerValue(upgrades, [](Cpu& c, uint8_t upgrade) { c.upgrade = upgrade; }));
 
     ASSERT_EQ(upgrades.size(), run.cpus.size());
     for (size_t i = 0; i < run.cpus.size(); ++i) {
@@ -498,18 +453,11 @@ TEST(ProcessorNodes, UpgradeOtherAndUnknownGiveZeroThreeGivesOneAbove22GiveZero)
 }
 
 TEST(ProcessorNodes, CharacteristicsBit2GivesSixtyFourElseThirtyTwo) {
-    TableBuilder table;
     std::vector<uint16_t> const words = {0x0004, 0x0006, 0x00FB, 0x0000, 0xFFFF};
     std::vector<unsigned int> const widths = {64, 64, 32, 32, 64};
-    uint16_t handle = 0x0400;
-    for (uint16_t word : words) {
-        Cpu c;
-        c.handle = handle++;
-        c.characteristics = word;
-        table.add(cpu(c));
-    }
     TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(
+        mi, oneCpuPerValue(words, [](Cpu& c, uint16_t word) { c.characteristics = word; }));
 
     ASSERT_EQ(words.size(), run.cpus.size());
     for (size_t i = 0; i < run.cpus.size(); ++i) {

@@ -10,20 +10,7 @@
 
 #include "BuilderFixture.h"
 
-using buildertest::childrenOf;
-using buildertest::hasBytes;
-using buildertest::hasDouble;
-using buildertest::hasNodeType;
-using buildertest::hasUnsigned;
-using buildertest::hasUnsignedList;
-using buildertest::lacksProperty;
-using buildertest::nodesOfType;
-using buildertest::propertyIds;
-using buildertest::StructureLists;
-using buildertest::TestMI;
-using smbiostest::LogCapture;
-using smbiostest::Structure;
-using smbiostest::TableBuilder;
+using namespace buildertest;
 
 namespace {
 
@@ -62,16 +49,6 @@ Probe at(uint8_t locationAndStatus) {
 }
 
 std::vector<unsigned int> const SENSOR_STATUSES = {1, 0, 21, 24, 27};
-
-size_t loggedCount(std::string const& text) {
-    size_t count = 0;
-    for (std::string const& logged : frametest::loggedTexts()) {
-        if (logged.find(text) != std::string::npos) {
-            ++count;
-        }
-    }
-    return count;
-}
 
 // The builder's own log texts, without the structure model's string-lookup
 // lines.

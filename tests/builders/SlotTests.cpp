@@ -13,18 +13,7 @@
 #include "BuilderFixture.h"
 #include "QNLog/QNLogger.h"
 
-using buildertest::addParent;
-using buildertest::hasEnum;
-using buildertest::hasNodeType;
-using buildertest::hasString;
-using buildertest::hasUnsigned;
-using buildertest::lacksProperty;
-using buildertest::nodesOfType;
-using buildertest::propertyIds;
-using buildertest::StructureLists;
-using buildertest::TestMI;
-using smbiostest::Structure;
-using smbiostest::TableBuilder;
+using namespace buildertest;
 
 namespace {
 
@@ -55,17 +44,6 @@ Structure slot(uint16_t handle, std::string const& designation, uint8_t slotType
         .word(slotId)
         .byte(0x0C)
         .byte(0x00);
-}
-
-// The texts the slot builder itself logged (log output only), in order.
-std::vector<std::string> slotLog() {
-    std::vector<std::string> texts;
-    for (QNLog::QNLogRecord const& record : QNLog::QNLogger::captured()) {
-        if (record.output == "log" && record.logger == SLOT_LOGGER) {
-            texts.push_back(record.text);
-        }
-    }
-    return texts;
 }
 
 // The slot nodes the builder makes from a table, under a planar.
@@ -120,7 +98,7 @@ TEST(SlotBuilder, SlotNodeFieldByField) {
     EXPECT_EQ(4u, run.mi.nextNodeId);
     EXPECT_EQ((std::vector<std::string>{"makeSlotNodes entry", "Table 9 length = 13",
                                         "makeSlotNodes exit"}),
-              slotLog())
+              loggedBy(SLOT_LOGGER))
         << log.dump();
 }
 
@@ -281,7 +259,7 @@ TEST(SlotBuilder, FailureInOneSlotIsLoggedAndTheNextSlotStillGetsANode) {
     EXPECT_TRUE(hasString(run.nodes[1], 108, "WHOLE"));
     EXPECT_TRUE(hasEnum(run.nodes[1], 128, 4, 22));
     EXPECT_TRUE(hasUnsigned(run.nodes[1], 270, 5));
-    std::vector<std::string> const texts = slotLog();
+    std::vector<std::string> const texts = loggedBy(SLOT_LOGGER);
     ASSERT_FALSE(texts.empty());
     EXPECT_EQ("makeSlotNodes exit", texts.back());
 }
