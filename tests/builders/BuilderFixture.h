@@ -138,6 +138,29 @@ inline ::testing::AssertionResult hasBytes(IC::Node const* node, unsigned int id
     return ::testing::AssertionSuccess();
 }
 
+// Node id, linked id, type, index, status and description in one check.
+inline ::testing::AssertionResult isNode(IC::Node const* node, unsigned int id,
+                                         unsigned int linkedId, unsigned int type,
+                                         unsigned int index, unsigned int status,
+                                         std::string const& description) {
+    if (node == nullptr) {
+        return ::testing::AssertionFailure() << "no node";
+    }
+    ::testing::AssertionResult typed = hasNodeType(node, type);
+    if (!typed) {
+        return typed;
+    }
+    if (node->getNodeId() != id || node->getLinkedId() != linkedId || node->getIndex() != index ||
+        node->getStatus() != status || node->getDescription() != description) {
+        return ::testing::AssertionFailure()
+               << "node {id " << node->getNodeId() << ", linked " << node->getLinkedId()
+               << ", index " << node->getIndex() << ", status " << node->getStatus() << ", \""
+               << node->getDescription() << "\"}, expected {id " << id << ", linked " << linkedId
+               << ", index " << index << ", status " << status << ", \"" << description << "\"}";
+    }
+    return ::testing::AssertionSuccess();
+}
+
 // The property ids set on a node, ascending.
 inline std::vector<unsigned int> propertyIds(IC::Node const* node) {
     std::vector<unsigned int> ids;
@@ -190,6 +213,67 @@ struct ParsedTable {
     SD::SmBios parsed;
     StructureLists lists;
 };
+
+// A table of the structures, in order.
+inline TableBuilder tableOf(std::vector<Structure> const& structures) {
+    TableBuilder table;
+    for (Structure const& structure : structures) {
+        table.add(structure);
+    }
+    return table;
+}
+
+// A parsed table with its structure lists, and a plug-in with a planar node
+// (id 2; the next id is 3) for a builder to hang its nodes under.
+struct PlanarSetup {
+    explicit PlanarSetup(TableBuilder const& table) : parsed(table.build()), lists(parsed) {
+        planar = addParent(mi);
+    }
+
+    SD::SmBios parsed;
+    StructureLists lists;
+    TestMI mi;
+    IC::MutableNode* planar = nullptr;
+};
+
+// A parsed table with its structure lists, and a parent node added to mi
+// (a planar unless told otherwise, node id 2) for the builder call that
+// follows; the log is captured from then on.
+struct ParentSetup {
+    ParentSetup(TestMI& mi, TableBuilder const& table, unsigned int type = 41)
+        : built(table), parent(addParent(mi, type)) {}
+
+    ParsedTable built;
+    IC::MutableNode* parent;
+    LogCapture log;
+};
+
+// Puts the structure first in the list of its type, as if it stood first in
+// the table.
+inline void putFirst(StructureLists& lists, SD::SmBios::Table const& structure) {
+    std::vector<IC::TableData>& list = lists.storage[structure.getType()];
+    list.insert(list.begin(), IC::TableData(&structure, structure.getLength()));
+}
+
+// The first failure logged is a std::out_of_range caught by a builder
+// ("Exception= Type=..."), naming the position (for example
+// "Table 8 index =0"), and the only failure logged, at the error level.
+inline ::testing::AssertionResult loggedOutOfRangeAt(std::string const& position) {
+    std::string const failure = firstLogged("Exception=");
+    if (failure.find("Exception= Type=") != 0 ||
+        failure.find("out_of_range") == std::string::npos ||
+        failure.find(position) == std::string::npos) {
+        return ::testing::AssertionFailure()
+               << "first failure logged is \"" << failure << "\", expected an out_of_range at \""
+               << position << "\"";
+    }
+    std::vector<int> const levels = loggedLevels("Exception=");
+    if (levels != std::vector<int>{6000}) {
+        return ::testing::AssertionFailure()
+               << levels.size() << " failure(s) logged, expected one at level 6000";
+    }
+    return ::testing::AssertionSuccess();
+}
 
 // The captured log-output texts written under one logger, in order.
 inline std::vector<std::string> loggedBy(std::string const& loggerName) {

@@ -156,9 +156,7 @@ TEST(ProcessorCacheNodes, HandleMatchingNothingMakesNoNodeAndLogsOnlyEntryCountA
 
 TEST(ProcessorCacheNodes, NoCacheStructuresLogCountZero) {
     smbiostest::LogCapture log;
-    TableBuilder table;
-    table.add(Structure(4, 0x0400).str("CPU0"));
-    CacheRun run(table, 0x0700);
+    CacheRun run(tableOf({Structure(4, 0x0400).str("CPU0")}), 0x0700);
 
     EXPECT_TRUE(run.nodes.empty());
     EXPECT_EQ((std::vector<std::string>{"makeCacheNodes entry handle=1792", "Table 7 count =0",

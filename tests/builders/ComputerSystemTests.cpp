@@ -18,6 +18,7 @@
 #include <sstream>
 #include <string>
 #include <thread>
+#include <utility>
 #include <vector>
 
 #include "BuilderFixture.h"
@@ -132,11 +133,8 @@ struct ComputerRun {
 };
 
 // The structures as a table ended by an End-of-Table structure.
-TableBuilder tableOf(std::vector<Structure> const& structures) {
-    TableBuilder table;
-    for (Structure const& structure : structures) {
-        table.add(structure);
-    }
+TableBuilder endedTableOf(std::vector<Structure> const& structures) {
+    TableBuilder table = tableOf(structures);
     table.endOfTable(0xFEFF);
     return table;
 }
@@ -204,7 +202,7 @@ std::string rewritten(std::string uuid) {
 }
 
 // The table the UUID rewrite tests acquire: one System Information structure.
-std::vector<uint8_t> uuidTable() { return tableOf({systemInformation(0x0100)}).build(); }
+std::vector<uint8_t> uuidTable() { return endedTableOf({systemInformation(0x0100)}).build(); }
 
 }  // namespace
 
@@ -228,12 +226,7 @@ TEST(ComputerSystemBuilder, FullStructureGivesOneComputerSystemNodeWithEveryProp
     ASSERT_EQ(1u, computers.size()) << log.dump();
     IC::Node const* node = computers[0];
     EXPECT_NE(nullptr, dynamic_cast<IC::CmptrNode const*>(node));
-    EXPECT_EQ(3u, node->getNodeId());
-    EXPECT_EQ(run.root->getNodeId(), node->getLinkedId());
-    EXPECT_TRUE(hasNodeType(node, 40));
-    EXPECT_EQ(0u, node->getIndex());
-    EXPECT_EQ(1u, node->getStatus());
-    EXPECT_EQ("Computer System", node->getDescription());
+    EXPECT_TRUE(isNode(node, 3u, run.root->getNodeId(), 40, 0u, 1u, "Computer System"));
     EXPECT_EQ(run.mi.miIdList, node->getMIIds());
     EXPECT_EQ(2u, run.mi.nodeList.size());
     EXPECT_EQ(4u, run.mi.nextNodeId);
@@ -303,8 +296,8 @@ TEST(ComputerSystemBuilder,
      TwoSystemStructuresWithoutBaseboardGetIndexesZeroAndOneEachWithItsOwnChassis) {
     REQUIRE_FRESH_TABLE();
     AcquiredComputerRun const acquired(
-        tableOf({systemInformation(0x0100, "First [1111AB1]"),
-                 systemInformation(0x0101, "Second [2222AB2]"), chassis(0x0300, 0x17)}),
+        endedTableOf({systemInformation(0x0100, "First [1111AB1]"),
+                      systemInformation(0x0101, "Second [2222AB2]"), chassis(0x0300, 0x17)}),
         2, 4);
     ComputerRun const& run = acquired.run;
     LogCapture const& log = acquired.log;
@@ -338,9 +331,9 @@ TEST(ComputerSystemBuilder,
 
 TEST(ComputerSystemBuilder, WithBaseboardOnlyTheFirstOfTwoSystemStructuresGetsANode) {
     REQUIRE_FRESH_TABLE();
-    AcquiredComputerRun const acquired(tableOf({systemInformation(0x0100, "First [1111AB1]"),
-                                                systemInformation(0x0101, "Second [2222AB2]"),
-                                                chassis(0x0300, 0x17), baseboard(0x0200)}),
+    AcquiredComputerRun const acquired(endedTableOf({systemInformation(0x0100, "First [1111AB1]"),
+                                                     systemInformation(0x0101, "Second [2222AB2]"),
+                                                     chassis(0x0300, 0x17), baseboard(0x0200)}),
                                        2, 4);
     ComputerRun const& run = acquired.run;
     LogCapture const& log = acquired.log;
@@ -359,8 +352,8 @@ TEST(ComputerSystemBuilder, WithBaseboardOnlyTheFirstOfTwoSystemStructuresGetsAN
 
 TEST(ComputerSystemBuilder, Smbios21StructureOfLength0x19LacksSkuAndFamily) {
     REQUIRE_FRESH_TABLE();
-    AcquiredComputerRun const acquired(tableOf({systemUpToSerial().bytes(UUID_BYTES).byte(0x06)}),
-                                       2, 3);
+    AcquiredComputerRun const acquired(
+        endedTableOf({systemUpToSerial().bytes(UUID_BYTES).byte(0x06)}), 2, 3);
     LogCapture const& log = acquired.log;
     ASSERT_EQ(0x19u, acquired.firstLength());
     ASSERT_EQ(1u, acquired.computers.size());
@@ -378,7 +371,7 @@ TEST(ComputerSystemBuilder, Smbios21StructureOfLength0x19LacksSkuAndFamily) {
 }
 
 TEST(ComputerSystemBuilder, Smbios20StructureOfLength8LacksUuidAndWakeUpType) {
-    AcquiredComputerRun const acquired(tableOf({systemUpToSerial("8837 Blade")}), 2, 0);
+    AcquiredComputerRun const acquired(endedTableOf({systemUpToSerial("8837 Blade")}), 2, 0);
     LogCapture const& log = acquired.log;
     ASSERT_EQ(8u, acquired.firstLength());
     ASSERT_EQ(1u, acquired.computers.size());
@@ -398,7 +391,7 @@ TEST(ComputerSystemBuilder, Smbios20StructureOfLength8LacksUuidAndWakeUpType) {
 TEST(ComputerSystemBuilder, StructureTooShortForTheUuidGetsNoUuidProperty) {
     // Length 0x17: the UUID field lacks its last byte.
     std::vector<uint8_t> const fifteen(UUID_BYTES.begin(), UUID_BYTES.begin() + 15);
-    AcquiredComputerRun const acquired(tableOf({systemUpToSerial().bytes(fifteen)}), 2, 6);
+    AcquiredComputerRun const acquired(endedTableOf({systemUpToSerial().bytes(fifteen)}), 2, 6);
     LogCapture const& log = acquired.log;
     ASSERT_EQ(0x17u, acquired.firstLength());
     ASSERT_EQ(1u, acquired.computers.size());
@@ -412,7 +405,7 @@ TEST(ComputerSystemBuilder, StructureTooShortForTheUuidGetsNoUuidProperty) {
 
 TEST(ComputerSystemBuilder, StructureEndingRightAfterTheUuidGetsTheUuidButNoWakeUpType) {
     REQUIRE_FRESH_TABLE();
-    AcquiredComputerRun const acquired(tableOf({systemUpToSerial().bytes(UUID_BYTES)}), 2, 6);
+    AcquiredComputerRun const acquired(endedTableOf({systemUpToSerial().bytes(UUID_BYTES)}), 2, 6);
     LogCapture const& log = acquired.log;
     ASSERT_EQ(0x18u, acquired.firstLength());
     ASSERT_EQ(1u, acquired.computers.size());
@@ -424,7 +417,7 @@ TEST(ComputerSystemBuilder, StructureEndingRightAfterTheUuidGetsTheUuidButNoWake
 
 TEST(ComputerSystemBuilder, Smbios24TableSetsTheUuidAsFormatted) {
     REQUIRE_FRESH_TABLE();
-    AcquiredComputerRun const acquired(tableOf({systemInformation(0x0100)}), 2, 4);
+    AcquiredComputerRun const acquired(endedTableOf({systemInformation(0x0100)}), 2, 4);
     LogCapture const& log = acquired.log;
     ASSERT_EQ(1u, acquired.computers.size());
     EXPECT_TRUE(hasString(acquired.computers[0], 64, UUID_AS_FORMATTED));
@@ -435,7 +428,7 @@ TEST(ComputerSystemBuilder, Smbios24TableSetsTheUuidAsFormatted) {
 
 TEST(ComputerSystemBuilder, Smbios26TableSetsTheUuidWithItsFirstThreeFieldsByteReversed) {
     REQUIRE_FRESH_TABLE();
-    AcquiredComputerRun const acquired(tableOf({systemInformation(0x0100)}), 2, 6);
+    AcquiredComputerRun const acquired(endedTableOf({systemInformation(0x0100)}), 2, 6);
     LogCapture const& log = acquired.log;
     ASSERT_EQ(1u, acquired.computers.size());
     EXPECT_TRUE(hasString(acquired.computers[0], 64, UUID_REORDERED));
@@ -659,44 +652,47 @@ TEST(ComputerSystemNode, OtherIdsAreAnsweredByTheStoredProperties) {
 // ---------------------------------------------------------------------------
 // IC::getPartNum
 
-TEST(ComputerSystemPartNumber, BracketedModelCodeYieldsItsFourDigits) {
-    EXPECT_EQ("7947", IC::getPartNum("[7947AC1]"));
-    EXPECT_EQ("7947", IC::getPartNum("System x3650 M3 -[7947AC1]-"));
+// One rule of the part number cut from a product name: the names it covers,
+// each with the part number it yields.
+struct PartNumberRule {
+    char const* name;  // for the test's name
+    std::vector<std::pair<std::string, std::string>> yields;
+};
+
+void PrintTo(PartNumberRule const& rule, std::ostream* out) { *out << rule.name; }
+
+class ComputerSystemPartNumberRule : public ::testing::TestWithParam<PartNumberRule> {};
+
+TEST_P(ComputerSystemPartNumberRule, YieldsThePartNumberOfEachName) {
+    for (auto const& name : GetParam().yields) {
+        EXPECT_EQ(name.second, IC::getPartNum(name.first)) << "\"" << name.first << "\"";
+    }
 }
 
-TEST(ComputerSystemPartNumber, NameBeginningWithFourDigitsYieldsThem) {
-    EXPECT_EQ("8837", IC::getPartNum("8837"));
-    EXPECT_EQ("8837", IC::getPartNum("8837 Blade"));
-    EXPECT_EQ("8837", IC::getPartNum("88371234"));
-}
-
-TEST(ComputerSystemPartNumber, BracketFollowedByNonDigitsYieldsEmptyWithoutFallingBack) {
-    EXPECT_EQ("", IC::getPartNum("8837 [AB12345]"));
-    EXPECT_EQ("", IC::getPartNum("8837 [794A123]"));
-}
-
-TEST(ComputerSystemPartNumber, OnlyTheFirstBracketCounts) {
-    EXPECT_EQ("", IC::getPartNum("1234 [AB]-[5678CC1]"));
-    EXPECT_EQ("5678", IC::getPartNum("[5678]-[AB12345]"));
-}
-
-TEST(ComputerSystemPartNumber, ShortNameOrNameWithoutDigitsYieldsEmpty) {
-    EXPECT_EQ("", IC::getPartNum(""));
-    EXPECT_EQ("", IC::getPartNum("8"));
-    EXPECT_EQ("", IC::getPartNum("883"));
-    EXPECT_EQ("", IC::getPartNum("883A"));
-    EXPECT_EQ("", IC::getPartNum("RS-7400"));
-}
-
-TEST(ComputerSystemPartNumber, BracketTooNearTheEndFallsBackToTheStart) {
-    // "[" at 4 in a name of 9 characters: 4 + 5 is not less than 9.
-    EXPECT_EQ("8837", IC::getPartNum("8837[1234"));
-    EXPECT_EQ("8837", IC::getPartNum("8837 [12]"));
-    EXPECT_EQ("", IC::getPartNum("Blade [1234"));
-    EXPECT_EQ("", IC::getPartNum("[1234"));
-    // One character more and the bracket counts.
-    EXPECT_EQ("1234", IC::getPartNum("8837[12345"));
-}
+INSTANTIATE_TEST_SUITE_P(
+    Rules, ComputerSystemPartNumberRule,
+    ::testing::Values(
+        PartNumberRule{"BracketedModelCodeYieldsItsFourDigits",
+                       {{"[7947AC1]", "7947"}, {"System x3650 M3 -[7947AC1]-", "7947"}}},
+        PartNumberRule{"NameBeginningWithFourDigitsYieldsThem",
+                       {{"8837", "8837"}, {"8837 Blade", "8837"}, {"88371234", "8837"}}},
+        PartNumberRule{"BracketFollowedByNonDigitsYieldsEmptyWithoutFallingBack",
+                       {{"8837 [AB12345]", ""}, {"8837 [794A123]", ""}}},
+        PartNumberRule{"OnlyTheFirstBracketCounts",
+                       {{"1234 [AB]-[5678CC1]", ""}, {"[5678]-[AB12345]", "5678"}}},
+        PartNumberRule{"ShortNameOrNameWithoutDigitsYieldsEmpty",
+                       {{"", ""}, {"8", ""}, {"883", ""}, {"883A", ""}, {"RS-7400", ""}}},
+        // "[" at 4 in a name of 9 characters: 4 + 5 is not less than 9; one
+        // character more and the bracket counts.
+        PartNumberRule{"BracketTooNearTheEndFallsBackToTheStart",
+                       {{"8837[1234", "8837"},
+                        {"8837 [12]", "8837"},
+                        {"Blade [1234", ""},
+                        {"[1234", ""},
+                        {"8837[12345", "1234"}}}),
+    [](::testing::TestParamInfo<PartNumberRule> const& info) {
+        return std::string(info.param.name);
+    });
 
 TEST(ComputerSystemPartNumber, EntryIsLogged) {
     smbiostest::LogCapture log;

@@ -67,28 +67,6 @@ Structure eventLog(uint16_t handle) {
         .byte(0x02);  // 0x16: descriptor length
 }
 
-// Node id, linked id, type, index, status and description in one check.
-::testing::AssertionResult isNode(IC::Node const* node, unsigned int id, unsigned int linkedId,
-                                  unsigned int type, unsigned int index, unsigned int status,
-                                  std::string const& description) {
-    if (node == nullptr) {
-        return ::testing::AssertionFailure() << "no node";
-    }
-    ::testing::AssertionResult typed = hasNodeType(node, type);
-    if (!typed) {
-        return typed;
-    }
-    if (node->getNodeId() != id || node->getLinkedId() != linkedId || node->getIndex() != index ||
-        node->getStatus() != status || node->getDescription() != description) {
-        return ::testing::AssertionFailure()
-               << "node {id " << node->getNodeId() << ", linked " << node->getLinkedId()
-               << ", index " << node->getIndex() << ", status " << node->getStatus() << ", \""
-               << node->getDescription() << "\"}, expected {id " << id << ", linked " << linkedId
-               << ", index " << index << ", status " << status << ", \"" << description << "\"}";
-    }
-    return ::testing::AssertionSuccess();
-}
-
 // The one event-log node hung under the node: type 35, index 0, the valid
 // log of eventLog().
 ::testing::AssertionResult hasEventLogChild(TestMI const& mi, IC::Node const* parent,
@@ -118,14 +96,6 @@ struct FirmwareRun {
         IC::MutableNode* planar = buildertest::addParent(mi);
         mi.makeFirmwareNodes(lists.get(), planar->getNodeId());
         firmware = firmwareNodes(mi);
-    }
-
-    static TableBuilder tableOf(std::vector<Structure> const& structures) {
-        TableBuilder table;
-        for (Structure const& structure : structures) {
-            table.add(structure);
-        }
-        return table;
     }
 
     SD::SmBios parsed;

@@ -241,12 +241,10 @@ TEST(MemoryNodes, ArraysAndInstalledDevicesFieldByField) {
 
 TEST(MemoryNodes, LegacyControllerAndModuleStructuresAreOnlyCounted) {
     smbiostest::LogCapture log;
-    TableBuilder table;
-    table.add(Structure(5, 0x0500).byte(3).byte(6).byte(1).byte(3));
-    table.add(Structure(5, 0x0501).byte(3).byte(6).byte(1).byte(3));
-    table.add(Structure(6, 0x0600).str("BANK_0").byte(0x01).byte(0).word(0x0001));
-    table.add(device(Device()));
-    DimmRun run(table);
+    DimmRun run(tableOf({Structure(5, 0x0500).byte(3).byte(6).byte(1).byte(3),
+                         Structure(5, 0x0501).byte(3).byte(6).byte(1).byte(3),
+                         Structure(6, 0x0600).str("BANK_0").byte(0x01).byte(0).word(0x0001),
+                         device(Device())}));
 
     EXPECT_EQ(2u, run.mi.nodeList.size());
     EXPECT_TRUE(run.arrays.empty());

@@ -177,13 +177,9 @@ TEST(ProcessorNodes, PopulatedEnabledProcessorWithCachesAndCoresFieldByField) {
     c.coreEnabled = 2;
     c.threadCount = 4;
     c.characteristics = 0x00FC;
-    TableBuilder table;
-    table.add(cache(0x0700, "L1-Cache", 1));
-    table.add(cache(0x0701, "L2-Cache", 2));
-    table.add(cache(0x0702, "L3-Cache", 3));
-    table.add(cpu(c));
     TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(mi, tableOf({cache(0x0700, "L1-Cache", 1), cache(0x0701, "L2-Cache", 2),
+                                  cache(0x0702, "L3-Cache", 3), cpu(c)}));
     ASSERT_EQ(2u, run.planar->getNodeId());
 
     // Planar, processor, three caches, two cores.
@@ -192,12 +188,7 @@ TEST(ProcessorNodes, PopulatedEnabledProcessorWithCachesAndCoresFieldByField) {
     ASSERT_EQ(1u, run.cpus.size());
     IC::Node const* node = run.cpus[0];
     EXPECT_EQ(node, mi.nodeList[1]);
-    EXPECT_TRUE(hasNodeType(node, 4));
-    EXPECT_EQ(3u, node->getNodeId());
-    EXPECT_EQ(2u, node->getLinkedId());
-    EXPECT_EQ(0u, node->getIndex());
-    EXPECT_EQ(1u, node->getStatus());
-    EXPECT_EQ("CPU 1", node->getDescription());
+    EXPECT_TRUE(isNode(node, 3u, 2u, 4, 0u, 1u, "CPU 1"));
     EXPECT_EQ(mi.miIdList, node->getMIIds());
     EXPECT_EQ((std::vector<unsigned int>{2,  15, 19,  36,  38,  45,  50,  53,  55,  80,
                                          87, 89, 124, 125, 189, 190, 296, 298, 304, 307}),
@@ -269,10 +260,8 @@ TEST(ProcessorNodes, PopulatedEnabledProcessorWithCachesAndCoresFieldByField) {
 TEST(ProcessorNodes, StatusPopulatedAndEnabledMakesANode) {
     Cpu c;
     c.status = 0x41;
-    TableBuilder table;
-    table.add(cpu(c));
     TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(mi, tableOf({cpu(c)}));
 
     ASSERT_EQ(1u, run.cpus.size());
     EXPECT_EQ(1u, run.cpus[0]->getStatus());
@@ -311,10 +300,8 @@ TEST(ProcessorNodes, StatusNotPopulatedOrDisabledByBiosMakesNoNodeAndNoCacheNode
 TEST(ProcessorNodes, StatusWithReservedBit7SetStillMakesANode) {
     Cpu c;
     c.status = 0xC1;
-    TableBuilder table;
-    table.add(cpu(c));
     TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(mi, tableOf({cpu(c)}));
 
     ASSERT_EQ(1u, run.cpus.size());
     EXPECT_EQ(1u, run.cpus[0]->getStatus());
@@ -372,11 +359,8 @@ TEST(ProcessorNodes, FirstProcessorSkippedSecondGetsIndexZeroAndDescriptionEndin
     Cpu present;
     present.handle = 0x0401;
     present.socket = "CPU1";
-    TableBuilder table;
-    table.add(cpu(absent));
-    table.add(cpu(present));
     TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(mi, tableOf({cpu(absent), cpu(present)}));
 
     ASSERT_EQ(1u, run.cpus.size());
     EXPECT_TRUE(hasString(run.cpus[0], 53, "CPU1"));
@@ -409,10 +393,8 @@ TEST(ProcessorNodes, DescriptionCountsFromOneWhileIndexCountsFromZero) {
 TEST(ProcessorNodes, ProcessorIdIsStoredAsItsEightBytesReversed) {
     Cpu c;
     c.id = 0x0123456789ABCDEFull;
-    TableBuilder table;
-    table.add(cpu(c));
     TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(mi, tableOf({cpu(c)}));
     ASSERT_EQ(0xEF, run.parsed.getTables()[0].getByte(0x08));
 
     ASSERT_EQ(1u, run.cpus.size());
@@ -478,11 +460,8 @@ TEST(ProcessorNodes, StructureEndingInsideCharacteristicsKeepsPropertiesSetSoFar
     c.coreCount = 2;
     c.coreEnabled = 2;
     c.threadCount = 2;
-    TableBuilder table;
-    table.add(cache(0x0700, "L1-Cache", 1));
-    table.add(cpu(c));
     TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(mi, tableOf({cache(0x0700, "L1-Cache", 1), cpu(c)}));
     ASSERT_EQ(0x27, run.parsed.getTables()[1].getLength());
 
     ASSERT_EQ(1u, run.cpus.size());
@@ -514,11 +493,8 @@ TEST(ProcessorNodes, FailingProcessorDoesNotStopTheNextOne) {
     Cpu whole;
     whole.handle = 0x0401;
     whole.socket = "CPU1";
-    TableBuilder table;
-    table.add(cpu(broken));
-    table.add(cpu(whole));
     TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(mi, tableOf({cpu(broken), cpu(whole)}));
 
     ASSERT_EQ(2u, run.cpus.size());
     EXPECT_TRUE(lacksProperty(run.cpus[0], 15));
@@ -536,12 +512,9 @@ TEST(ProcessorNodes, ThreeCacheCallsPerProcessorAndHandleFFFFMatchesNothing) {
     c.l1 = 0x0700;
     c.l2 = 0xFFFF;
     c.l3 = 0xFFFF;
-    TableBuilder table;
-    table.add(cache(0x0700, "L1-Cache", 1));
-    table.add(cache(0x0701, "L2-Cache", 2));
-    table.add(cpu(c));
     TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(mi,
+                     tableOf({cache(0x0700, "L1-Cache", 1), cache(0x0701, "L2-Cache", 2), cpu(c)}));
 
     EXPECT_EQ(3u, loggedCount("makeCacheNodes entry handle=")) << log.dump();
     EXPECT_EQ(1u, loggedCount("makeCacheNodes entry handle=1792")) << log.dump();
@@ -602,10 +575,8 @@ TEST(ProcessorNodes, FourCoresTwoEnabledEightThreads) {
     c.coreCount = 4;
     c.coreEnabled = 2;
     c.threadCount = 8;
-    TableBuilder table;
-    table.add(cpu(c));
     TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(mi, tableOf({cpu(c)}));
 
     ASSERT_EQ(1u, run.cpus.size());
     EXPECT_TRUE(hasUnsigned(run.cpus[0], 190, 4));
@@ -633,10 +604,8 @@ TEST(ProcessorNodes, ThreadCountZeroLeavesCoresWithoutThreadProperty) {
     c.coreCount = 2;
     c.coreEnabled = 1;
     c.threadCount = 0;
-    TableBuilder table;
-    table.add(cpu(c));
     TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(mi, tableOf({cpu(c)}));
 
     ASSERT_EQ(1u, run.cpus.size());
     EXPECT_TRUE(hasUnsigned(run.cpus[0], 87, 0));
@@ -658,10 +627,8 @@ TEST(ProcessorNodes, Level20StructureHasNoCoreDataAndLogsTheNoCoreSuffix) {
     c.coreCount = 4;
     c.coreEnabled = 4;
     c.threadCount = 8;
-    TableBuilder table;
-    table.add(cpu(c));
     TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(mi, tableOf({cpu(c)}));
     ASSERT_EQ(0x1A, run.parsed.getTables()[0].getLength());
 
     ASSERT_EQ(1u, run.cpus.size());
@@ -691,10 +658,8 @@ TEST(ProcessorNodes, CoreCountZeroMakesNoCoreNodes) {
     c.coreCount = 0;
     c.coreEnabled = 0;
     c.threadCount = 4;
-    TableBuilder table;
-    table.add(cpu(c));
     TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(mi, tableOf({cpu(c)}));
 
     EXPECT_TRUE(nodesOfType(mi, 42).empty());
     ASSERT_EQ(1u, run.cpus.size());
@@ -713,10 +678,8 @@ TEST(ProcessorNodes, EmptyStringsAreSetAsEmptyText) {
     c.serial = "";
     c.assetTag = "";
     c.partNumber = "";
-    TableBuilder table;
-    table.add(cpu(c));
     TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(mi, tableOf({cpu(c)}));
 
     ASSERT_EQ(1u, run.cpus.size());
     for (unsigned int id : {53u, 36u, 307u, 50u, 2u, 45u}) {
@@ -727,10 +690,8 @@ TEST(ProcessorNodes, EmptyStringsAreSetAsEmptyText) {
 
 TEST(ProcessorNodes, NoProcessorStructuresLogCountZeroAndMakeNothing) {
     smbiostest::LogCapture log;
-    TableBuilder table;
-    table.add(cache(0x0700, "L1-Cache", 1));
     TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(mi, tableOf({cache(0x0700, "L1-Cache", 1)}));
 
     EXPECT_EQ(1u, mi.nodeList.size());
     EXPECT_EQ(
