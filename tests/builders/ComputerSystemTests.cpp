@@ -157,6 +157,22 @@ struct AcquiredComputerRun {
     std::vector<IC::Node*> computers;
 };
 
+// The builder run over a table that the process also acquires (SMBIOS
+// 2.4), with what it writes to standard output meanwhile; the log is
+// captured from before the run on.
+struct PrintingComputerRun {
+    explicit PrintingComputerRun(TableBuilder const& table) : override(table.build(), 2, 4) {
+        ::testing::internal::CaptureStdout();
+        run.reset(new ComputerRun(table));
+        output = ::testing::internal::GetCapturedStdout();
+    }
+
+    OverrideTable override;
+    LogCapture log;
+    std::unique_ptr<ComputerRun> run;
+    std::string output;
+};
+
 // A System Information structure up to the serial number (SMBIOS 2.0,
 // length 8), to which a test adds the later fields.
 Structure systemUpToSerial(std::string const& product = "RS-7400") {
@@ -231,9 +247,7 @@ std::vector<uint8_t> uuidTable() { return endedTableOf({systemInformation(0x0100
 
 TEST(ComputerSystemBuilder, FullStructureGivesOneComputerSystemNodeWithEveryProperty) {
     REQUIRE_FRESH_TABLE();
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.endOfTable(0xFEFF);
+    TableBuilder const table = endedTableOf({systemInformation(0x0100)});
     OverrideTable override(table.build(), 2, 6);
     ScopedTimeZone zone("<-0230>2:30");
     smbiostest::LogCapture log;
@@ -485,21 +499,13 @@ TEST(ComputerSystemBuilder, ProductWithoutPartNumberAndEmptyTextsAreStillSet) {
 
 TEST(ComputerSystemBuilder, GroupMembersAreWrittenToStandardOutput) {
     REQUIRE_FRESH_TABLE();
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.add(group(0x0E00, "Cluster", {{3, 0x0300}, {1, 0x0100}, {4, 0x0400}}));
-    table.add(group(0x0E01, "Other", {{7, 0x0700}}));
-    table.endOfTable(0xFEFF);
-    OverrideTable override(table.build(), 2, 4);
-    smbiostest::LogCapture log;
-
-    ::testing::internal::CaptureStdout();
-    std::string output;
-    {
-        ComputerRun run(table);
-        output = ::testing::internal::GetCapturedStdout();
-        EXPECT_EQ(1u, nodesOfType(run.mi, 40).size());
-    }
+    PrintingComputerRun const printing(
+        endedTableOf({systemInformation(0x0100),
+                      group(0x0E00, "Cluster", {{3, 0x0300}, {1, 0x0100}, {4, 0x0400}}),
+                      group(0x0E01, "Other", {{7, 0x0700}})}));
+    std::string const& output = printing.output;
+    LogCapture const& log = printing.log;
+    EXPECT_EQ(1u, nodesOfType(printing.run->mi, 40).size());
 
     EXPECT_EQ((std::vector<std::string>{"Computer Node group member  Type=3 Handle=768",
                                         "Computer Node group member  Type=4 Handle=1024"}),
@@ -512,22 +518,12 @@ TEST(ComputerSystemBuilder, GroupMembersAreWrittenToStandardOutput) {
 
 TEST(ComputerSystemBuilder, WithBaseboardTheGroupLookupSeesTheEmptiedListsAndWritesNothing) {
     REQUIRE_FRESH_TABLE();
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.add(chassis(0x0300, 0x17));
-    table.add(baseboard(0x0200));
-    table.add(group(0x0E00, "Cluster", {{3, 0x0300}, {1, 0x0100}, {4, 0x0400}}));
-    table.endOfTable(0xFEFF);
-    OverrideTable override(table.build(), 2, 4);
-    smbiostest::LogCapture log;
-
-    ::testing::internal::CaptureStdout();
-    std::string output;
-    {
-        ComputerRun run(table);
-        output = ::testing::internal::GetCapturedStdout();
-        EXPECT_EQ(1u, nodesOfType(run.mi, 41).size()) << log.dump();
-    }
+    PrintingComputerRun const printing(
+        endedTableOf({systemInformation(0x0100), chassis(0x0300, 0x17), baseboard(0x0200),
+                      group(0x0E00, "Cluster", {{3, 0x0300}, {1, 0x0100}, {4, 0x0400}})}));
+    std::string const& output = printing.output;
+    LogCapture const& log = printing.log;
+    EXPECT_EQ(1u, nodesOfType(printing.run->mi, 41).size()) << log.dump();
 
     EXPECT_TRUE(linesWith(output, "Computer Node group member").empty()) << output;
     EXPECT_EQ(0u, log.count("  Target 1 handle 256")) << log.dump();
@@ -535,9 +531,7 @@ TEST(ComputerSystemBuilder, WithBaseboardTheGroupLookupSeesTheEmptiedListsAndWri
 
 TEST(ComputerSystemBuilder, TimeZoneOffsetIsStoredAtBuildTime) {
     REQUIRE_FRESH_TABLE();
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.endOfTable(0xFEFF);
+    TableBuilder const table = endedTableOf({systemInformation(0x0100)});
     OverrideTable override(table.build(), 2, 4);
     std::unique_ptr<ComputerRun> run;
     {
