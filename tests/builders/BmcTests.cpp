@@ -9,17 +9,7 @@
 
 #include "BuilderFixture.h"
 
-using buildertest::childrenOf;
-using buildertest::hasNodeType;
-using buildertest::hasString;
-using buildertest::hasUnsigned;
-using buildertest::nodesOfType;
-using buildertest::propertyIds;
-using buildertest::StructureLists;
-using buildertest::TestMI;
-using smbiostest::LogCapture;
-using smbiostest::Structure;
-using smbiostest::TableBuilder;
+using namespace buildertest;
 
 namespace {
 
@@ -52,10 +42,6 @@ Structure biosInformation(uint16_t handle) {
         .byte(0x02);
 }
 
-Structure oemStrings(uint16_t handle, std::string const& text) {
-    return Structure(11, handle).byte(1).addString(text);
-}
-
 // A System Event Log structure (type 15) of a valid, full log.
 Structure eventLog(uint16_t handle) {
     return Structure(15, handle)
@@ -71,28 +57,6 @@ Structure eventLog(uint16_t handle) {
         .byte(0x02);
 }
 
-// Node id, linked id, type, index, status and description in one check.
-::testing::AssertionResult isNode(IC::Node const* node, unsigned int id, unsigned int linkedId,
-                                  unsigned int type, unsigned int index, unsigned int status,
-                                  std::string const& description) {
-    if (node == nullptr) {
-        return ::testing::AssertionFailure() << "no node";
-    }
-    ::testing::AssertionResult typed = hasNodeType(node, type);
-    if (!typed) {
-        return typed;
-    }
-    if (node->getNodeId() != id || node->getLinkedId() != linkedId || node->getIndex() != index ||
-        node->getStatus() != status || node->getDescription() != description) {
-        return ::testing::AssertionFailure()
-               << "node {id " << node->getNodeId() << ", linked " << node->getLinkedId()
-               << ", index " << node->getIndex() << ", status " << node->getStatus() << ", \""
-               << node->getDescription() << "\"}, expected {id " << id << ", linked " << linkedId
-               << ", index " << index << ", status " << status << ", \"" << description << "\"}";
-    }
-    return ::testing::AssertionSuccess();
-}
-
 ::testing::AssertionResult isEventLog(IC::Node const* node, unsigned int id,
                                       unsigned int linkedId) {
     ::testing::AssertionResult shape =
@@ -101,16 +65,6 @@ Structure eventLog(uint16_t handle) {
         return shape;
     }
     return hasUnsigned(node, 37, 0x0800);
-}
-
-size_t loggedCount(std::string const& text) {
-    size_t count = 0;
-    for (std::string const& logged : frametest::loggedTexts()) {
-        if (logged.find(text) != std::string::npos) {
-            ++count;
-        }
-    }
-    return count;
 }
 
 // The position of the first logged text that contains text, or the number
@@ -133,34 +87,24 @@ TEST(BmcNodes, NoIpmiStructureMakesNoNodeAndRunsNeitherTheLogNorTheFirmwareBuild
     // Structures the two builders would turn into nodes.
     builder.add(biosInformation(0x0000));
     builder.add(eventLog(0x0F00));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* parent = buildertest::addParent(mi);
-    LogCapture log;
-    mi.makeBMCNodes(lists.get(), parent->getNodeId());
+    ParentSetup setup(mi, builder);
+    mi.makeBMCNodes(setup.built.lists.get(), setup.parent->getNodeId());
 
     EXPECT_EQ(1u, mi.nodeList.size());
     EXPECT_EQ((std::vector<std::string>{"makeBMCNodes entry", "makeBMCNodes exit"}),
               frametest::loggedTexts())
-        << log.dump();
-    EXPECT_EQ(0u, loggedCount("makeLogNodes entry")) << log.dump();
-    EXPECT_EQ(0u, loggedCount("makeFirmwareNodes entry")) << log.dump();
+        << setup.log.dump();
+    EXPECT_EQ(0u, loggedCount("makeLogNodes entry")) << setup.log.dump();
+    EXPECT_EQ(0u, loggedCount("makeFirmwareNodes entry")) << setup.log.dump();
 }
 
 TEST(BmcNodes, IpmiStructureMakesABmcNodeWithItsEventLogAndFirmwareNodes) {
     TestMI mi;
-    TableBuilder builder;
-    builder.add(biosInformation(0x0000));
-    builder.add(eventLog(0x0F00));
-    builder.add(ipmiDevice(0x2600));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* parent = buildertest::addParent(mi);
-    LogCapture log;
-    mi.makeBMCNodes(lists.get(), parent->getNodeId());
+    ParentSetup setup(mi, tableOf({biosInformation(0x0000), eventLog(0x0F00), ipmiDevice(0x2600)}));
+    mi.makeBMCNodes(setup.built.lists.get(), setup.parent->getNodeId());
 
     std::vector<IC::Node*> const bmcs = nodesOfType(mi, 13);
-    ASSERT_EQ(1u, bmcs.size()) << log.dump();
+    ASSERT_EQ(1u, bmcs.size()) << setup.log.dump();
     IC::Node const* bmc = bmcs[0];
     EXPECT_TRUE(isNode(bmc, 3, 2, 13, 0, 1, "BMC"));
     EXPECT_EQ(std::vector<unsigned int>{1}, bmc->getMIIds());
@@ -179,31 +123,24 @@ TEST(BmcNodes, IpmiStructureMakesABmcNodeWithItsEventLogAndFirmwareNodes) {
     EXPECT_TRUE(isEventLog(firmwareChildren[0], 6, 5));
     EXPECT_EQ(5u, mi.nodeList.size());
 
-    EXPECT_EQ(1u, loggedCount("Table 38 length = 18")) << log.dump();
+    EXPECT_EQ(1u, loggedCount("Table 38 length = 18")) << setup.log.dump();
     // The event-log builder runs before the firmware builder.
     size_t const logEntry = loggedPosition("makeLogNodes entry");
     size_t const firmwareEntry = loggedPosition("makeFirmwareNodes entry");
-    EXPECT_LT(loggedPosition("Table 38 length = 18"), logEntry) << log.dump();
-    EXPECT_LT(logEntry, firmwareEntry) << log.dump();
-    EXPECT_LT(firmwareEntry, loggedPosition("makeBMCNodes exit")) << log.dump();
+    EXPECT_LT(loggedPosition("Table 38 length = 18"), logEntry) << setup.log.dump();
+    EXPECT_LT(logEntry, firmwareEntry) << setup.log.dump();
+    EXPECT_LT(firmwareEntry, loggedPosition("makeBMCNodes exit")) << setup.log.dump();
 }
 
 TEST(BmcNodes, TwoIpmiStructuresMakeTwoBmcNodesEachWithItsOwnLogAndFirmwareNodes) {
     TestMI mi;
-    TableBuilder builder;
-    builder.add(ipmiDevice(0x2600));
-    builder.add(oemStrings(0x0B00, "Corvane Diagnostics -[D1-2.10]-"));
-    builder.add(biosInformation(0x0000));
-    builder.add(eventLog(0x0F00));
-    builder.add(ipmiDevice(0x2601));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* parent = buildertest::addParent(mi);
-    LogCapture log;
-    mi.makeBMCNodes(lists.get(), parent->getNodeId());
+    ParentSetup setup(
+        mi, tableOf({ipmiDevice(0x2600), oemStrings(0x0B00, {"Corvane Diagnostics -[D1-2.10]-"}),
+                     biosInformation(0x0000), eventLog(0x0F00), ipmiDevice(0x2601)}));
+    mi.makeBMCNodes(setup.built.lists.get(), setup.parent->getNodeId());
 
     std::vector<IC::Node*> const bmcs = nodesOfType(mi, 13);
-    ASSERT_EQ(2u, bmcs.size()) << log.dump();
+    ASSERT_EQ(2u, bmcs.size()) << setup.log.dump();
     // Per BMC: the BMC, its event log, the diagnostics firmware node and its
     // event log, the BIOS node and its event log: six node ids.
     for (unsigned int k = 0; k < 2; ++k) {
@@ -228,26 +165,21 @@ TEST(BmcNodes, TwoIpmiStructuresMakeTwoBmcNodesEachWithItsOwnLogAndFirmwareNodes
     }
     EXPECT_EQ(13u, mi.nodeList.size());
     EXPECT_EQ(2u, childrenOf(mi, 2).size());
-    EXPECT_EQ(2u, loggedCount("Table 38 length = 18")) << log.dump();
-    EXPECT_EQ(2u, loggedCount("makeFirmwareNodes entry")) << log.dump();
-    EXPECT_EQ(6u, loggedCount("makeLogNodes entry")) << log.dump();
+    EXPECT_EQ(2u, loggedCount("Table 38 length = 18")) << setup.log.dump();
+    EXPECT_EQ(2u, loggedCount("makeFirmwareNodes entry")) << setup.log.dump();
+    EXPECT_EQ(6u, loggedCount("makeLogNodes entry")) << setup.log.dump();
 }
 
 TEST(BmcNodes, WithoutEventLogAndFirmwareStructuresTheBmcNodeStandsAlone) {
     TestMI mi;
-    TableBuilder builder;
-    builder.add(ipmiDevice(0x2600));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* parent = buildertest::addParent(mi);
-    LogCapture log;
-    mi.makeBMCNodes(lists.get(), parent->getNodeId());
+    ParentSetup setup(mi, tableOf({ipmiDevice(0x2600)}));
+    mi.makeBMCNodes(setup.built.lists.get(), setup.parent->getNodeId());
 
     std::vector<IC::Node*> const bmcs = nodesOfType(mi, 13);
     ASSERT_EQ(1u, bmcs.size());
     EXPECT_TRUE(isNode(bmcs[0], 3, 2, 13, 0, 1, "BMC"));
     EXPECT_EQ(2u, mi.nodeList.size());
     // Both builders still ran, and found nothing.
-    EXPECT_EQ(1u, loggedCount("makeLogNodes entry")) << log.dump();
-    EXPECT_EQ(1u, loggedCount("makeFirmwareNodes entry")) << log.dump();
+    EXPECT_EQ(1u, loggedCount("makeLogNodes entry")) << setup.log.dump();
+    EXPECT_EQ(1u, loggedCount("makeFirmwareNodes entry")) << setup.log.dump();
 }

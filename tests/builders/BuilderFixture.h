@@ -1,12 +1,16 @@
 // Shared by the tests of the component builders: on top of the frame's
 // fixture (a plug-in object with its base state in reach, structure lists,
-// property checks), checks for the remaining property kinds and lookups of
-// the nodes a builder made.
+// property checks), checks for the remaining property kinds, lookups of the
+// nodes a builder made, the structures several builders read, and the log
+// texts of one builder. A test file takes the whole vocabulary with
+// `using namespace buildertest;`.
 #pragma once
 
 #include <gtest/gtest.h>
 
 #include <cmath>
+#include <cstddef>
+#include <cstdint>
 #include <string>
 #include <vector>
 
@@ -16,15 +20,22 @@
 
 namespace buildertest {
 
+using frametest::firstLogged;
 using frametest::hasNodeType;
 using frametest::hasStrings;
 using frametest::hasUnsigned;
 using frametest::hasUnsignedList;
 using frametest::hasVersion;
 using frametest::lacksProperty;
+using frametest::loggedLevels;
+using frametest::loggedTexts;
+using frametest::OverrideTable;
 using frametest::readProperty;
 using frametest::StructureLists;
 using frametest::TestMI;
+using smbiostest::LogCapture;
+using smbiostest::Structure;
+using smbiostest::TableBuilder;
 
 // Property id holds text equal to expected.
 inline ::testing::AssertionResult hasString(IC::Node const* node, unsigned int id,
@@ -47,8 +58,8 @@ inline ::testing::AssertionResult hasString(IC::Node const* node, unsigned int i
 
 // Property id holds an IC::EnumValue of the given width (1, 2 or 4 bytes)
 // and value.
-inline ::testing::AssertionResult hasEnum(IC::Node const* node, unsigned int id,
-                                          unsigned int width, long long expected) {
+inline ::testing::AssertionResult hasEnum(IC::Node const* node, unsigned int id, unsigned int width,
+                                          long long expected) {
     IC::PropertyValue value;
     ::testing::AssertionResult read = readProperty(node, id, value);
     if (!read) {
@@ -61,8 +72,7 @@ inline ::testing::AssertionResult hasEnum(IC::Node const* node, unsigned int id,
     if (value.getEnum().getWidth() != width || value.getEnum().getValue() != expected) {
         return ::testing::AssertionFailure()
                << "property " << id << " is " << value.getEnum().getValue() << " of width "
-               << value.getEnum().getWidth() << ", expected " << expected << " of width "
-               << width;
+               << value.getEnum().getWidth() << ", expected " << expected << " of width " << width;
     }
     return ::testing::AssertionSuccess();
 }
@@ -78,13 +88,13 @@ inline ::testing::AssertionResult hasDouble(IC::Node const* node, unsigned int i
     }
     if (value.getKind() != IC::PropertyValue::NUMBER ||
         value.getNumber().getKind() != IC::Number::DOUBLE) {
-        return ::testing::AssertionFailure() << "property " << id << " is " << value
-                                             << ", not a double number";
+        return ::testing::AssertionFailure()
+               << "property " << id << " is " << value << ", not a double number";
     }
     if (std::fabs(value.getNumber().getDouble() - expected) > 1e-6) {
-        return ::testing::AssertionFailure() << "property " << id << " is "
-                                             << value.getNumber().getDouble() << ", expected "
-                                             << expected;
+        return ::testing::AssertionFailure()
+               << "property " << id << " is " << value.getNumber().getDouble() << ", expected "
+               << expected;
     }
     return ::testing::AssertionSuccess();
 }
@@ -98,13 +108,13 @@ inline ::testing::AssertionResult hasBool(IC::Node const* node, unsigned int id,
     }
     if (value.getKind() != IC::PropertyValue::NUMBER ||
         value.getNumber().getKind() != IC::Number::BOOL) {
-        return ::testing::AssertionFailure() << "property " << id << " is " << value
-                                             << ", not a boolean number";
+        return ::testing::AssertionFailure()
+               << "property " << id << " is " << value << ", not a boolean number";
     }
     if (value.getNumber().getBool() != expected) {
-        return ::testing::AssertionFailure() << "property " << id << " is "
-                                             << value.getNumber().getBool() << ", expected "
-                                             << expected;
+        return ::testing::AssertionFailure()
+               << "property " << id << " is " << value.getNumber().getBool() << ", expected "
+               << expected;
     }
     return ::testing::AssertionSuccess();
 }
@@ -122,9 +132,31 @@ inline ::testing::AssertionResult hasBytes(IC::Node const* node, unsigned int id
                << "property " << id << " is of kind " << value.getKind() << ", not bytes";
     }
     if (value.getBytes() != expected) {
+        return ::testing::AssertionFailure() << "property " << id << " is " << value
+                                             << ", expected " << IC::PropertyValue(expected, true);
+    }
+    return ::testing::AssertionSuccess();
+}
+
+// Node id, linked id, type, index, status and description in one check.
+inline ::testing::AssertionResult isNode(IC::Node const* node, unsigned int id,
+                                         unsigned int linkedId, unsigned int type,
+                                         unsigned int index, unsigned int status,
+                                         std::string const& description) {
+    if (node == nullptr) {
+        return ::testing::AssertionFailure() << "no node";
+    }
+    ::testing::AssertionResult typed = hasNodeType(node, type);
+    if (!typed) {
+        return typed;
+    }
+    if (node->getNodeId() != id || node->getLinkedId() != linkedId || node->getIndex() != index ||
+        node->getStatus() != status || node->getDescription() != description) {
         return ::testing::AssertionFailure()
-               << "property " << id << " is " << value << ", expected "
-               << IC::PropertyValue(expected, true);
+               << "node {id " << node->getNodeId() << ", linked " << node->getLinkedId()
+               << ", index " << node->getIndex() << ", status " << node->getStatus() << ", \""
+               << node->getDescription() << "\"}, expected {id " << id << ", linked " << linkedId
+               << ", index " << index << ", status " << status << ", \"" << description << "\"}";
     }
     return ::testing::AssertionSuccess();
 }
@@ -172,6 +204,127 @@ inline IC::MutableNode* addParent(TestMI& mi, unsigned int type = 41) {
     IC::Node* added = parent;
     mi.addNewNode(added);
     return parent;
+}
+
+// A parsed table and its structure lists, as initialize hands them to the
+// builders.
+struct ParsedTable {
+    explicit ParsedTable(TableBuilder const& table) : parsed(table.build()), lists(parsed) {}
+    SD::SmBios parsed;
+    StructureLists lists;
+};
+
+// A table of the structures, in order.
+inline TableBuilder tableOf(std::vector<Structure> const& structures) {
+    TableBuilder table;
+    for (Structure const& structure : structures) {
+        table.add(structure);
+    }
+    return table;
+}
+
+// A parsed table with its structure lists, and a plug-in with a planar node
+// (id 2; the next id is 3) for a builder to hang its nodes under.
+struct PlanarSetup {
+    explicit PlanarSetup(TableBuilder const& table) : parsed(table.build()), lists(parsed) {
+        planar = addParent(mi);
+    }
+
+    SD::SmBios parsed;
+    StructureLists lists;
+    TestMI mi;
+    IC::MutableNode* planar = nullptr;
+};
+
+// A parsed table with its structure lists, and a parent node added to mi
+// (a planar unless told otherwise, node id 2) for the builder call that
+// follows; the log is captured from then on.
+struct ParentSetup {
+    ParentSetup(TestMI& mi, TableBuilder const& table, unsigned int type = 41)
+        : built(table), parent(addParent(mi, type)) {}
+
+    ParsedTable built;
+    IC::MutableNode* parent;
+    LogCapture log;
+};
+
+// Puts the structure first in the list of its type, as if it stood first in
+// the table.
+inline void putFirst(StructureLists& lists, SD::SmBios::Table const& structure) {
+    std::vector<IC::TableData>& list = lists.storage[structure.getType()];
+    list.insert(list.begin(), IC::TableData(&structure, structure.getLength()));
+}
+
+// The first failure logged is a std::out_of_range caught by a builder
+// ("Exception= Type=..."), naming the position (for example
+// "Table 8 index =0"), and the only failure logged, at the error level.
+inline ::testing::AssertionResult loggedOutOfRangeAt(std::string const& position) {
+    std::string const failure = firstLogged("Exception=");
+    if (failure.find("Exception= Type=") != 0 ||
+        failure.find("out_of_range") == std::string::npos ||
+        failure.find(position) == std::string::npos) {
+        return ::testing::AssertionFailure()
+               << "first failure logged is \"" << failure << "\", expected an out_of_range at \""
+               << position << "\"";
+    }
+    std::vector<int> const levels = loggedLevels("Exception=");
+    if (levels != std::vector<int>{6000}) {
+        return ::testing::AssertionFailure()
+               << levels.size() << " failure(s) logged, expected one at level 6000";
+    }
+    return ::testing::AssertionSuccess();
+}
+
+// The captured log-output texts written under one logger, in order.
+inline std::vector<std::string> loggedBy(std::string const& loggerName) {
+    std::vector<std::string> texts;
+    for (QNLog::QNLogRecord const& record : QNLog::QNLogger::captured()) {
+        if (record.output == "log" && record.logger == loggerName) {
+            texts.push_back(record.text);
+        }
+    }
+    return texts;
+}
+
+// How many captured log-output texts contain text.
+inline size_t loggedCount(std::string const& text) {
+    size_t n = 0;
+    for (std::string const& logged : loggedTexts()) {
+        if (logged.find(text) != std::string::npos) {
+            ++n;
+        }
+    }
+    return n;
+}
+
+// A structure's formatted area cut to length bytes (header included), with
+// the given strings (the empty ones left out) as its string set; the whole
+// structure when length reaches its end.
+inline Structure cutTo(Structure const& full, size_t length,
+                       std::vector<std::string> const& strings) {
+    if (length >= full.formattedSize()) {
+        return full;
+    }
+    std::vector<uint8_t> const bytes = full.build();
+    Structure cut(full.type(), full.handle());
+    cut.bytes(std::vector<uint8_t>(bytes.begin() + 4,
+                                   bytes.begin() + static_cast<std::ptrdiff_t>(length)));
+    for (std::string const& text : strings) {
+        if (!text.empty()) {
+            cut.addString(text);
+        }
+    }
+    return cut;
+}
+
+// An OEM Strings structure (type 11) whose Count is the number of strings.
+inline Structure oemStrings(uint16_t handle, std::vector<std::string> const& strings) {
+    Structure structure(11, handle);
+    structure.byte(static_cast<uint8_t>(strings.size()));
+    for (std::string const& text : strings) {
+        structure.addString(text);
+    }
+    return structure;
 }
 
 }  // namespace buildertest

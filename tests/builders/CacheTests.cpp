@@ -10,20 +10,7 @@
 
 #include "BuilderFixture.h"
 
-using buildertest::childrenOf;
-using buildertest::hasDouble;
-using buildertest::hasEnum;
-using buildertest::hasNodeType;
-using buildertest::hasString;
-using buildertest::hasUnsigned;
-using buildertest::hasUnsignedList;
-using buildertest::lacksProperty;
-using buildertest::nodesOfType;
-using buildertest::propertyIds;
-using buildertest::StructureLists;
-using buildertest::TestMI;
-using smbiostest::Structure;
-using smbiostest::TableBuilder;
+using namespace buildertest;
 
 namespace {
 
@@ -59,37 +46,9 @@ Structure cache(Cache const& c) {
         .byte(c.errorCorrection)
         .byte(c.systemType)
         .byte(c.associativity);
-    if (c.length >= full.formattedSize()) {
-        return full;
-    }
-    // The same fields cut to the length: the string number of the socket
-    // stays at offset 4 (when the length reaches it), its text in the set.
-    std::vector<uint8_t> const bytes = full.build();
-    Structure cut(7, c.handle);
-    cut.bytes(std::vector<uint8_t>(bytes.begin() + 4,
-                                   bytes.begin() + static_cast<std::ptrdiff_t>(c.length)));
-    if (!c.socket.empty()) {
-        cut.addString(c.socket);
-    }
-    return cut;
-}
-
-// A parsed table and its structure lists.
-struct Built {
-    explicit Built(TableBuilder const& table) : parsed(table.build()), lists(parsed) {}
-    SD::SmBios parsed;
-    StructureLists lists;
-};
-
-// The captured log-output texts written under one logger, in order.
-std::vector<std::string> loggedBy(std::string const& loggerName) {
-    std::vector<std::string> texts;
-    for (QNLog::QNLogRecord const& record : QNLog::QNLogger::captured()) {
-        if (record.output == "log" && record.logger == loggerName) {
-            texts.push_back(record.text);
-        }
-    }
-    return texts;
+    // Cut to the length: the string number of the socket stays at offset 4
+    // (when the length reaches it), its text in the set.
+    return cutTo(full, c.length, {c.socket});
 }
 
 // The cache nodes of one call for handle, under a processor node (id 2).
@@ -99,7 +58,7 @@ struct CacheRun {
         mi.makeCacheNodes(built.lists.get(), processor->getNodeId(), handle);
         nodes = nodesOfType(mi, 31);
     }
-    Built built;
+    ParsedTable built;
     TestMI mi;
     IC::MutableNode* processor = nullptr;
     std::vector<IC::Node*> nodes;
@@ -197,9 +156,7 @@ TEST(ProcessorCacheNodes, HandleMatchingNothingMakesNoNodeAndLogsOnlyEntryCountA
 
 TEST(ProcessorCacheNodes, NoCacheStructuresLogCountZero) {
     smbiostest::LogCapture log;
-    TableBuilder table;
-    table.add(Structure(4, 0x0400).str("CPU0"));
-    CacheRun run(table, 0x0700);
+    CacheRun run(tableOf({Structure(4, 0x0400).str("CPU0")}), 0x0700);
 
     EXPECT_TRUE(run.nodes.empty());
     EXPECT_EQ((std::vector<std::string>{"makeCacheNodes entry handle=1792", "Table 7 count =0",
@@ -407,7 +364,7 @@ TEST(ProcessorCacheNodes, StructureLongerThanSixButNotTenGetsLevelButNoSizes) {
         c.installedSize = 0;
         c.speed = 4;
     });
-    Built check(table);
+    ParsedTable check(table);
     ASSERT_EQ(7, check.parsed.getTables()[0].getLength());
     ASSERT_EQ(0x0A, check.parsed.getTables()[1].getLength());
     CacheRun run(table, 0x0700);
@@ -433,7 +390,7 @@ TEST(ProcessorCacheNodes, StructureLongerThanTenGetsSizes) {
         c.maximumSize = 0x8002;
         c.installedSize = 0x0040;
     });
-    Built check(table);
+    ParsedTable check(table);
     ASSERT_EQ(0x0B, check.parsed.getTables()[0].getLength());
     CacheRun run(table, 0x0700);
 

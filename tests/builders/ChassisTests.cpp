@@ -11,18 +11,7 @@
 
 #include "BuilderFixture.h"
 
-using buildertest::hasBytes;
-using buildertest::hasEnum;
-using buildertest::hasNodeType;
-using buildertest::hasString;
-using buildertest::hasUnsigned;
-using buildertest::lacksProperty;
-using buildertest::nodesOfType;
-using buildertest::propertyIds;
-using buildertest::StructureLists;
-using buildertest::TestMI;
-using smbiostest::Structure;
-using smbiostest::TableBuilder;
+using namespace buildertest;
 
 namespace {
 
@@ -218,12 +207,7 @@ TEST(ChassisBuilder, FullStructureGivesOneChassisNodeWithEveryProperty) {
     std::vector<IC::Node*> const nodes = run.chassisNodes();
     ASSERT_EQ(1u, nodes.size()) << log.dump();
     IC::Node const* node = nodes[0];
-    EXPECT_EQ(3u, node->getNodeId());
-    EXPECT_EQ(run.computer->getNodeId(), node->getLinkedId());
-    EXPECT_TRUE(hasNodeType(node, 1));
-    EXPECT_EQ(0u, node->getIndex());
-    EXPECT_EQ(1u, node->getStatus());
-    EXPECT_EQ("Chassis", node->getDescription());
+    EXPECT_TRUE(isNode(node, 3u, run.computer->getNodeId(), 1, 0u, 1u, "Chassis"));
     EXPECT_EQ(run.mi.miIdList, node->getMIIds());
     EXPECT_EQ(node, run.lists.storage[3][0].node);
 
@@ -287,15 +271,12 @@ TEST(ChassisBuilder, NoChassisStructureMakesNoChassisAndNoPlanar) {
 
 TEST(ChassisBuilder, ShortSmbios20StructureLacksTheLaterFields) {
     smbiostest::LogCapture log;
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.add(Structure(3, 0x0300)
-                  .str("Chassis Maker")
-                  .byte(MAIN_SERVER)
-                  .str("CV-1")
-                  .str("CH-7")
-                  .str("AT-9"));
-    ChassisRun run(table);
+    ChassisRun run(tableOf({systemInformation(0x0100), Structure(3, 0x0300)
+                                                           .str("Chassis Maker")
+                                                           .byte(MAIN_SERVER)
+                                                           .str("CV-1")
+                                                           .str("CH-7")
+                                                           .str("AT-9")}));
     ASSERT_EQ(9u, run.parsed.getTables()[1].getLength());
 
     std::vector<IC::Node*> const nodes = run.chassisNodes();
@@ -314,12 +295,8 @@ TEST(ChassisBuilder, ShortSmbios20StructureLacksTheLaterFields) {
 }
 
 TEST(ChassisBuilder, BaseboardAddsItsProductAndLocationToTheHomeChassis) {
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.add(chassis(0x0300, ofType(DESKTOP)));
-    table.add(chassis(0x0301, ofType(MAIN_SERVER)));
-    table.add(baseboard(0x0200));
-    ChassisRun run(table);
+    ChassisRun run(tableOf({systemInformation(0x0100), chassis(0x0300, ofType(DESKTOP)),
+                            chassis(0x0301, ofType(MAIN_SERVER)), baseboard(0x0200)}));
 
     std::vector<IC::Node*> const nodes = run.chassisNodes();
     ASSERT_EQ(2u, nodes.size());
@@ -449,9 +426,7 @@ TEST(ChassisFallback, NoSystemInformationStructureFallsBackToTheMissingTableSent
 }
 
 TEST(ChassisFallback, NoSystemInformationStructureKeepsTheChassisOwnTexts) {
-    TableBuilder table;
-    table.add(chassis(0x0300, ofType(TOWER)));
-    ChassisRun run(table);
+    ChassisRun run(tableOf({chassis(0x0300, ofType(TOWER))}));
     std::vector<IC::Node*> const nodes = run.chassisNodes();
     ASSERT_EQ(1u, nodes.size());
     EXPECT_TRUE(hasString(nodes[0], 36, "Chassis Maker"));
@@ -514,10 +489,7 @@ TEST(ChassisFallback, SystemTextsComeFromTheFirstSystemInformationStructure) {
 }
 
 TEST(ChassisFallback, ProductWithoutPartNumberSetsNoProperty45) {
-    TableBuilder table;
-    table.add(systemInformation(0x0100, "RS-7400"));
-    table.add(chassis(0x0300, ofType(TOWER)));
-    ChassisRun run(table);
+    ChassisRun run(tableOf({systemInformation(0x0100, "RS-7400"), chassis(0x0300, ofType(TOWER))}));
     std::vector<IC::Node*> const nodes = run.chassisNodes();
     ASSERT_EQ(1u, nodes.size());
     EXPECT_TRUE(lacksProperty(nodes[0], 45));
@@ -668,25 +640,22 @@ TEST(ChassisContainedElements, RecordsRunningPastTheStructureAreReadAsTheyStand)
     // Two records of one byte, of which only the first lies in the
     // formatted area; the second is the first byte of the string set, the
     // 'C' (67) of "Corvane".
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.add(Structure(3, 0x0300)
-                  .str("Corvane")
-                  .byte(DESKTOP)
-                  .str("")
-                  .str("")
-                  .str("")
-                  .byte(3)
-                  .byte(3)
-                  .byte(3)
-                  .byte(3)
-                  .dword(0)
-                  .byte(0)
-                  .byte(1)
-                  .byte(2)
-                  .byte(1)
-                  .byte(0x91));
-    ChassisRun run(table);
+    ChassisRun run(tableOf({systemInformation(0x0100), Structure(3, 0x0300)
+                                                           .str("Corvane")
+                                                           .byte(DESKTOP)
+                                                           .str("")
+                                                           .str("")
+                                                           .str("")
+                                                           .byte(3)
+                                                           .byte(3)
+                                                           .byte(3)
+                                                           .byte(3)
+                                                           .dword(0)
+                                                           .byte(0)
+                                                           .byte(1)
+                                                           .byte(2)
+                                                           .byte(1)
+                                                           .byte(0x91)}));
     ASSERT_EQ(0x16u, run.parsed.getTables()[1].getLength());
     EXPECT_EQ((std::vector<unsigned int>{17, 67}), loggedElements()) << log.dump();
     EXPECT_EQ(1u, run.chassisNodes().size());

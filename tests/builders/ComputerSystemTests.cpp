@@ -18,24 +18,12 @@
 #include <sstream>
 #include <string>
 #include <thread>
+#include <utility>
 #include <vector>
 
 #include "BuilderFixture.h"
 
-using buildertest::childrenOf;
-using buildertest::hasDouble;
-using buildertest::hasEnum;
-using buildertest::hasNodeType;
-using buildertest::hasString;
-using buildertest::hasUnsignedList;
-using buildertest::lacksProperty;
-using buildertest::nodesOfType;
-using buildertest::propertyIds;
-using buildertest::StructureLists;
-using buildertest::TestMI;
-using frametest::OverrideTable;
-using smbiostest::Structure;
-using smbiostest::TableBuilder;
+using namespace buildertest;
 
 namespace {
 
@@ -144,6 +132,73 @@ struct ComputerRun {
     IC::MutableNode* root = nullptr;
 };
 
+// The structures as a table ended by an End-of-Table structure.
+TableBuilder endedTableOf(std::vector<Structure> const& structures) {
+    TableBuilder table = tableOf(structures);
+    table.endOfTable(0xFEFF);
+    return table;
+}
+
+// The builder run over a table that the process also acquires, at the given
+// SMBIOS version, from its override file; the log is captured from the run
+// on, and computers holds the computer-system nodes made.
+struct AcquiredComputerRun {
+    AcquiredComputerRun(TableBuilder const& table, uint8_t major, uint8_t minor)
+        : override(table.build(), major, minor), run(table) {
+        computers = nodesOfType(run.mi, 40);
+    }
+
+    // The length of the first structure as the table model parsed it.
+    unsigned int firstLength() const { return run.parsed.getTables()[0].getLength(); }
+
+    OverrideTable override;
+    LogCapture log;
+    ComputerRun run;
+    std::vector<IC::Node*> computers;
+};
+
+// The builder run over a table that the process also acquires (SMBIOS
+// 2.4), with what it writes to standard output meanwhile; the log is
+// captured from before the run on.
+struct PrintingComputerRun {
+    explicit PrintingComputerRun(TableBuilder const& table) : override(table.build(), 2, 4) {
+        ::testing::internal::CaptureStdout();
+        run.reset(new ComputerRun(table));
+        output = ::testing::internal::GetCapturedStdout();
+    }
+
+    OverrideTable override;
+    LogCapture log;
+    std::unique_ptr<ComputerRun> run;
+    std::string output;
+};
+
+// A System Information structure up to the serial number (SMBIOS 2.0,
+// length 8), to which a test adds the later fields.
+Structure systemUpToSerial(std::string const& product = "RS-7400") {
+    return Structure(1, 0x0100).str("Corvane").str(product).str("V1.2").str("SYS-0001");
+}
+
+// How many captured messages contain each text (every output counted, as
+// LogCapture::count does), all checked at once: each pair is the expected
+// count and the text.
+::testing::AssertionResult loggedCounts(
+    LogCapture const& log, std::vector<std::pair<size_t, std::string>> const& expected) {
+    std::ostringstream wrong;
+    for (auto const& entry : expected) {
+        size_t const count = log.count(entry.second);
+        if (count != entry.first) {
+            wrong << "\n  \"" << entry.second << "\" " << count << " time(s), expected "
+                  << entry.first;
+        }
+    }
+    if (!wrong.str().empty()) {
+        return ::testing::AssertionFailure() << "captured messages:" << wrong.str() << "\n"
+                                             << log.dump();
+    }
+    return ::testing::AssertionSuccess();
+}
+
 // The property as stored on the node (not computed by getProperty).
 IC::PropertyValue stored(IC::Node const* node, unsigned int id) {
     auto const& properties = node->getProperties();
@@ -183,12 +238,7 @@ std::string rewritten(std::string uuid) {
 }
 
 // The table the UUID rewrite tests acquire: one System Information structure.
-std::vector<uint8_t> uuidTable() {
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.endOfTable(0xFEFF);
-    return table.build();
-}
+std::vector<uint8_t> uuidTable() { return endedTableOf({systemInformation(0x0100)}).build(); }
 
 }  // namespace
 
@@ -197,9 +247,7 @@ std::vector<uint8_t> uuidTable() {
 
 TEST(ComputerSystemBuilder, FullStructureGivesOneComputerSystemNodeWithEveryProperty) {
     REQUIRE_FRESH_TABLE();
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.endOfTable(0xFEFF);
+    TableBuilder const table = endedTableOf({systemInformation(0x0100)});
     OverrideTable override(table.build(), 2, 6);
     ScopedTimeZone zone("<-0230>2:30");
     smbiostest::LogCapture log;
@@ -212,12 +260,7 @@ TEST(ComputerSystemBuilder, FullStructureGivesOneComputerSystemNodeWithEveryProp
     ASSERT_EQ(1u, computers.size()) << log.dump();
     IC::Node const* node = computers[0];
     EXPECT_NE(nullptr, dynamic_cast<IC::CmptrNode const*>(node));
-    EXPECT_EQ(3u, node->getNodeId());
-    EXPECT_EQ(run.root->getNodeId(), node->getLinkedId());
-    EXPECT_TRUE(hasNodeType(node, 40));
-    EXPECT_EQ(0u, node->getIndex());
-    EXPECT_EQ(1u, node->getStatus());
-    EXPECT_EQ("Computer System", node->getDescription());
+    EXPECT_TRUE(isNode(node, 3u, run.root->getNodeId(), 40, 0u, 1u, "Computer System"));
     EXPECT_EQ(run.mi.miIdList, node->getMIIds());
     EXPECT_EQ(2u, run.mi.nodeList.size());
     EXPECT_EQ(4u, run.mi.nextNodeId);
@@ -253,10 +296,10 @@ TEST(ComputerSystemBuilder, FullStructureGivesOneComputerSystemNodeWithEveryProp
     EXPECT_EQ(IC::Number::DOUBLE, zone127.getNumber().getKind());
     EXPECT_DOUBLE_EQ(-2.0, zone127.getNumber().getDouble());
 
-    EXPECT_EQ(2u, log.count("makeComputerNodes entry")) << log.dump();
-    EXPECT_EQ(2u, log.count("makeComputerNodes exit")) << log.dump();
-    EXPECT_EQ(2u, log.count("Table 1 length = 27")) << log.dump();
-    EXPECT_EQ(0u, log.count("PlatformUtilities::uuid_unparse error")) << log.dump();
+    EXPECT_TRUE(loggedCounts(log, {{2, "makeComputerNodes entry"},
+                                   {2, "makeComputerNodes exit"},
+                                   {2, "Table 1 length = 27"},
+                                   {0, "PlatformUtilities::uuid_unparse error"}}));
     // No chassis structure: the chassis builder ran and made nothing.
     EXPECT_EQ(2u, log.count("makeChassisNodes entry")) << log.dump();
     EXPECT_EQ(0u, log.count("makePlanarNodes entry")) << log.dump();
@@ -286,16 +329,13 @@ TEST(ComputerSystemBuilder, NoSystemInformationStructureMakesNoNodeAndNothingBel
 TEST(ComputerSystemBuilder,
      TwoSystemStructuresWithoutBaseboardGetIndexesZeroAndOneEachWithItsOwnChassis) {
     REQUIRE_FRESH_TABLE();
-    TableBuilder table;
-    table.add(systemInformation(0x0100, "First [1111AB1]"));
-    table.add(systemInformation(0x0101, "Second [2222AB2]"));
-    table.add(chassis(0x0300, 0x17));
-    table.endOfTable(0xFEFF);
-    OverrideTable override(table.build(), 2, 4);
-    smbiostest::LogCapture log;
-    ComputerRun run(table);
-
-    std::vector<IC::Node*> const computers = nodesOfType(run.mi, 40);
+    AcquiredComputerRun const acquired(
+        endedTableOf({systemInformation(0x0100, "First [1111AB1]"),
+                      systemInformation(0x0101, "Second [2222AB2]"), chassis(0x0300, 0x17)}),
+        2, 4);
+    ComputerRun const& run = acquired.run;
+    LogCapture const& log = acquired.log;
+    std::vector<IC::Node*> const& computers = acquired.computers;
     ASSERT_EQ(2u, computers.size()) << log.dump();
     EXPECT_EQ(0u, computers[0]->getIndex());
     EXPECT_EQ(1u, computers[1]->getIndex());
@@ -325,19 +365,16 @@ TEST(ComputerSystemBuilder,
 
 TEST(ComputerSystemBuilder, WithBaseboardOnlyTheFirstOfTwoSystemStructuresGetsANode) {
     REQUIRE_FRESH_TABLE();
-    TableBuilder table;
-    table.add(systemInformation(0x0100, "First [1111AB1]"));
-    table.add(systemInformation(0x0101, "Second [2222AB2]"));
-    table.add(chassis(0x0300, 0x17));
-    table.add(baseboard(0x0200));
-    table.endOfTable(0xFEFF);
-    OverrideTable override(table.build(), 2, 4);
-    smbiostest::LogCapture log;
-    ComputerRun run(table);
+    AcquiredComputerRun const acquired(endedTableOf({systemInformation(0x0100, "First [1111AB1]"),
+                                                     systemInformation(0x0101, "Second [2222AB2]"),
+                                                     chassis(0x0300, 0x17), baseboard(0x0200)}),
+                                       2, 4);
+    ComputerRun const& run = acquired.run;
+    LogCapture const& log = acquired.log;
 
     // The planar builder takes every structure over while the first
     // computer system's subtree is built; the walk then finds the list empty.
-    std::vector<IC::Node*> const computers = nodesOfType(run.mi, 40);
+    std::vector<IC::Node*> const& computers = acquired.computers;
     ASSERT_EQ(1u, computers.size()) << log.dump();
     EXPECT_EQ(0u, computers[0]->getIndex());
     EXPECT_TRUE(hasString(computers[0], 39, "First [1111AB1]"));
@@ -349,23 +386,12 @@ TEST(ComputerSystemBuilder, WithBaseboardOnlyTheFirstOfTwoSystemStructuresGetsAN
 
 TEST(ComputerSystemBuilder, Smbios21StructureOfLength0x19LacksSkuAndFamily) {
     REQUIRE_FRESH_TABLE();
-    TableBuilder table;
-    table.add(Structure(1, 0x0100)
-                  .str("Corvane")
-                  .str("RS-7400")
-                  .str("V1.2")
-                  .str("SYS-0001")
-                  .bytes(UUID_BYTES)
-                  .byte(0x06));
-    table.endOfTable(0xFEFF);
-    OverrideTable override(table.build(), 2, 3);
-    smbiostest::LogCapture log;
-    ComputerRun run(table);
-    ASSERT_EQ(0x19u, run.parsed.getTables()[0].getLength());
-
-    std::vector<IC::Node*> const computers = nodesOfType(run.mi, 40);
-    ASSERT_EQ(1u, computers.size());
-    IC::Node const* node = computers[0];
+    AcquiredComputerRun const acquired(
+        endedTableOf({systemUpToSerial().bytes(UUID_BYTES).byte(0x06)}), 2, 3);
+    LogCapture const& log = acquired.log;
+    ASSERT_EQ(0x19u, acquired.firstLength());
+    ASSERT_EQ(1u, acquired.computers.size());
+    IC::Node const* node = acquired.computers[0];
     EXPECT_EQ((std::vector<unsigned int>{36, 39, 45, 50, 64, 65, 125, 126, 127, 307}),
               propertyIds(node));
     EXPECT_TRUE(lacksProperty(node, 52));
@@ -379,17 +405,11 @@ TEST(ComputerSystemBuilder, Smbios21StructureOfLength0x19LacksSkuAndFamily) {
 }
 
 TEST(ComputerSystemBuilder, Smbios20StructureOfLength8LacksUuidAndWakeUpType) {
-    TableBuilder table;
-    table.add(Structure(1, 0x0100).str("Corvane").str("8837 Blade").str("V1.2").str("SYS-0001"));
-    table.endOfTable(0xFEFF);
-    OverrideTable override(table.build(), 2, 0);
-    smbiostest::LogCapture log;
-    ComputerRun run(table);
-    ASSERT_EQ(8u, run.parsed.getTables()[0].getLength());
-
-    std::vector<IC::Node*> const computers = nodesOfType(run.mi, 40);
-    ASSERT_EQ(1u, computers.size());
-    IC::Node const* node = computers[0];
+    AcquiredComputerRun const acquired(endedTableOf({systemUpToSerial("8837 Blade")}), 2, 0);
+    LogCapture const& log = acquired.log;
+    ASSERT_EQ(8u, acquired.firstLength());
+    ASSERT_EQ(1u, acquired.computers.size());
+    IC::Node const* node = acquired.computers[0];
     EXPECT_EQ((std::vector<unsigned int>{36, 39, 45, 50, 125, 126, 127, 307}), propertyIds(node));
     EXPECT_TRUE(hasString(node, 36, "Corvane"));
     EXPECT_TRUE(hasString(node, 39, "8837 Blade"));
@@ -405,79 +425,47 @@ TEST(ComputerSystemBuilder, Smbios20StructureOfLength8LacksUuidAndWakeUpType) {
 TEST(ComputerSystemBuilder, StructureTooShortForTheUuidGetsNoUuidProperty) {
     // Length 0x17: the UUID field lacks its last byte.
     std::vector<uint8_t> const fifteen(UUID_BYTES.begin(), UUID_BYTES.begin() + 15);
-    TableBuilder table;
-    table.add(Structure(1, 0x0100)
-                  .str("Corvane")
-                  .str("RS-7400")
-                  .str("V1.2")
-                  .str("SYS-0001")
-                  .bytes(fifteen));
-    table.endOfTable(0xFEFF);
-    OverrideTable override(table.build(), 2, 6);
-    smbiostest::LogCapture log;
-    ComputerRun run(table);
-    ASSERT_EQ(0x17u, run.parsed.getTables()[0].getLength());
-
-    std::vector<IC::Node*> const computers = nodesOfType(run.mi, 40);
-    ASSERT_EQ(1u, computers.size());
-    EXPECT_TRUE(lacksProperty(computers[0], 64));
-    EXPECT_TRUE(lacksProperty(computers[0], 65));
-    EXPECT_TRUE(hasString(computers[0], 50, "SYS-0001"));
+    AcquiredComputerRun const acquired(endedTableOf({systemUpToSerial().bytes(fifteen)}), 2, 6);
+    LogCapture const& log = acquired.log;
+    ASSERT_EQ(0x17u, acquired.firstLength());
+    ASSERT_EQ(1u, acquired.computers.size());
+    IC::Node const* node = acquired.computers[0];
+    EXPECT_TRUE(lacksProperty(node, 64));
+    EXPECT_TRUE(lacksProperty(node, 65));
+    EXPECT_TRUE(hasString(node, 50, "SYS-0001"));
     EXPECT_EQ(2u, log.count("PlatformUtilities::uuid_unparse error ")) << log.dump();
     EXPECT_EQ(0u, log.count("reverse_uuid_byte_order entry")) << log.dump();
 }
 
 TEST(ComputerSystemBuilder, StructureEndingRightAfterTheUuidGetsTheUuidButNoWakeUpType) {
     REQUIRE_FRESH_TABLE();
-    TableBuilder table;
-    table.add(Structure(1, 0x0100)
-                  .str("Corvane")
-                  .str("RS-7400")
-                  .str("V1.2")
-                  .str("SYS-0001")
-                  .bytes(UUID_BYTES));
-    table.endOfTable(0xFEFF);
-    OverrideTable override(table.build(), 2, 6);
-    smbiostest::LogCapture log;
-    ComputerRun run(table);
-    ASSERT_EQ(0x18u, run.parsed.getTables()[0].getLength());
-
-    std::vector<IC::Node*> const computers = nodesOfType(run.mi, 40);
-    ASSERT_EQ(1u, computers.size());
-    EXPECT_TRUE(hasString(computers[0], 64, UUID_REORDERED));
-    EXPECT_TRUE(lacksProperty(computers[0], 65));
+    AcquiredComputerRun const acquired(endedTableOf({systemUpToSerial().bytes(UUID_BYTES)}), 2, 6);
+    LogCapture const& log = acquired.log;
+    ASSERT_EQ(0x18u, acquired.firstLength());
+    ASSERT_EQ(1u, acquired.computers.size());
+    IC::Node const* node = acquired.computers[0];
+    EXPECT_TRUE(hasString(node, 64, UUID_REORDERED));
+    EXPECT_TRUE(lacksProperty(node, 65));
     EXPECT_EQ(0u, log.count("PlatformUtilities::uuid_unparse error")) << log.dump();
 }
 
 TEST(ComputerSystemBuilder, Smbios24TableSetsTheUuidAsFormatted) {
     REQUIRE_FRESH_TABLE();
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.endOfTable(0xFEFF);
-    OverrideTable override(table.build(), 2, 4);
-    smbiostest::LogCapture log;
-    ComputerRun run(table);
-
-    std::vector<IC::Node*> const computers = nodesOfType(run.mi, 40);
-    ASSERT_EQ(1u, computers.size());
-    EXPECT_TRUE(hasString(computers[0], 64, UUID_AS_FORMATTED));
+    AcquiredComputerRun const acquired(endedTableOf({systemInformation(0x0100)}), 2, 4);
+    LogCapture const& log = acquired.log;
+    ASSERT_EQ(1u, acquired.computers.size());
+    EXPECT_TRUE(hasString(acquired.computers[0], 64, UUID_AS_FORMATTED));
     EXPECT_EQ(0u, log.count("Entering if condition UUID = ")) << log.dump();
-    EXPECT_EQ(2u, run.mi.getSmBiosMajorVersion());
-    EXPECT_EQ(4u, run.mi.getSmBiosMinorVersion());
+    EXPECT_EQ(2u, acquired.run.mi.getSmBiosMajorVersion());
+    EXPECT_EQ(4u, acquired.run.mi.getSmBiosMinorVersion());
 }
 
 TEST(ComputerSystemBuilder, Smbios26TableSetsTheUuidWithItsFirstThreeFieldsByteReversed) {
     REQUIRE_FRESH_TABLE();
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.endOfTable(0xFEFF);
-    OverrideTable override(table.build(), 2, 6);
-    smbiostest::LogCapture log;
-    ComputerRun run(table);
-
-    std::vector<IC::Node*> const computers = nodesOfType(run.mi, 40);
-    ASSERT_EQ(1u, computers.size());
-    EXPECT_TRUE(hasString(computers[0], 64, UUID_REORDERED));
+    AcquiredComputerRun const acquired(endedTableOf({systemInformation(0x0100)}), 2, 6);
+    LogCapture const& log = acquired.log;
+    ASSERT_EQ(1u, acquired.computers.size());
+    EXPECT_TRUE(hasString(acquired.computers[0], 64, UUID_REORDERED));
     EXPECT_EQ(2u, log.count("Entering if condition UUID = " + UUID_AS_FORMATTED)) << log.dump();
     EXPECT_EQ(2u, log.count("Exiting if condition UUID = " + UUID_REORDERED)) << log.dump();
 }
@@ -511,21 +499,13 @@ TEST(ComputerSystemBuilder, ProductWithoutPartNumberAndEmptyTextsAreStillSet) {
 
 TEST(ComputerSystemBuilder, GroupMembersAreWrittenToStandardOutput) {
     REQUIRE_FRESH_TABLE();
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.add(group(0x0E00, "Cluster", {{3, 0x0300}, {1, 0x0100}, {4, 0x0400}}));
-    table.add(group(0x0E01, "Other", {{7, 0x0700}}));
-    table.endOfTable(0xFEFF);
-    OverrideTable override(table.build(), 2, 4);
-    smbiostest::LogCapture log;
-
-    ::testing::internal::CaptureStdout();
-    std::string output;
-    {
-        ComputerRun run(table);
-        output = ::testing::internal::GetCapturedStdout();
-        EXPECT_EQ(1u, nodesOfType(run.mi, 40).size());
-    }
+    PrintingComputerRun const printing(
+        endedTableOf({systemInformation(0x0100),
+                      group(0x0E00, "Cluster", {{3, 0x0300}, {1, 0x0100}, {4, 0x0400}}),
+                      group(0x0E01, "Other", {{7, 0x0700}})}));
+    std::string const& output = printing.output;
+    LogCapture const& log = printing.log;
+    EXPECT_EQ(1u, nodesOfType(printing.run->mi, 40).size());
 
     EXPECT_EQ((std::vector<std::string>{"Computer Node group member  Type=3 Handle=768",
                                         "Computer Node group member  Type=4 Handle=1024"}),
@@ -538,22 +518,12 @@ TEST(ComputerSystemBuilder, GroupMembersAreWrittenToStandardOutput) {
 
 TEST(ComputerSystemBuilder, WithBaseboardTheGroupLookupSeesTheEmptiedListsAndWritesNothing) {
     REQUIRE_FRESH_TABLE();
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.add(chassis(0x0300, 0x17));
-    table.add(baseboard(0x0200));
-    table.add(group(0x0E00, "Cluster", {{3, 0x0300}, {1, 0x0100}, {4, 0x0400}}));
-    table.endOfTable(0xFEFF);
-    OverrideTable override(table.build(), 2, 4);
-    smbiostest::LogCapture log;
-
-    ::testing::internal::CaptureStdout();
-    std::string output;
-    {
-        ComputerRun run(table);
-        output = ::testing::internal::GetCapturedStdout();
-        EXPECT_EQ(1u, nodesOfType(run.mi, 41).size()) << log.dump();
-    }
+    PrintingComputerRun const printing(
+        endedTableOf({systemInformation(0x0100), chassis(0x0300, 0x17), baseboard(0x0200),
+                      group(0x0E00, "Cluster", {{3, 0x0300}, {1, 0x0100}, {4, 0x0400}})}));
+    std::string const& output = printing.output;
+    LogCapture const& log = printing.log;
+    EXPECT_EQ(1u, nodesOfType(printing.run->mi, 41).size()) << log.dump();
 
     EXPECT_TRUE(linesWith(output, "Computer Node group member").empty()) << output;
     EXPECT_EQ(0u, log.count("  Target 1 handle 256")) << log.dump();
@@ -561,9 +531,7 @@ TEST(ComputerSystemBuilder, WithBaseboardTheGroupLookupSeesTheEmptiedListsAndWri
 
 TEST(ComputerSystemBuilder, TimeZoneOffsetIsStoredAtBuildTime) {
     REQUIRE_FRESH_TABLE();
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.endOfTable(0xFEFF);
+    TableBuilder const table = endedTableOf({systemInformation(0x0100)});
     OverrideTable override(table.build(), 2, 4);
     std::unique_ptr<ComputerRun> run;
     {
@@ -633,30 +601,6 @@ TEST(ComputerSystemNode, Property127ForKolkataIsFiveHours) {
     EXPECT_EQ(2u, log.count("   Timezone=")) << log.dump();
 }
 
-TEST(ComputerSystemNode, Property127ForPlusFiveThirtyIsFiveHours) {
-    ScopedTimeZone zone("<+0530>-5:30");
-    IC::CmptrNode node(7, 2, {1}, 40, 0);
-    EXPECT_TRUE(hasDouble(&node, 127, 5.0));
-}
-
-TEST(ComputerSystemNode, Property127ForPlusFiveFortyFiveIsFiveHours) {
-    ScopedTimeZone zone("<+0545>-5:45");
-    IC::CmptrNode node(7, 2, {1}, 40, 0);
-    EXPECT_TRUE(hasDouble(&node, 127, 5.0));
-}
-
-TEST(ComputerSystemNode, Property127ForMinusThreeThirtyTruncatesTowardZero) {
-    ScopedTimeZone zone("<-0330>3:30");
-    IC::CmptrNode node(7, 2, {1}, 40, 0);
-    EXPECT_TRUE(hasDouble(&node, 127, -3.0));
-}
-
-TEST(ComputerSystemNode, Property127ForMinusTwoThirtyTruncatesTowardZero) {
-    ScopedTimeZone zone("<-0230>2:30");
-    IC::CmptrNode node(7, 2, {1}, 40, 0);
-    EXPECT_TRUE(hasDouble(&node, 127, -2.0));
-}
-
 TEST(ComputerSystemNode, Property127ForStJohnsTruncatesTowardZero) {
     ScopedTimeZone zone("America/St_Johns");
     long const offset = localOffsetSeconds();
@@ -668,11 +612,33 @@ TEST(ComputerSystemNode, Property127ForStJohnsTruncatesTowardZero) {
     EXPECT_TRUE(hasDouble(&node, 127, offset == -12600 ? -3.0 : -2.0));
 }
 
-TEST(ComputerSystemNode, Property127ForUtcIsZero) {
-    ScopedTimeZone zone("UTC0");
+// A fixed time zone and the whole hours property 127 gives under it: the
+// offset truncated toward zero.
+struct ZoneCase {
+    char const* name;  // for the test's name
+    char const* zone;
+    double hours;
+};
+
+void PrintTo(ZoneCase const& c, std::ostream* out) { *out << c.zone << " gives " << c.hours; }
+
+class ComputerSystemNodeZone : public ::testing::TestWithParam<ZoneCase> {};
+
+TEST_P(ComputerSystemNodeZone, Property127IsTheOffsetInWholeHoursTruncatedTowardZero) {
+    ScopedTimeZone zone(GetParam().zone);
     IC::CmptrNode node(7, 2, {1}, 40, 0);
-    EXPECT_TRUE(hasDouble(&node, 127, 0.0));
+    EXPECT_TRUE(hasDouble(&node, 127, GetParam().hours));
 }
+
+INSTANTIATE_TEST_SUITE_P(Zones, ComputerSystemNodeZone,
+                         ::testing::Values(ZoneCase{"PlusFiveThirty", "<+0530>-5:30", 5.0},
+                                           ZoneCase{"PlusFiveFortyFive", "<+0545>-5:45", 5.0},
+                                           ZoneCase{"MinusThreeThirty", "<-0330>3:30", -3.0},
+                                           ZoneCase{"MinusTwoThirty", "<-0230>2:30", -2.0},
+                                           ZoneCase{"Utc", "UTC0", 0.0}),
+                         [](::testing::TestParamInfo<ZoneCase> const& info) {
+                             return std::string(info.param.name);
+                         });
 
 TEST(ComputerSystemNode, OtherIdsAreAnsweredByTheStoredProperties) {
     IC::CmptrNode node(7, 2, {1}, 40, 3);
@@ -700,44 +666,47 @@ TEST(ComputerSystemNode, OtherIdsAreAnsweredByTheStoredProperties) {
 // ---------------------------------------------------------------------------
 // IC::getPartNum
 
-TEST(ComputerSystemPartNumber, BracketedModelCodeYieldsItsFourDigits) {
-    EXPECT_EQ("7947", IC::getPartNum("[7947AC1]"));
-    EXPECT_EQ("7947", IC::getPartNum("System x3650 M3 -[7947AC1]-"));
+// One rule of the part number cut from a product name: the names it covers,
+// each with the part number it yields.
+struct PartNumberRule {
+    char const* name;  // for the test's name
+    std::vector<std::pair<std::string, std::string>> yields;
+};
+
+void PrintTo(PartNumberRule const& rule, std::ostream* out) { *out << rule.name; }
+
+class ComputerSystemPartNumberRule : public ::testing::TestWithParam<PartNumberRule> {};
+
+TEST_P(ComputerSystemPartNumberRule, YieldsThePartNumberOfEachName) {
+    for (auto const& name : GetParam().yields) {
+        EXPECT_EQ(name.second, IC::getPartNum(name.first)) << "\"" << name.first << "\"";
+    }
 }
 
-TEST(ComputerSystemPartNumber, NameBeginningWithFourDigitsYieldsThem) {
-    EXPECT_EQ("8837", IC::getPartNum("8837"));
-    EXPECT_EQ("8837", IC::getPartNum("8837 Blade"));
-    EXPECT_EQ("8837", IC::getPartNum("88371234"));
-}
-
-TEST(ComputerSystemPartNumber, BracketFollowedByNonDigitsYieldsEmptyWithoutFallingBack) {
-    EXPECT_EQ("", IC::getPartNum("8837 [AB12345]"));
-    EXPECT_EQ("", IC::getPartNum("8837 [794A123]"));
-}
-
-TEST(ComputerSystemPartNumber, OnlyTheFirstBracketCounts) {
-    EXPECT_EQ("", IC::getPartNum("1234 [AB]-[5678CC1]"));
-    EXPECT_EQ("5678", IC::getPartNum("[5678]-[AB12345]"));
-}
-
-TEST(ComputerSystemPartNumber, ShortNameOrNameWithoutDigitsYieldsEmpty) {
-    EXPECT_EQ("", IC::getPartNum(""));
-    EXPECT_EQ("", IC::getPartNum("8"));
-    EXPECT_EQ("", IC::getPartNum("883"));
-    EXPECT_EQ("", IC::getPartNum("883A"));
-    EXPECT_EQ("", IC::getPartNum("RS-7400"));
-}
-
-TEST(ComputerSystemPartNumber, BracketTooNearTheEndFallsBackToTheStart) {
-    // "[" at 4 in a name of 9 characters: 4 + 5 is not less than 9.
-    EXPECT_EQ("8837", IC::getPartNum("8837[1234"));
-    EXPECT_EQ("8837", IC::getPartNum("8837 [12]"));
-    EXPECT_EQ("", IC::getPartNum("Blade [1234"));
-    EXPECT_EQ("", IC::getPartNum("[1234"));
-    // One character more and the bracket counts.
-    EXPECT_EQ("1234", IC::getPartNum("8837[12345"));
-}
+INSTANTIATE_TEST_SUITE_P(
+    Rules, ComputerSystemPartNumberRule,
+    ::testing::Values(
+        PartNumberRule{"BracketedModelCodeYieldsItsFourDigits",
+                       {{"[7947AC1]", "7947"}, {"System x3650 M3 -[7947AC1]-", "7947"}}},
+        PartNumberRule{"NameBeginningWithFourDigitsYieldsThem",
+                       {{"8837", "8837"}, {"8837 Blade", "8837"}, {"88371234", "8837"}}},
+        PartNumberRule{"BracketFollowedByNonDigitsYieldsEmptyWithoutFallingBack",
+                       {{"8837 [AB12345]", ""}, {"8837 [794A123]", ""}}},
+        PartNumberRule{"OnlyTheFirstBracketCounts",
+                       {{"1234 [AB]-[5678CC1]", ""}, {"[5678]-[AB12345]", "5678"}}},
+        PartNumberRule{"ShortNameOrNameWithoutDigitsYieldsEmpty",
+                       {{"", ""}, {"8", ""}, {"883", ""}, {"883A", ""}, {"RS-7400", ""}}},
+        // "[" at 4 in a name of 9 characters: 4 + 5 is not less than 9; one
+        // character more and the bracket counts.
+        PartNumberRule{"BracketTooNearTheEndFallsBackToTheStart",
+                       {{"8837[1234", "8837"},
+                        {"8837 [12]", "8837"},
+                        {"Blade [1234", ""},
+                        {"[1234", ""},
+                        {"8837[12345", "1234"}}}),
+    [](::testing::TestParamInfo<PartNumberRule> const& info) {
+        return std::string(info.param.name);
+    });
 
 TEST(ComputerSystemPartNumber, EntryIsLogged) {
     smbiostest::LogCapture log;
@@ -754,11 +723,11 @@ TEST(ComputerSystemUuid, Version24KeepsTheTextAsFormatted) {
     OverrideTable override(uuidTable(), 2, 4);
     smbiostest::LogCapture log;
     EXPECT_EQ(UUID_AS_FORMATTED, rewritten(UUID_AS_FORMATTED));
-    EXPECT_EQ(0u, log.count("Entering if condition UUID = ")) << log.dump();
-    EXPECT_EQ(2u, log.count("reverse_uuid_byte_order entry")) << log.dump();
-    EXPECT_EQ(2u, log.count("reverse_uuid_byte_order exit")) << log.dump();
-    EXPECT_EQ(2u, log.count("SmBios Major Version = 2")) << log.dump();
-    EXPECT_EQ(2u, log.count("SmBios Minor Version = 4")) << log.dump();
+    EXPECT_TRUE(loggedCounts(log, {{0, "Entering if condition UUID = "},
+                                   {2, "reverse_uuid_byte_order entry"},
+                                   {2, "reverse_uuid_byte_order exit"},
+                                   {2, "SmBios Major Version = 2"},
+                                   {2, "SmBios Minor Version = 4"}}));
 }
 
 TEST(ComputerSystemUuid, Version26ReordersTheFirstThreeFields) {

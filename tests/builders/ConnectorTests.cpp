@@ -11,16 +11,7 @@
 #include "QNLog/QNLogger.h"
 #include "smbios/SmBios.h"
 
-using buildertest::addParent;
-using buildertest::hasEnum;
-using buildertest::hasNodeType;
-using buildertest::hasString;
-using buildertest::nodesOfType;
-using buildertest::propertyIds;
-using buildertest::StructureLists;
-using buildertest::TestMI;
-using smbiostest::Structure;
-using smbiostest::TableBuilder;
+using namespace buildertest;
 
 namespace {
 
@@ -40,52 +31,27 @@ Structure connector(uint16_t handle, std::string const& internal, uint8_t portTy
         .byte(portType);
 }
 
-// The texts the connector builder itself logged (log output only), in order.
-std::vector<std::string> connectorLog() {
-    std::vector<std::string> texts;
-    for (QNLog::QNLogRecord const& record : QNLog::QNLogger::captured()) {
-        if (record.output == "log" && record.logger == CONNECTOR_LOGGER) {
-            texts.push_back(record.text);
-        }
-    }
-    return texts;
-}
-
 // The connector nodes the builder makes from a table, under a planar.
-struct ConnectorRun {
-    explicit ConnectorRun(TableBuilder const& table) : parsed(table.build()), lists(parsed) {
-        planar = addParent(mi);
-    }
+struct ConnectorRun : PlanarSetup {
+    using PlanarSetup::PlanarSetup;
 
     std::vector<IC::Node*> run() {
         mi.makeConnectorNodes(lists.get(), planar->getNodeId());
         return nodesOfType(mi, CONNECTOR_NODE);
     }
-
-    SD::SmBios parsed;
-    StructureLists lists;
-    TestMI mi;
-    IC::MutableNode* planar = nullptr;
 };
 
 }  // namespace
 
 TEST(ConnectorBuilder, ConnectorNodeFieldByField) {
     smbiostest::LogCapture log;
-    TableBuilder table;
-    table.add(connector(0x0800, "Compute ITE 1", 0x10, "USB 1"));
-    ConnectorRun setup(table);
+    ConnectorRun setup(tableOf({connector(0x0800, "Compute ITE 1", 0x10, "USB 1")}));
     std::vector<IC::Node*> const nodes = setup.run();
 
     ASSERT_EQ(1u, nodes.size());
     IC::Node const* node = nodes[0];
-    EXPECT_EQ(3u, node->getNodeId());
-    EXPECT_EQ(setup.planar->getNodeId(), node->getLinkedId());
-    EXPECT_TRUE(hasNodeType(node, 70));
-    EXPECT_EQ(0u, node->getIndex());
+    EXPECT_TRUE(isNode(node, 3u, setup.planar->getNodeId(), 70, 0u, 1u, "Port Connector"));
     EXPECT_EQ(setup.mi.miIdList, node->getMIIds());
-    EXPECT_EQ(1u, node->getStatus());
-    EXPECT_EQ("Port Connector", node->getDescription());
     EXPECT_EQ((std::vector<unsigned int>{108, 128}), propertyIds(node));
     EXPECT_TRUE(hasString(node, 108, "Compute ITE 1"));
     EXPECT_TRUE(hasEnum(node, 128, 1, 0x10));
@@ -94,14 +60,12 @@ TEST(ConnectorBuilder, ConnectorNodeFieldByField) {
     EXPECT_EQ(4u, setup.mi.nextNodeId);
     EXPECT_EQ((std::vector<std::string>{"makeConnectorNodes entry", "Table 8 length = 9",
                                         "makeConnectorNodes exit"}),
-              connectorLog())
+              loggedBy(CONNECTOR_LOGGER))
         << log.dump();
 }
 
 TEST(ConnectorBuilder, DesignatorBeginningWithComputeITEAndANumberBecomesANode) {
-    TableBuilder table;
-    table.add(connector(0x0800, "Compute ITE 12", 0x09));
-    ConnectorRun setup(table);
+    ConnectorRun setup(tableOf({connector(0x0800, "Compute ITE 12", 0x09)}));
     std::vector<IC::Node*> const nodes = setup.run();
 
     ASSERT_EQ(1u, nodes.size());
@@ -110,9 +74,7 @@ TEST(ConnectorBuilder, DesignatorBeginningWithComputeITEAndANumberBecomesANode) 
 }
 
 TEST(ConnectorBuilder, DesignatorWithWordsBeforeComputeITEBecomesANodeWithTheWholeText) {
-    TableBuilder table;
-    table.add(connector(0x0800, "Rear Panel Compute ITE 3 (LAN)", 0x1F));
-    ConnectorRun setup(table);
+    ConnectorRun setup(tableOf({connector(0x0800, "Rear Panel Compute ITE 3 (LAN)", 0x1F)}));
     std::vector<IC::Node*> const nodes = setup.run();
 
     ASSERT_EQ(1u, nodes.size());
@@ -121,11 +83,9 @@ TEST(ConnectorBuilder, DesignatorWithWordsBeforeComputeITEBecomesANodeWithTheWho
 }
 
 TEST(ConnectorBuilder, LowerCaseComputeIteMakesNoNode) {
-    TableBuilder table;
-    table.add(connector(0x0800, "compute ite 1", 0x09));
-    table.add(connector(0x0801, "COMPUTE ITE 2", 0x09));
-    table.add(connector(0x0802, "Compute Ite 3", 0x09));
-    ConnectorRun setup(table);
+    ConnectorRun setup(
+        tableOf({connector(0x0800, "compute ite 1", 0x09), connector(0x0801, "COMPUTE ITE 2", 0x09),
+                 connector(0x0802, "Compute Ite 3", 0x09)}));
 
     EXPECT_TRUE(setup.run().empty());
     EXPECT_EQ(3u, setup.mi.nextNodeId);
@@ -133,11 +93,9 @@ TEST(ConnectorBuilder, LowerCaseComputeIteMakesNoNode) {
 
 TEST(ConnectorBuilder, DesignatorWithoutComputeITEMakesNoNode) {
     smbiostest::LogCapture log;
-    TableBuilder table;
-    table.add(connector(0x0800, "J9", 0x09, "Compute ITE"));
-    table.add(connector(0x0801, "Compute", 0x09));
-    table.add(connector(0x0802, "ComputeITE 1", 0x09));
-    ConnectorRun setup(table);
+    ConnectorRun setup(
+        tableOf({connector(0x0800, "J9", 0x09, "Compute ITE"), connector(0x0801, "Compute", 0x09),
+                 connector(0x0802, "ComputeITE 1", 0x09)}));
 
     EXPECT_TRUE(setup.run().empty());
     EXPECT_EQ(1u, setup.mi.nodeList.size());
@@ -147,20 +105,16 @@ TEST(ConnectorBuilder, DesignatorWithoutComputeITEMakesNoNode) {
 }
 
 TEST(ConnectorBuilder, MissingDesignatorStringMakesNoNode) {
-    TableBuilder table;
-    table.add(Structure(8, 0x0800).strNumber(0).byte(0).str("Compute ITE 1").byte(0).byte(0x09));
-    ConnectorRun setup(table);
+    ConnectorRun setup(tableOf(
+        {Structure(8, 0x0800).strNumber(0).byte(0).str("Compute ITE 1").byte(0).byte(0x09)}));
 
     EXPECT_TRUE(setup.run().empty());
     EXPECT_EQ(3u, setup.mi.nextNodeId);
 }
 
 TEST(ConnectorBuilder, OnlyTheThirdOfThreeQualifiesGivesOneNodeWithIndexTwo) {
-    TableBuilder table;
-    table.add(connector(0x0800, "J1", 0x09));
-    table.add(connector(0x0801, "J2", 0x09));
-    table.add(connector(0x0802, "Compute ITE 7", 0x0E));
-    ConnectorRun setup(table);
+    ConnectorRun setup(tableOf({connector(0x0800, "J1", 0x09), connector(0x0801, "J2", 0x09),
+                                connector(0x0802, "Compute ITE 7", 0x0E)}));
     std::vector<IC::Node*> const nodes = setup.run();
 
     ASSERT_EQ(1u, nodes.size());
@@ -174,11 +128,9 @@ TEST(ConnectorBuilder, OnlyTheThirdOfThreeQualifiesGivesOneNodeWithIndexTwo) {
 }
 
 TEST(ConnectorBuilder, TwoQualifyingConnectorsKeepTheirGroupPositions) {
-    TableBuilder table;
-    table.add(connector(0x0800, "Compute ITE 1", 0x09));
-    table.add(connector(0x0801, "J2", 0x09));
-    table.add(connector(0x0802, "Compute ITE 2", 0x0D));
-    ConnectorRun setup(table);
+    ConnectorRun setup(
+        tableOf({connector(0x0800, "Compute ITE 1", 0x09), connector(0x0801, "J2", 0x09),
+                 connector(0x0802, "Compute ITE 2", 0x0D)}));
     std::vector<IC::Node*> const nodes = setup.run();
 
     ASSERT_EQ(2u, nodes.size());
@@ -190,9 +142,7 @@ TEST(ConnectorBuilder, TwoQualifyingConnectorsKeepTheirGroupPositions) {
 }
 
 TEST(ConnectorBuilder, PortTypeFFIsPassedThroughAsEnumeratedValue255) {
-    TableBuilder table;
-    table.add(connector(0x0800, "Compute ITE 1", 0xFF));
-    ConnectorRun setup(table);
+    ConnectorRun setup(tableOf({connector(0x0800, "Compute ITE 1", 0xFF)}));
     std::vector<IC::Node*> const nodes = setup.run();
 
     ASSERT_EQ(1u, nodes.size());
@@ -204,9 +154,7 @@ TEST(ConnectorBuilder, PortTypeFFIsPassedThroughAsEnumeratedValue255) {
 }
 
 TEST(ConnectorBuilder, EmptyConnectorGroupMakesNoNodesAndLogsOnlyEntryAndExit) {
-    TableBuilder table;
-    table.add(Structure(9, 0x0900).str("SLOT1").byte(0xA5));
-    ConnectorRun setup(table);
+    ConnectorRun setup(tableOf({Structure(9, 0x0900).str("SLOT1").byte(0xA5)}));
 
     smbiostest::LogCapture log;
     EXPECT_TRUE(setup.run().empty());
@@ -219,29 +167,22 @@ TEST(ConnectorBuilder, EmptyConnectorGroupMakesNoNodesAndLogsOnlyEntryAndExit) {
 
 TEST(ConnectorBuilder, FailureInOneConnectorIsLoggedAndTheNextStillGetsANode) {
     smbiostest::LogCapture log;
-    TableBuilder table;
-    table.add(connector(0x0801, "Compute ITE 2", 0x09));
-    ConnectorRun setup(table);
+    ConnectorRun setup(tableOf({connector(0x0801, "Compute ITE 2", 0x09)}));
     // A structure whose length byte promises more than its bytes hold: its
     // string set lies beyond its data, so the designator lookup throws.
     SD::SmBios::Table const broken(
         connector(0x0800, "Compute ITE 1", 0x09).length(0x40).noTerminator().build());
     ASSERT_EQ(0x40, broken.getLength());
-    setup.lists.storage[8].insert(setup.lists.storage[8].begin(),
-                                  IC::TableData(&broken, broken.getLength()));
+    putFirst(setup.lists, broken);
 
     std::vector<IC::Node*> const nodes = setup.run();
 
-    std::string const failure = frametest::firstLogged("Exception=");
-    EXPECT_EQ(0u, failure.find("Exception= Type=")) << log.dump();
-    EXPECT_NE(std::string::npos, failure.find("out_of_range")) << failure;
-    EXPECT_NE(std::string::npos, failure.find("Table 8 index =0")) << failure;
-    EXPECT_EQ((std::vector<int>{6000}), frametest::loggedLevels("Exception="));
+    EXPECT_TRUE(loggedOutOfRangeAt("Table 8 index =0")) << log.dump();
     ASSERT_EQ(1u, nodes.size());
     EXPECT_EQ(3u, nodes[0]->getNodeId());
     EXPECT_EQ(1u, nodes[0]->getIndex());
     EXPECT_TRUE(hasString(nodes[0], 108, "Compute ITE 2"));
-    std::vector<std::string> const texts = connectorLog();
+    std::vector<std::string> const texts = loggedBy(CONNECTOR_LOGGER);
     ASSERT_FALSE(texts.empty());
     EXPECT_EQ("makeConnectorNodes exit", texts.back());
 }

@@ -9,17 +9,7 @@
 
 #include "BuilderFixture.h"
 
-using buildertest::childrenOf;
-using buildertest::hasNodeType;
-using buildertest::hasString;
-using buildertest::hasUnsigned;
-using buildertest::nodesOfType;
-using buildertest::propertyIds;
-using buildertest::StructureLists;
-using buildertest::TestMI;
-using smbiostest::LogCapture;
-using smbiostest::Structure;
-using smbiostest::TableBuilder;
+using namespace buildertest;
 
 namespace {
 
@@ -32,32 +22,12 @@ std::string const NO_BLANK = "KVD string version number missing blank terminatio
 std::string const NO_BUILD = "KVD version string missing build id: ";
 std::string const NO_BUILD_END = "KVD version string missing build id end ']-': ";
 
-// An OEM Strings structure (type 11) whose Count is the number of strings.
-Structure oemStrings(uint16_t handle, std::vector<std::string> const& strings) {
-    Structure structure(11, handle);
-    structure.byte(static_cast<uint8_t>(strings.size()));
-    for (std::string const& text : strings) {
-        structure.addString(text);
-    }
-    return structure;
-}
-
 // The diagnostics nodes (type 53) in node-list order.
 std::vector<IC::Node*> kvdNodes(TestMI const& mi) { return nodesOfType(mi, 53); }
 
-size_t loggedCount(std::string const& text) {
-    size_t count = 0;
-    for (std::string const& logged : frametest::loggedTexts()) {
-        if (logged.find(text) != std::string::npos) {
-            ++count;
-        }
-    }
-    return count;
-}
-
 // Whether the exact text was logged (through the log output).
 bool loggedExactly(std::string const& text) {
-    for (std::string const& logged : frametest::loggedTexts()) {
+    for (std::string const& logged : loggedTexts()) {
         if (logged == text) {
             return true;
         }
@@ -65,16 +35,30 @@ bool loggedExactly(std::string const& text) {
     return false;
 }
 
-// Runs the builder on one structure holding the one string; returns the
-// number of nodes made.
-size_t runOnOneString(TestMI& mi, std::string const& text) {
-    TableBuilder builder;
-    builder.add(oemStrings(0x0B00, {text}));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    mi.makeKVDNode(lists.get(), planar->getNodeId());
-    return kvdNodes(mi).size();
+// The builder run on mi over a table, under a planar added first (node id
+// 2); the log is captured from the run on, and nodes holds the diagnostics
+// nodes made.
+struct KvdRun {
+    KvdRun(TestMI& mi, TableBuilder const& table) : built(table), planar(addParent(mi)) {
+        mi.makeKVDNode(built.lists.get(), planar->getNodeId());
+        nodes = kvdNodes(mi);
+    }
+
+    ParsedTable built;
+    IC::MutableNode* planar;
+    LogCapture log;
+    std::vector<IC::Node*> nodes;
+};
+
+// A table of OEM Strings structures, one per list of strings, with handles
+// from 0x0B00 up.
+TableBuilder oemTable(std::vector<std::vector<std::string>> const& structures) {
+    TableBuilder table;
+    uint16_t handle = 0x0B00;
+    for (std::vector<std::string> const& strings : structures) {
+        table.add(oemStrings(handle++, strings));
+    }
+    return table;
 }
 
 }  // namespace
@@ -82,23 +66,14 @@ size_t runOnOneString(TestMI& mi, std::string const& text) {
 TEST(KvdNode, ExampleStringMakesOneNodeWithEveryField) {
     TestMI mi;
     std::string const text = EYE + " 3.10 -[AB12C-3.10]-";
-    TableBuilder builder;
-    builder.add(oemStrings(0x0B00, {"Corvane Systems", text}));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    LogCapture log;
-    mi.makeKVDNode(lists.get(), planar->getNodeId());
+    KvdRun const run(mi, oemTable({{"Corvane Systems", text}}));
+    LogCapture const& log = run.log;
+    StructureLists const& lists = run.built.lists;
 
-    std::vector<IC::Node*> const nodes = kvdNodes(mi);
+    std::vector<IC::Node*> const& nodes = run.nodes;
     ASSERT_EQ(1u, nodes.size()) << log.dump();
     IC::Node const* node = nodes[0];
-    EXPECT_TRUE(hasNodeType(node, 53));
-    EXPECT_EQ(3u, node->getNodeId());
-    EXPECT_EQ(2u, node->getLinkedId());
-    EXPECT_EQ(0u, node->getIndex());
-    EXPECT_EQ(1u, node->getStatus());
-    EXPECT_EQ(DESCRIPTION, node->getDescription());
+    EXPECT_TRUE(isNode(node, 3u, 2u, 53, 0u, 1u, DESCRIPTION));
     EXPECT_EQ(std::vector<unsigned int>{1}, node->getMIIds());
     EXPECT_EQ((std::vector<unsigned int>{104, 107, 134, 171}), propertyIds(node));
     EXPECT_TRUE(hasString(node, 134, "3.10 -[AB12C-3.10]-"));
@@ -123,28 +98,24 @@ TEST(KvdNode, ExampleStringMakesOneNodeWithEveryField) {
         "makeKVDNodes exit",
     };
     std::vector<std::string> scan;
-    for (std::string const& logged : frametest::loggedTexts()) {
+    for (std::string const& logged : loggedTexts()) {
         if (logged.rfind("Table::", 0) != 0) {
             scan.push_back(logged);
         }
     }
     EXPECT_EQ(expected, scan) << log.dump();
-    EXPECT_EQ((std::vector<int>{3000}), frametest::loggedLevels("Found KVD version string: "));
+    EXPECT_EQ((std::vector<int>{3000}), loggedLevels("Found KVD version string: "));
 }
 
 TEST(KvdNode, NoOemStringsStructureMakesNoNode) {
     TestMI mi;
     TableBuilder builder;
     builder.add(Structure(1, 0x0100).str("Corvane"));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    LogCapture log;
-    mi.makeKVDNode(lists.get(), planar->getNodeId());
+    KvdRun const run(mi, builder);
+    LogCapture const& log = run.log;
 
     EXPECT_EQ(1u, mi.nodeList.size());
-    EXPECT_EQ((std::vector<std::string>{"makeKVDNodes entry", "makeKVDNodes exit"}),
-              frametest::loggedTexts())
+    EXPECT_EQ((std::vector<std::string>{"makeKVDNodes entry", "makeKVDNodes exit"}), loggedTexts())
         << log.dump();
 }
 
@@ -154,11 +125,8 @@ TEST(KvdNode, OemStringsWithoutTheEyeCatcherMakeNoNode) {
     // The eye-catcher is matched letter for letter, case included.
     builder.add(oemStrings(0x0B00, {"Corvane Preboot Diagnostics (KVD) 3.10 -[AB12C-3.10]-",
                                     "$ds corvane preboot diagnostics (kvd) 3.10 -[AB12C-3.10]-"}));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    LogCapture log;
-    mi.makeKVDNode(lists.get(), planar->getNodeId());
+    KvdRun const run(mi, builder);
+    LogCapture const& log = run.log;
 
     EXPECT_TRUE(kvdNodes(mi).empty());
     EXPECT_EQ(1u, loggedCount("Reading ix = 2")) << log.dump();
@@ -171,133 +139,82 @@ TEST(KvdNode, CountZeroReadsNoString) {
     Structure structure(11, 0x0B00);
     structure.byte(0).addString(EYE + " 3.10 -[AB12C-3.10]-");
     builder.add(structure);
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    LogCapture log;
-    mi.makeKVDNode(lists.get(), planar->getNodeId());
+    KvdRun const run(mi, builder);
+    LogCapture const& log = run.log;
 
     EXPECT_TRUE(kvdNodes(mi).empty());
     EXPECT_EQ(1u, loggedCount("String count = 0")) << log.dump();
     EXPECT_EQ(0u, loggedCount("Reading ix = ")) << log.dump();
 }
 
-TEST(KvdNode, EyeCatcherFollowedOnlyByBlanksIsMissingMajorVersionInfo) {
+// A string with the eye-catcher that the version grammar rejects: the
+// reason logged (followed by the string), and a text further logged exactly
+// or never logged, where the case says so.
+struct Rejection {
+    char const* name;  // for the test's name
+    std::string text;
+    std::string reason;
+    std::string alsoLogged;
+    std::string neverLogged;
+};
+
+void PrintTo(Rejection const& r, std::ostream* out) { *out << "\"" << r.text << "\""; }
+
+class KvdRejection : public ::testing::TestWithParam<Rejection> {};
+
+TEST_P(KvdRejection, MakesNoNodeAndLogsTheReasonWithTheString) {
+    Rejection const& rejection = GetParam();
     TestMI mi;
-    std::string const text = EYE + "   ";
-    LogCapture log;
-    EXPECT_EQ(0u, runOnOneString(mi, text));
-    EXPECT_TRUE(loggedExactly(MISSING_MAJOR + text)) << log.dump();
-    EXPECT_EQ((std::vector<int>{3000}), frametest::loggedLevels(MISSING_MAJOR));
-    EXPECT_EQ(0u, loggedCount("Found KVD version string: ")) << log.dump();
+    KvdRun const run(mi, oemTable({{rejection.text}}));
+    LogCapture const& log = run.log;
+    EXPECT_TRUE(run.nodes.empty());
+    EXPECT_TRUE(loggedExactly(rejection.reason + rejection.text)) << log.dump();
+    EXPECT_EQ((std::vector<int>{3000}), loggedLevels(rejection.reason));
+    if (!rejection.alsoLogged.empty()) {
+        EXPECT_TRUE(loggedExactly(rejection.alsoLogged)) << log.dump();
+    }
+    if (!rejection.neverLogged.empty()) {
+        EXPECT_EQ(0u, loggedCount(rejection.neverLogged)) << log.dump();
+    }
 }
 
-TEST(KvdNode, EyeCatcherAtTheVeryEndIsMissingMajorVersionInfo) {
-    TestMI mi;
-    std::string const text = "Corvane " + EYE;
-    LogCapture log;
-    EXPECT_EQ(0u, runOnOneString(mi, text));
-    EXPECT_TRUE(loggedExactly(MISSING_MAJOR + text)) << log.dump();
-}
-
-TEST(KvdNode, MajorWithoutDotIsNotXYForm) {
-    TestMI mi;
-    std::string const text = EYE + " 3 -[X]-";
-    LogCapture log;
-    EXPECT_EQ(0u, runOnOneString(mi, text));
-    EXPECT_TRUE(loggedExactly("Found KVD version string: 3 -[X]-")) << log.dump();
-    EXPECT_TRUE(loggedExactly(NOT_XY + text)) << log.dump();
-    EXPECT_EQ((std::vector<int>{3000}), frametest::loggedLevels(NOT_XY));
-}
-
-TEST(KvdNode, MajorRunningToTheEndIsNotXYForm) {
-    TestMI mi;
-    std::string const text = EYE + " 31";
-    LogCapture log;
-    EXPECT_EQ(0u, runOnOneString(mi, text));
-    EXPECT_TRUE(loggedExactly(NOT_XY + text)) << log.dump();
-}
-
-TEST(KvdNode, MinorNotFollowedByABlankIsMissingBlankTermination) {
-    TestMI mi;
-    std::string const text = EYE + " 3.1-[X]-";
-    LogCapture log;
-    EXPECT_EQ(0u, runOnOneString(mi, text));
-    EXPECT_TRUE(loggedExactly(NO_BLANK + text)) << log.dump();
-    EXPECT_EQ((std::vector<int>{3000}), frametest::loggedLevels(NO_BLANK));
-}
-
-TEST(KvdNode, MinorRunningToTheEndIsMissingBlankTermination) {
-    TestMI mi;
-    std::string const text = EYE + " 3.1";
-    LogCapture log;
-    EXPECT_EQ(0u, runOnOneString(mi, text));
-    EXPECT_TRUE(loggedExactly(NO_BLANK + text)) << log.dump();
-}
-
-TEST(KvdNode, BuildIdNotOpenedByDashBracketIsMissingBuildId) {
-    TestMI mi;
-    std::string const text = EYE + " 3.1 [X]-";
-    LogCapture log;
-    EXPECT_EQ(0u, runOnOneString(mi, text));
-    EXPECT_TRUE(loggedExactly(NO_BUILD + text)) << log.dump();
-    EXPECT_EQ((std::vector<int>{3000}), frametest::loggedLevels(NO_BUILD));
-}
-
-TEST(KvdNode, BlanksToTheEndAfterTheVersionAreMissingBuildId) {
-    TestMI mi;
-    std::string const text = EYE + " 3.1   ";
-    LogCapture log;
-    EXPECT_EQ(0u, runOnOneString(mi, text));
-    EXPECT_TRUE(loggedExactly(NO_BUILD + text)) << log.dump();
-}
-
-TEST(KvdNode, UnclosedBuildIdIsMissingBuildIdEnd) {
-    TestMI mi;
-    std::string const text = EYE + " 3.1 -[XYZ";
-    LogCapture log;
-    EXPECT_EQ(0u, runOnOneString(mi, text));
-    EXPECT_TRUE(loggedExactly(NO_BUILD_END + text)) << log.dump();
-    EXPECT_EQ((std::vector<int>{3000}), frametest::loggedLevels(NO_BUILD_END));
-}
-
-TEST(KvdNode, UnclosedOneCharacterBuildIdFailsTheLengthCheckBeforeTheEndSearch) {
-    TestMI mi;
-    // "-[X" leaves p + 4 equal to the length: the build-id start check
-    // rejects it before "]-" is looked for.
-    std::string const text = EYE + " 3.1 -[X";
-    LogCapture log;
-    EXPECT_EQ(0u, runOnOneString(mi, text));
-    EXPECT_TRUE(loggedExactly(NO_BUILD + text)) << log.dump();
-    EXPECT_EQ(0u, loggedCount(NO_BUILD_END)) << log.dump();
-}
-
-TEST(KvdNode, EmptyBuildIdIsRejected) {
-    TestMI mi;
-    // "-[]-" after the blanks: p + 4 is the length, so the start check
-    // already fails.
-    std::string const text = EYE + " 3.1 -[]-";
-    LogCapture log;
-    EXPECT_EQ(0u, runOnOneString(mi, text));
-    EXPECT_TRUE(loggedExactly(NO_BUILD + text)) << log.dump();
-}
-
-TEST(KvdNode, EndSearchStartsOnePastTheBuildIdStartSoAnEmptyBuildIdIsNotFound) {
-    TestMI mi;
-    // Long enough for the start check; "]-" sits at q, where the search does
-    // not look, and there is no later one.
-    std::string const text = EYE + " 3.1 -[]- ";
-    LogCapture log;
-    EXPECT_EQ(0u, runOnOneString(mi, text));
-    EXPECT_TRUE(loggedExactly(NO_BUILD_END + text)) << log.dump();
-}
+INSTANTIATE_TEST_SUITE_P(
+    Grammar, KvdRejection,
+    ::testing::Values(
+        Rejection{"EyeCatcherFollowedOnlyByBlanksIsMissingMajorVersionInfo", EYE + "   ",
+                  MISSING_MAJOR, "", "Found KVD version string: "},
+        Rejection{"EyeCatcherAtTheVeryEndIsMissingMajorVersionInfo", "Corvane " + EYE,
+                  MISSING_MAJOR, "", ""},
+        Rejection{"MajorWithoutDotIsNotXYForm", EYE + " 3 -[X]-", NOT_XY,
+                  "Found KVD version string: 3 -[X]-", ""},
+        Rejection{"MajorRunningToTheEndIsNotXYForm", EYE + " 31", NOT_XY, "", ""},
+        Rejection{"MinorNotFollowedByABlankIsMissingBlankTermination", EYE + " 3.1-[X]-", NO_BLANK,
+                  "", ""},
+        Rejection{"MinorRunningToTheEndIsMissingBlankTermination", EYE + " 3.1", NO_BLANK, "", ""},
+        Rejection{"BuildIdNotOpenedByDashBracketIsMissingBuildId", EYE + " 3.1 [X]-", NO_BUILD, "",
+                  ""},
+        Rejection{"BlanksToTheEndAfterTheVersionAreMissingBuildId", EYE + " 3.1   ", NO_BUILD, "",
+                  ""},
+        Rejection{"UnclosedBuildIdIsMissingBuildIdEnd", EYE + " 3.1 -[XYZ", NO_BUILD_END, "", ""},
+        // "-[X" leaves p + 4 equal to the length: the build-id start check
+        // rejects it before "]-" is looked for.
+        Rejection{"UnclosedOneCharacterBuildIdFailsTheLengthCheckBeforeTheEndSearch",
+                  EYE + " 3.1 -[X", NO_BUILD, "", NO_BUILD_END},
+        // "-[]-" after the blanks: p + 4 is the length, so the start check
+        // already fails.
+        Rejection{"EmptyBuildIdIsRejected", EYE + " 3.1 -[]-", NO_BUILD, "", ""},
+        // Long enough for the start check; "]-" sits at q, where the search
+        // does not look, and there is no later one.
+        Rejection{"EndSearchStartsOnePastTheBuildIdStartSoAnEmptyBuildIdIsNotFound",
+                  EYE + " 3.1 -[]- ", NO_BUILD_END, "", ""}),
+    [](::testing::TestParamInfo<Rejection> const& info) { return std::string(info.param.name); });
 
 TEST(KvdNode, EndSearchStartingOnePastTheBuildIdStartFindsALaterEnd) {
     TestMI mi;
     // The "]-" at q is skipped; the one after it ends a build id of "]-".
-    std::string const text = EYE + " 3.1 -[]-]-";
-    EXPECT_EQ(1u, runOnOneString(mi, text));
-    IC::Node const* node = kvdNodes(mi)[0];
+    KvdRun const run(mi, oemTable({{EYE + " 3.1 -[]-]-"}}));
+    ASSERT_EQ(1u, run.nodes.size());
+    IC::Node const* node = run.nodes[0];
     EXPECT_TRUE(hasString(node, 171, "]-"));
     EXPECT_TRUE(hasString(node, 134, "3.1 -[]-]-"));
 }
@@ -307,9 +224,9 @@ TEST(KvdNode, VersionTextStartsAtTheFirstNonBlankAndRunsToTheEnd) {
     // The eye-catcher may sit inside the string; several blanks before the
     // version and before the build id; text after the build id's end stays
     // in the version text.
-    std::string const text = "OEM: " + EYE + "    12.345   -[Z-9]- tail";
-    EXPECT_EQ(1u, runOnOneString(mi, text));
-    IC::Node const* node = kvdNodes(mi)[0];
+    KvdRun const run(mi, oemTable({{"OEM: " + EYE + "    12.345   -[Z-9]- tail"}}));
+    ASSERT_EQ(1u, run.nodes.size());
+    IC::Node const* node = run.nodes[0];
     EXPECT_TRUE(hasString(node, 134, "12.345   -[Z-9]- tail"));
     EXPECT_TRUE(hasUnsigned(node, 104, 12));
     EXPECT_TRUE(hasUnsigned(node, 107, 345));
@@ -318,15 +235,9 @@ TEST(KvdNode, VersionTextStartsAtTheFirstNonBlankAndRunsToTheEnd) {
 
 TEST(KvdNode, MissingDigitsGiveZero) {
     TestMI mi;
-    TableBuilder builder;
-    builder.add(oemStrings(0x0B00, {EYE + " .5 -[B1]-"}));
-    builder.add(oemStrings(0x0B01, {EYE + " 7. -[B2]-"}));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    mi.makeKVDNode(lists.get(), planar->getNodeId());
+    KvdRun const run(mi, oemTable({{EYE + " .5 -[B1]-"}, {EYE + " 7. -[B2]-"}}));
 
-    std::vector<IC::Node*> const nodes = kvdNodes(mi);
+    std::vector<IC::Node*> const& nodes = run.nodes;
     ASSERT_EQ(2u, nodes.size());
     EXPECT_TRUE(hasUnsigned(nodes[0], 104, 0));
     EXPECT_TRUE(hasUnsigned(nodes[0], 107, 5));
@@ -338,15 +249,10 @@ TEST(KvdNode, MissingDigitsGiveZero) {
 
 TEST(KvdNode, RejectedStringDoesNotEndTheScan) {
     TestMI mi;
-    TableBuilder builder;
-    builder.add(oemStrings(0x0B00, {EYE + " 3 -[X]-", EYE + " 4.2 -[GOOD]-"}));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    LogCapture log;
-    mi.makeKVDNode(lists.get(), planar->getNodeId());
+    KvdRun const run(mi, oemTable({{EYE + " 3 -[X]-", EYE + " 4.2 -[GOOD]-"}}));
+    LogCapture const& log = run.log;
 
-    std::vector<IC::Node*> const nodes = kvdNodes(mi);
+    std::vector<IC::Node*> const& nodes = run.nodes;
     ASSERT_EQ(1u, nodes.size()) << log.dump();
     EXPECT_TRUE(hasString(nodes[0], 134, "4.2 -[GOOD]-"));
     EXPECT_TRUE(hasUnsigned(nodes[0], 104, 4));
@@ -357,15 +263,10 @@ TEST(KvdNode, RejectedStringDoesNotEndTheScan) {
 
 TEST(KvdNode, TwoValidStringsInOneStructureOnlyTheFirstMakesANode) {
     TestMI mi;
-    TableBuilder builder;
-    builder.add(oemStrings(0x0B00, {EYE + " 1.1 -[FIRST]-", EYE + " 2.2 -[SECOND]-", "Other"}));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    LogCapture log;
-    mi.makeKVDNode(lists.get(), planar->getNodeId());
+    KvdRun const run(mi, oemTable({{EYE + " 1.1 -[FIRST]-", EYE + " 2.2 -[SECOND]-", "Other"}}));
+    LogCapture const& log = run.log;
 
-    std::vector<IC::Node*> const nodes = kvdNodes(mi);
+    std::vector<IC::Node*> const& nodes = run.nodes;
     ASSERT_EQ(1u, nodes.size());
     EXPECT_TRUE(hasString(nodes[0], 171, "FIRST"));
     EXPECT_TRUE(hasUnsigned(nodes[0], 104, 1));
@@ -377,15 +278,11 @@ TEST(KvdNode, TwoValidStringsInOneStructureOnlyTheFirstMakesANode) {
 
 TEST(KvdNode, SameStringsInTwoStructuresMakeTwoNodesWithIndex0And1) {
     TestMI mi;
-    TableBuilder builder;
-    builder.add(oemStrings(0x0B00, {EYE + " 1.1 -[FIRST]-", EYE + " 2.2 -[SECOND]-"}));
-    builder.add(oemStrings(0x0B01, {EYE + " 1.1 -[FIRST]-", EYE + " 2.2 -[SECOND]-"}));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    mi.makeKVDNode(lists.get(), planar->getNodeId());
+    KvdRun const run(mi, oemTable({{EYE + " 1.1 -[FIRST]-", EYE + " 2.2 -[SECOND]-"},
+                                   {EYE + " 1.1 -[FIRST]-", EYE + " 2.2 -[SECOND]-"}}));
+    StructureLists const& lists = run.built.lists;
 
-    std::vector<IC::Node*> const nodes = kvdNodes(mi);
+    std::vector<IC::Node*> const& nodes = run.nodes;
     ASSERT_EQ(2u, nodes.size());
     for (unsigned int i = 0; i < 2; ++i) {
         EXPECT_EQ(3u + i, nodes[i]->getNodeId());
@@ -400,17 +297,11 @@ TEST(KvdNode, SameStringsInTwoStructuresMakeTwoNodesWithIndex0And1) {
 
 TEST(KvdNode, IndexIsThePositionOfTheStructureAmongTheOemStrings) {
     TestMI mi;
-    TableBuilder builder;
-    builder.add(oemStrings(0x0B00, {"Corvane Systems"}));
-    builder.add(oemStrings(0x0B01, {EYE + " 3 -[bad]-"}));
-    builder.add(oemStrings(0x0B02, {EYE + " 5.0 -[K5]-"}));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    LogCapture log;
-    mi.makeKVDNode(lists.get(), planar->getNodeId());
+    KvdRun const run(mi,
+                     oemTable({{"Corvane Systems"}, {EYE + " 3 -[bad]-"}, {EYE + " 5.0 -[K5]-"}}));
+    StructureLists const& lists = run.built.lists;
 
-    std::vector<IC::Node*> const nodes = kvdNodes(mi);
+    std::vector<IC::Node*> const& nodes = run.nodes;
     ASSERT_EQ(1u, nodes.size());
     EXPECT_EQ(3u, nodes[0]->getNodeId());
     EXPECT_EQ(2u, nodes[0]->getIndex());
@@ -427,21 +318,18 @@ TEST(KvdNode, FailureLogsTable11TheStructureIndexAndTheStringIndex) {
     // The last structure claims a formatted area longer than its bytes, so
     // its first string cannot be found: the string lookup throws.
     builder.add(oemStrings(0x0B01, {EYE + " 2.0 -[LOST]-"}).length(0x40));
-    SD::SmBios parsed(builder.build());
-    ASSERT_EQ(2u, parsed.getTables().size());
-    StructureLists lists(parsed);
-    IC::MutableNode* planar = buildertest::addParent(mi);
-    LogCapture log;
-    mi.makeKVDNode(lists.get(), planar->getNodeId());
+    KvdRun const run(mi, builder);
+    ASSERT_EQ(2u, run.built.parsed.getTables().size());
+    LogCapture const& log = run.log;
 
-    std::string const logged = frametest::firstLogged("Exception=");
+    std::string const logged = firstLogged("Exception=");
     EXPECT_EQ(0u, logged.find("Exception=")) << log.dump();
     EXPECT_NE(std::string::npos, logged.find(" Type=")) << logged;
     EXPECT_NE(std::string::npos, logged.find(" Table 11 index =1")) << logged;
     EXPECT_NE(std::string::npos, logged.find("string index = 1")) << logged;
-    EXPECT_EQ((std::vector<int>{6000}), frametest::loggedLevels("Exception=")) << log.dump();
+    EXPECT_EQ((std::vector<int>{6000}), loggedLevels("Exception=")) << log.dump();
 
-    std::vector<IC::Node*> const nodes = kvdNodes(mi);
+    std::vector<IC::Node*> const& nodes = run.nodes;
     ASSERT_EQ(1u, nodes.size());
     EXPECT_EQ(0u, nodes[0]->getIndex());
     EXPECT_TRUE(hasString(nodes[0], 171, "OK"));

@@ -11,17 +11,7 @@
 #include "QNLog/QNLogger.h"
 #include "smbios/SmBios.h"
 
-using buildertest::addParent;
-using buildertest::hasNodeType;
-using buildertest::hasString;
-using buildertest::hasUnsigned;
-using buildertest::hasUnsignedList;
-using buildertest::nodesOfType;
-using buildertest::propertyIds;
-using buildertest::StructureLists;
-using buildertest::TestMI;
-using smbiostest::Structure;
-using smbiostest::TableBuilder;
+using namespace buildertest;
 
 namespace {
 
@@ -30,42 +20,14 @@ unsigned int const DISK_CONTROLLER_NODE = 50;
 std::string const ENABLED = "$IS IDE Bus Enabled";
 std::string const DISABLED = "$IS IDE Bus Disabled";
 
-// An OEM Strings structure: Count (0x04) and the strings.
-Structure oemStrings(uint16_t handle, std::vector<std::string> const& strings) {
-    Structure structure(11, handle);
-    structure.byte(static_cast<uint8_t>(strings.size()));
-    for (std::string const& text : strings) {
-        structure.addString(text);
-    }
-    return structure;
-}
-
-// The texts the disk-controller builder itself logged (log output only).
-std::vector<std::string> diskLog() {
-    std::vector<std::string> texts;
-    for (QNLog::QNLogRecord const& record : QNLog::QNLogger::captured()) {
-        if (record.output == "log" && record.logger == DISK_LOGGER) {
-            texts.push_back(record.text);
-        }
-    }
-    return texts;
-}
-
 // The builder over a table, under a planar (node id 2; the next id is 3).
-struct DiskRun {
-    explicit DiskRun(TableBuilder const& table) : parsed(table.build()), lists(parsed) {
-        planar = addParent(mi);
-    }
+struct DiskRun : PlanarSetup {
+    using PlanarSetup::PlanarSetup;
 
     std::vector<IC::Node*> run() {
         mi.makeDiskControllerNodes(lists.get(), planar->getNodeId());
         return nodesOfType(mi, DISK_CONTROLLER_NODE);
     }
-
-    SD::SmBios parsed;
-    StructureLists lists;
-    TestMI mi;
-    IC::MutableNode* planar = nullptr;
 };
 
 // Every field of an IDE bus node but its id.
@@ -95,9 +57,7 @@ IC::Node* ideNodeOf(DiskRun& setup) {
 
 TEST(DiskControllerBuilder, EnabledIdeStringMakesAnEnabledNodeFieldByField) {
     smbiostest::LogCapture log;
-    TableBuilder table;
-    table.add(oemStrings(0x0B00, {"Corvane RS-7400", ENABLED}));
-    DiskRun setup(table);
+    DiskRun setup(tableOf({oemStrings(0x0B00, {"Corvane RS-7400", ENABLED})}));
     std::vector<IC::Node*> const nodes = setup.run();
 
     ASSERT_EQ(1u, nodes.size());
@@ -117,16 +77,14 @@ TEST(DiskControllerBuilder, EnabledIdeStringMakesAnEnabledNodeFieldByField) {
 
     EXPECT_EQ(2u, setup.mi.nodeList.size());
     EXPECT_EQ(4u, setup.mi.nextNodeId);
-    std::vector<std::string> const texts = diskLog();
+    std::vector<std::string> const texts = loggedBy(DISK_LOGGER);
     ASSERT_FALSE(texts.empty()) << log.dump();
     EXPECT_EQ("makeDiskControllerNodes entry", texts.front()) << log.dump();
     EXPECT_EQ("makeDiskControllerNodes exit", texts.back()) << log.dump();
 }
 
 TEST(DiskControllerBuilder, DisabledIdeStringMakesANodeWithStatus16) {
-    TableBuilder table;
-    table.add(oemStrings(0x0B00, {DISABLED}));
-    DiskRun setup(table);
+    DiskRun setup(tableOf({oemStrings(0x0B00, {DISABLED})}));
     IC::Node* node = ideNodeOf(setup);
 
     ASSERT_NE(nullptr, node);
@@ -135,9 +93,7 @@ TEST(DiskControllerBuilder, DisabledIdeStringMakesANodeWithStatus16) {
 }
 
 TEST(DiskControllerBuilder, IdeStringWithTrailingBlanksMatches) {
-    TableBuilder table;
-    table.add(oemStrings(0x0B00, {"$IS IDE Bus Enabled   "}));
-    DiskRun setup(table);
+    DiskRun setup(tableOf({oemStrings(0x0B00, {"$IS IDE Bus Enabled   "})}));
     IC::Node* node = ideNodeOf(setup);
 
     ASSERT_NE(nullptr, node);
@@ -145,9 +101,7 @@ TEST(DiskControllerBuilder, IdeStringWithTrailingBlanksMatches) {
 }
 
 TEST(DiskControllerBuilder, DisabledIdeStringWithTrailingBlanksMatches) {
-    TableBuilder table;
-    table.add(oemStrings(0x0B00, {"$IS IDE Bus Disabled "}));
-    DiskRun setup(table);
+    DiskRun setup(tableOf({oemStrings(0x0B00, {"$IS IDE Bus Disabled "})}));
     IC::Node* node = ideNodeOf(setup);
 
     ASSERT_NE(nullptr, node);
@@ -155,36 +109,29 @@ TEST(DiskControllerBuilder, DisabledIdeStringWithTrailingBlanksMatches) {
 }
 
 TEST(DiskControllerBuilder, IdeStringWithALeadingBlankDoesNotMatch) {
-    TableBuilder table;
-    table.add(oemStrings(0x0B00, {" $IS IDE Bus Enabled"}));
-    DiskRun setup(table);
+    DiskRun setup(tableOf({oemStrings(0x0B00, {" $IS IDE Bus Enabled"})}));
 
     EXPECT_TRUE(setup.run().empty());
     EXPECT_EQ(1u, setup.mi.nodeList.size());
 }
 
 TEST(DiskControllerBuilder, IdeStringInLowerCaseDoesNotMatch) {
-    TableBuilder table;
-    table.add(oemStrings(0x0B00, {"$is IDE Bus Enabled", "$IS IDE BUS DISABLED"}));
-    DiskRun setup(table);
+    DiskRun setup(tableOf({oemStrings(0x0B00, {"$is IDE Bus Enabled", "$IS IDE BUS DISABLED"})}));
 
     EXPECT_TRUE(setup.run().empty());
     EXPECT_EQ(1u, setup.mi.nodeList.size());
 }
 
 TEST(DiskControllerBuilder, IdeStringWithMoreTextAfterItDoesNotMatch) {
-    TableBuilder table;
-    table.add(oemStrings(0x0B00, {"$IS IDE Bus Enabled.", "$IS IDE Bus Disabled x"}));
-    DiskRun setup(table);
+    DiskRun setup(
+        tableOf({oemStrings(0x0B00, {"$IS IDE Bus Enabled.", "$IS IDE Bus Disabled x"})}));
 
     EXPECT_TRUE(setup.run().empty());
 }
 
 TEST(DiskControllerBuilder, IdeStringOnlyInTheSecondStructureGetsTheSecondReservedId) {
-    TableBuilder table;
-    table.add(oemStrings(0x0B00, {"Corvane", "no bus here"}));
-    table.add(oemStrings(0x0B01, {"Corvane", ENABLED}));
-    DiskRun setup(table);
+    DiskRun setup(tableOf({oemStrings(0x0B00, {"Corvane", "no bus here"}),
+                           oemStrings(0x0B01, {"Corvane", ENABLED})}));
     std::vector<IC::Node*> const nodes = setup.run();
 
     ASSERT_EQ(1u, nodes.size());
@@ -199,9 +146,7 @@ TEST(DiskControllerBuilder, IdeStringOnlyInTheSecondStructureGetsTheSecondReserv
 }
 
 TEST(DiskControllerBuilder, BothIdeStringsInOneStructureOnlyTheFirstFoundMakesANode) {
-    TableBuilder table;
-    table.add(oemStrings(0x0B00, {"Corvane", DISABLED, ENABLED}));
-    DiskRun setup(table);
+    DiskRun setup(tableOf({oemStrings(0x0B00, {"Corvane", DISABLED, ENABLED})}));
     std::vector<IC::Node*> const nodes = setup.run();
 
     ASSERT_EQ(1u, nodes.size());
@@ -211,9 +156,7 @@ TEST(DiskControllerBuilder, BothIdeStringsInOneStructureOnlyTheFirstFoundMakesAN
 }
 
 TEST(DiskControllerBuilder, NoOemStringsStructureMakesNoNodeAndUsesNoId) {
-    TableBuilder table;
-    table.add(Structure(8, 0x0800).str("IDE1").byte(0).str("").byte(0).byte(0x09));
-    DiskRun setup(table);
+    DiskRun setup(tableOf({Structure(8, 0x0800).str("IDE1").byte(0).str("").byte(0).byte(0x09)}));
 
     smbiostest::LogCapture log;
     EXPECT_TRUE(setup.run().empty());
@@ -226,9 +169,7 @@ TEST(DiskControllerBuilder, NoOemStringsStructureMakesNoNodeAndUsesNoId) {
 }
 
 TEST(DiskControllerBuilder, StructureWithoutTheIdeStringStillUsesUpANodeId) {
-    TableBuilder table;
-    table.add(oemStrings(0x0B00, {"Corvane", "RS-7400"}));
-    DiskRun setup(table);
+    DiskRun setup(tableOf({oemStrings(0x0B00, {"Corvane", "RS-7400"})}));
 
     EXPECT_TRUE(setup.run().empty());
     EXPECT_EQ(1u, setup.mi.nodeList.size());
@@ -285,11 +226,8 @@ TEST(DiskControllerBuilder, CountBeyondTheStringsReadsMissingStringsAsEmpty) {
 }
 
 TEST(DiskControllerBuilder, IndexIsAlwaysOne) {
-    TableBuilder table;
-    table.add(oemStrings(0x0B00, {ENABLED}));
-    table.add(oemStrings(0x0B01, {"Corvane"}));
-    table.add(oemStrings(0x0B02, {"Corvane", DISABLED}));
-    DiskRun setup(table);
+    DiskRun setup(tableOf({oemStrings(0x0B00, {ENABLED}), oemStrings(0x0B01, {"Corvane"}),
+                           oemStrings(0x0B02, {"Corvane", DISABLED})}));
     std::vector<IC::Node*> const nodes = setup.run();
 
     ASSERT_EQ(2u, nodes.size());
@@ -305,30 +243,24 @@ TEST(DiskControllerBuilder, IndexIsAlwaysOne) {
 
 TEST(DiskControllerBuilder, FailureIsLoggedNamingTable8AndTheNextStructureGoesOn) {
     smbiostest::LogCapture log;
-    TableBuilder table;
-    table.add(oemStrings(0x0B01, {ENABLED}));
-    DiskRun setup(table);
+    DiskRun setup(tableOf({oemStrings(0x0B01, {ENABLED})}));
     // Count 1, but the length byte promises more than the structure's bytes
     // hold: its string set lies beyond its data, so the string lookup throws.
     SD::SmBios::Table const broken(
         Structure(11, 0x0B00).byte(1).addString(ENABLED).length(0x40).noTerminator().build());
     ASSERT_EQ(0x40, broken.getLength());
-    setup.lists.storage[11].insert(setup.lists.storage[11].begin(),
-                                   IC::TableData(&broken, broken.getLength()));
+    putFirst(setup.lists, broken);
 
     std::vector<IC::Node*> const nodes = setup.run();
 
-    std::string const failure = frametest::firstLogged("Exception=");
-    EXPECT_EQ(0u, failure.find("Exception= Type=")) << log.dump();
-    EXPECT_NE(std::string::npos, failure.find("out_of_range")) << failure;
-    EXPECT_NE(std::string::npos, failure.find("Table 8 index =0")) << failure;
+    EXPECT_TRUE(loggedOutOfRangeAt("Table 8 index =0")) << log.dump();
+    std::string const failure = firstLogged("Exception=");
     EXPECT_EQ(std::string::npos, failure.find("Table 11")) << failure;
-    EXPECT_EQ((std::vector<int>{6000}), frametest::loggedLevels("Exception="));
     // The failed structure had its id reserved already.
     ASSERT_EQ(1u, nodes.size());
     EXPECT_EQ(4u, nodes[0]->getNodeId());
     expectIdeBusNode(nodes[0], setup.planar->getNodeId(), 1);
-    std::vector<std::string> const texts = diskLog();
+    std::vector<std::string> const texts = loggedBy(DISK_LOGGER);
     ASSERT_FALSE(texts.empty());
     EXPECT_EQ("makeDiskControllerNodes exit", texts.back());
 }

@@ -14,18 +14,7 @@
 #include "QNLog/QNLogger.h"
 #include "TreeSnapshot.h"
 
-using buildertest::addParent;
-using buildertest::hasNodeType;
-using buildertest::hasString;
-using buildertest::hasUnsigned;
-using buildertest::hasUnsignedList;
-using buildertest::lacksProperty;
-using buildertest::nodesOfType;
-using buildertest::propertyIds;
-using buildertest::StructureLists;
-using buildertest::TestMI;
-using smbiostest::Structure;
-using smbiostest::TableBuilder;
+using namespace buildertest;
 
 namespace {
 
@@ -79,20 +68,9 @@ Structure eventLog(uint16_t areaLength, uint8_t status) {
 // The text a byte vector has as a property value.
 std::string bytesText(Bytes const& bytes) { return IC::PropertyValue(bytes, true).toString(); }
 
-// The texts the event-log builder itself logged (log output only), in order.
-std::vector<std::string> eventLogLog() {
-    std::vector<std::string> texts;
-    for (QNLog::QNLogRecord const& record : QNLog::QNLogger::captured()) {
-        if (record.output == "log" && record.logger == LOG_LOGGER) {
-            texts.push_back(record.text);
-        }
-    }
-    return texts;
-}
-
 // The builder's logged line that starts with label, or "".
 std::string loggedLine(std::string const& label) {
-    for (std::string const& text : eventLogLog()) {
+    for (std::string const& text : loggedBy(LOG_LOGGER)) {
         if (text.compare(0, label.size(), label) == 0) {
             return text;
         }
@@ -121,9 +99,7 @@ struct LogRun {
 // The status of the one event-log node made from a structure of the given
 // log area length and log status.
 unsigned int statusOf(uint16_t areaLength, uint8_t status) {
-    TableBuilder table;
-    table.add(eventLog(areaLength, status));
-    LogRun setup(table);
+    LogRun setup(tableOf({eventLog(areaLength, status)}));
     std::vector<IC::Node*> const nodes = setup.run();
     EXPECT_EQ(1u, nodes.size());
     return nodes.empty() ? 0xFFFFFFFFu : nodes[0]->getStatus();
@@ -132,20 +108,14 @@ unsigned int statusOf(uint16_t areaLength, uint8_t status) {
 }  // namespace
 
 TEST(EventLogBuilder, EventLogNodeFieldByField) {
-    TableBuilder table;
-    table.add(eventLog(0x1000, 0x01));
-    LogRun setup(table);
+    LogRun setup(tableOf({eventLog(0x1000, 0x01)}));
     std::vector<IC::Node*> const nodes = setup.run();
 
     ASSERT_EQ(1u, nodes.size());
     IC::Node const* node = nodes[0];
-    EXPECT_EQ(3u, node->getNodeId());
-    EXPECT_EQ(setup.firmware->getNodeId(), node->getLinkedId());
-    EXPECT_TRUE(hasNodeType(node, 35));
-    EXPECT_EQ(0u, node->getIndex());
+    EXPECT_TRUE(
+        isNode(node, 3u, setup.firmware->getNodeId(), 35, 0u, 1u, "SmBios System Event Log"));
     EXPECT_EQ(setup.mi.miIdList, node->getMIIds());
-    EXPECT_EQ(1u, node->getStatus());
-    EXPECT_EQ("SmBios System Event Log", node->getDescription());
     EXPECT_EQ((std::vector<unsigned int>{37, 108, 125}), propertyIds(node));
     EXPECT_TRUE(hasString(node, 108, LOG_NAME));
     EXPECT_TRUE(hasUnsigned(node, 37, 0x1000));
@@ -161,9 +131,7 @@ TEST(EventLogBuilder, EventLogNodeFieldByField) {
 }
 
 TEST(EventLogBuilder, LogAreaLengthIsTheWordAtOffset4) {
-    TableBuilder table;
-    table.add(eventLog(0xABCD, 0x01));
-    LogRun setup(table);
+    LogRun setup(tableOf({eventLog(0xABCD, 0x01)}));
     std::vector<IC::Node*> const nodes = setup.run();
 
     ASSERT_EQ(1u, nodes.size());
@@ -184,9 +152,7 @@ TEST(EventLogBuilder, HeaderFieldsAreLoggedInOrderWithTheirLabels) {
     log.descriptorCount = 2;
     log.descriptorLength = 2;
     log.descriptors = {0x01, 0x00, 0x02, 0x00};
-    TableBuilder table;
-    table.add(eventLog(log));
-    LogRun setup(table);
+    LogRun setup(tableOf({eventLog(log)}));
     setup.run();
 
     // Change token and access address in their memory order.
@@ -206,7 +172,7 @@ TEST(EventLogBuilder, HeaderFieldsAreLoggedInOrderWithTheirLabels) {
                   "Log Type Descriptors=" + bytesText({0x01, 0x00, 0x02, 0x00}),
                   "makeLogNodes exit",
               }),
-              eventLogLog())
+              loggedBy(LOG_LOGGER))
         << capture.dump();
     EXPECT_EQ("78 56 34 12", bytesText({0x78, 0x56, 0x34, 0x12}));
 }
@@ -220,9 +186,7 @@ TEST(EventLogBuilder, HeaderNumbersAreLoggedInDecimal) {
     log.accessMethod = 0x04;
     log.status = 0x03;
     log.headerFormat = 0xFF;
-    TableBuilder table;
-    table.add(eventLog(log));
-    LogRun setup(table);
+    LogRun setup(tableOf({eventLog(log)}));
     setup.run();
 
     EXPECT_EQ("Handle=65244", loggedLine("Handle=")) << capture.dump();
@@ -234,9 +198,8 @@ TEST(EventLogBuilder, HeaderNumbersAreLoggedInDecimal) {
 }
 
 TEST(EventLogBuilder, NoEventLogStructureMakesNoNodeAndLogsOnlyEntryAndExit) {
-    TableBuilder table;
-    table.add(Structure(0, 0x0000).str("Corvane").str("1.0").word(0xE800).str("01/01/2020"));
-    LogRun setup(table);
+    LogRun setup(
+        tableOf({Structure(0, 0x0000).str("Corvane").str("1.0").word(0xE800).str("01/01/2020")}));
 
     smbiostest::LogCapture capture;
     EXPECT_TRUE(setup.run().empty());
@@ -272,9 +235,7 @@ TEST(EventLogBuilder, OtherLogStatusBitsAreIgnored) {
 }
 
 TEST(EventLogBuilder, TwoFirmwareParentsGiveTwoEventLogNodesEachWithIndexZero) {
-    TableBuilder table;
-    table.add(eventLog(0x0800, 0x03));
-    LogRun setup(table);
+    LogRun setup(tableOf({eventLog(0x0800, 0x03)}));
     IC::MutableNode* secondFirmware = addParent(setup.mi, FIRMWARE_NODE);
     setup.mi.makeLogNodes(setup.lists.get(), setup.firmware->getNodeId());
     IC::Node const* first = setup.mi.nodeList.back();
@@ -298,11 +259,8 @@ TEST(EventLogBuilder, TwoFirmwareParentsGiveTwoEventLogNodesEachWithIndexZero) {
 }
 
 TEST(EventLogBuilder, TwoEventLogStructuresGetIndexesZeroAndOne) {
-    TableBuilder table;
-    table.add(eventLog(0x1000, 0x01));
-    table.add(Structure(0, 0x0000).str("Corvane"));
-    table.add(eventLog(0x0000, 0x01));
-    LogRun setup(table);
+    LogRun setup(tableOf(
+        {eventLog(0x1000, 0x01), Structure(0, 0x0000).str("Corvane"), eventLog(0x0000, 0x01)}));
     std::vector<IC::Node*> const nodes = setup.run();
 
     ASSERT_EQ(2u, nodes.size());
@@ -322,9 +280,7 @@ TEST(EventLogBuilder, DescriptorCountZeroLogsAnEmptyDescriptorList) {
     log.descriptorCount = 0;
     log.descriptorLength = 2;
     log.descriptors = {0x01, 0x00};
-    TableBuilder table;
-    table.add(eventLog(log));
-    LogRun setup(table);
+    LogRun setup(tableOf({eventLog(log)}));
     setup.run();
 
     EXPECT_EQ("Number of Log Type Descriptors=0", loggedLine("Number of Log Type Descriptors="));
@@ -341,9 +297,7 @@ TEST(EventLogBuilder, DescriptorListRunningPastTheStructureReadsWhatIsThereThenZ
     log.descriptorCount = 4;
     log.descriptorLength = 2;
     log.descriptors = {0x05, 0x01};
-    TableBuilder table;
-    table.add(eventLog(log).addString("AB"));
-    LogRun setup(table);
+    LogRun setup(tableOf({eventLog(log).addString("AB")}));
     std::vector<IC::Node*> const nodes = setup.run();
 
     ASSERT_EQ(1u, nodes.size());
@@ -351,7 +305,7 @@ TEST(EventLogBuilder, DescriptorListRunningPastTheStructureReadsWhatIsThereThenZ
     EXPECT_EQ("Log Type Descriptors=" + bytesText({0x05, 0x01, 'A', 'B', 0, 0, 0, 0}),
               loggedLine("Log Type Descriptors="))
         << capture.dump();
-    EXPECT_EQ("makeLogNodes exit", eventLogLog().back());
+    EXPECT_EQ("makeLogNodes exit", loggedBy(LOG_LOGGER).back());
 }
 
 TEST(EventLogBuilder, LargestDescriptorListIsReadWithoutACrash) {
@@ -360,9 +314,7 @@ TEST(EventLogBuilder, LargestDescriptorListIsReadWithoutACrash) {
     log.descriptorCount = 0xFF;
     log.descriptorLength = 0xFF;
     log.descriptors = {0x07, 0x08};
-    TableBuilder table;
-    table.add(eventLog(log));
-    LogRun setup(table);
+    LogRun setup(tableOf({eventLog(log)}));
     std::vector<IC::Node*> const nodes = setup.run();
 
     ASSERT_EQ(1u, nodes.size());
@@ -370,14 +322,12 @@ TEST(EventLogBuilder, LargestDescriptorListIsReadWithoutACrash) {
     expected[0] = 0x07;
     expected[1] = 0x08;
     EXPECT_EQ("Log Type Descriptors=" + bytesText(expected), loggedLine("Log Type Descriptors="));
-    EXPECT_EQ("makeLogNodes exit", eventLogLog().back());
+    EXPECT_EQ("makeLogNodes exit", loggedBy(LOG_LOGGER).back());
 }
 
 TEST(EventLogBuilder, StructureOfLength4GivesStatus16) {
     smbiostest::LogCapture capture;
-    TableBuilder table;
-    table.add(Structure(15, 0x0F00));
-    LogRun setup(table);
+    LogRun setup(tableOf({Structure(15, 0x0F00)}));
     std::vector<IC::Node*> const nodes = setup.run();
 
     ASSERT_EQ(1u, nodes.size());
@@ -435,7 +385,7 @@ TEST(EventLogBuilder, FailureInOneStructureIsLoggedAndTheNextStructureGoesOn) {
     EXPECT_EQ(31u, nodes[1]->getStatus());
     EXPECT_TRUE(hasUnsigned(nodes[1], 37, 0x1000));
     EXPECT_TRUE(hasUnsignedList(nodes[1], 125, {30, 1, 16, 31}));
-    EXPECT_EQ("makeLogNodes exit", eventLogLog().back());
+    EXPECT_EQ("makeLogNodes exit", loggedBy(LOG_LOGGER).back());
 }
 
 // ---------------------------------------------------------------------------
@@ -520,7 +470,7 @@ TEST(EventLogLogLevels, HeaderCutAtEachFieldGivesTheSameTreeAndFailureAtEveryLev
                 EXPECT_EQ((std::vector<int>{6000}), frametest::loggedLevels("Exception="));
             } else {
                 EXPECT_EQ("", failure) << log.dump();
-                EXPECT_EQ("makeLogNodes exit", eventLogLog().back()) << log.dump();
+                EXPECT_EQ("makeLogNodes exit", loggedBy(LOG_LOGGER).back()) << log.dump();
             }
             // The header lines stop before the straddling field's own.
             EXPECT_EQ(length != 0x05, loggedLine("Handle=") != "") << log.dump();

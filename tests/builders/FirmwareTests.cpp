@@ -11,19 +11,7 @@
 
 #include "BuilderFixture.h"
 
-using buildertest::childrenOf;
-using buildertest::hasNodeType;
-using buildertest::hasString;
-using buildertest::hasUnsigned;
-using buildertest::hasVersion;
-using buildertest::lacksProperty;
-using buildertest::nodesOfType;
-using buildertest::propertyIds;
-using buildertest::StructureLists;
-using buildertest::TestMI;
-using smbiostest::LogCapture;
-using smbiostest::Structure;
-using smbiostest::TableBuilder;
+using namespace buildertest;
 
 namespace {
 
@@ -37,16 +25,6 @@ struct VersionedMI : TestMI {
         smbiosMinorVersion = minor;
     }
 };
-
-// An OEM Strings structure (type 11) whose Count is the number of strings.
-Structure oemStrings(uint16_t handle, std::vector<std::string> const& strings) {
-    Structure structure(11, handle);
-    structure.byte(static_cast<uint8_t>(strings.size()));
-    for (std::string const& text : strings) {
-        structure.addString(text);
-    }
-    return structure;
-}
 
 // A BIOS Information structure (type 0) of the given formatted length (0x14,
 // 0x16, 0x17 or 0x18): the fields up to that length.
@@ -89,28 +67,6 @@ Structure eventLog(uint16_t handle) {
         .byte(0x02);  // 0x16: descriptor length
 }
 
-// Node id, linked id, type, index, status and description in one check.
-::testing::AssertionResult isNode(IC::Node const* node, unsigned int id, unsigned int linkedId,
-                                  unsigned int type, unsigned int index, unsigned int status,
-                                  std::string const& description) {
-    if (node == nullptr) {
-        return ::testing::AssertionFailure() << "no node";
-    }
-    ::testing::AssertionResult typed = hasNodeType(node, type);
-    if (!typed) {
-        return typed;
-    }
-    if (node->getNodeId() != id || node->getLinkedId() != linkedId || node->getIndex() != index ||
-        node->getStatus() != status || node->getDescription() != description) {
-        return ::testing::AssertionFailure()
-               << "node {id " << node->getNodeId() << ", linked " << node->getLinkedId()
-               << ", index " << node->getIndex() << ", status " << node->getStatus() << ", \""
-               << node->getDescription() << "\"}, expected {id " << id << ", linked " << linkedId
-               << ", index " << index << ", status " << status << ", \"" << description << "\"}";
-    }
-    return ::testing::AssertionSuccess();
-}
-
 // The one event-log node hung under the node: type 35, index 0, the valid
 // log of eventLog().
 ::testing::AssertionResult hasEventLogChild(TestMI const& mi, IC::Node const* parent,
@@ -142,29 +98,11 @@ struct FirmwareRun {
         firmware = firmwareNodes(mi);
     }
 
-    static TableBuilder tableOf(std::vector<Structure> const& structures) {
-        TableBuilder table;
-        for (Structure const& structure : structures) {
-            table.add(structure);
-        }
-        return table;
-    }
-
     SD::SmBios parsed;
     StructureLists lists;
     LogCapture log;
     std::vector<IC::Node*> firmware;
 };
-
-size_t loggedCount(std::string const& text) {
-    size_t count = 0;
-    for (std::string const& logged : frametest::loggedTexts()) {
-        if (logged.find(text) != std::string::npos) {
-            ++count;
-        }
-    }
-    return count;
-}
 
 std::string const VERSION_ERROR =
     "Error reading standard format of version and build number for Planar Firmware";

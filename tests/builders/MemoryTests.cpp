@@ -9,42 +9,11 @@
 
 #include "BuilderFixture.h"
 
-using buildertest::childrenOf;
-using buildertest::hasBool;
-using buildertest::hasEnum;
-using buildertest::hasNodeType;
-using buildertest::hasString;
-using buildertest::hasUnsigned;
-using buildertest::hasUnsignedList;
-using buildertest::lacksProperty;
-using buildertest::nodesOfType;
-using buildertest::propertyIds;
-using buildertest::StructureLists;
-using buildertest::TestMI;
-using smbiostest::Structure;
-using smbiostest::TableBuilder;
+using namespace buildertest;
 
 namespace {
 
 char const* const DIMM_LOGGER = "Quillon.IC.MI.SmBiosMI.SmBiosMIDimm";
-
-// A structure's formatted area cut to length bytes (header included), every
-// string kept in the set.
-Structure cutTo(Structure const& full, size_t length, std::vector<std::string> const& strings) {
-    if (length >= full.formattedSize()) {
-        return full;
-    }
-    std::vector<uint8_t> const bytes = full.build();
-    Structure cut(full.type(), full.handle());
-    cut.bytes(std::vector<uint8_t>(bytes.begin() + 4,
-                                   bytes.begin() + static_cast<std::ptrdiff_t>(length)));
-    for (std::string const& text : strings) {
-        if (!text.empty()) {
-            cut.addString(text);
-        }
-    }
-    return cut;
-}
 
 // The fields of one Physical Memory Array structure (SMBIOS 2.1 layout,
 // 0x0F bytes): on the system board, system memory, multi-bit ECC, 32 GB.
@@ -116,13 +85,6 @@ Structure device(Device const& d) {
         {d.deviceLocator, d.bankLocator, d.manufacturer, d.serial, d.assetTag, d.partNumber});
 }
 
-// A parsed table and its structure lists.
-struct Built {
-    explicit Built(TableBuilder const& table) : parsed(table.build()), lists(parsed) {}
-    SD::SmBios parsed;
-    StructureLists lists;
-};
-
 // The builder run over a table under a planar node (id 2).
 struct DimmRun {
     explicit DimmRun(TableBuilder const& table) : built(table) {
@@ -131,7 +93,7 @@ struct DimmRun {
         arrays = nodesOfType(mi, 32);
         devices = nodesOfType(mi, 19);
     }
-    Built built;
+    ParsedTable built;
     TestMI mi;
     IC::MutableNode* planar = nullptr;
     std::vector<IC::Node*> arrays;
@@ -149,17 +111,6 @@ TableBuilder deviceVariants(size_t count, Setter set) {
         table.add(device(d));
     }
     return table;
-}
-
-// The captured log-output texts written under one logger, in order.
-std::vector<std::string> loggedBy(std::string const& loggerName) {
-    std::vector<std::string> texts;
-    for (QNLog::QNLogRecord const& record : QNLog::QNLogger::captured()) {
-        if (record.output == "log" && record.logger == loggerName) {
-            texts.push_back(record.text);
-        }
-    }
-    return texts;
 }
 
 }  // namespace
@@ -290,12 +241,10 @@ TEST(MemoryNodes, ArraysAndInstalledDevicesFieldByField) {
 
 TEST(MemoryNodes, LegacyControllerAndModuleStructuresAreOnlyCounted) {
     smbiostest::LogCapture log;
-    TableBuilder table;
-    table.add(Structure(5, 0x0500).byte(3).byte(6).byte(1).byte(3));
-    table.add(Structure(5, 0x0501).byte(3).byte(6).byte(1).byte(3));
-    table.add(Structure(6, 0x0600).str("BANK_0").byte(0x01).byte(0).word(0x0001));
-    table.add(device(Device()));
-    DimmRun run(table);
+    DimmRun run(tableOf({Structure(5, 0x0500).byte(3).byte(6).byte(1).byte(3),
+                         Structure(5, 0x0501).byte(3).byte(6).byte(1).byte(3),
+                         Structure(6, 0x0600).str("BANK_0").byte(0x01).byte(0).word(0x0001),
+                         device(Device())}));
 
     EXPECT_EQ(2u, run.mi.nodeList.size());
     EXPECT_TRUE(run.arrays.empty());

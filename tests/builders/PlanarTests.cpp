@@ -14,18 +14,7 @@
 #include "LogLevels.h"
 #include "TreeSnapshot.h"
 
-using buildertest::childrenOf;
-using buildertest::hasEnum;
-using buildertest::hasNodeType;
-using buildertest::hasString;
-using buildertest::hasUnsigned;
-using buildertest::lacksProperty;
-using buildertest::nodesOfType;
-using buildertest::propertyIds;
-using buildertest::StructureLists;
-using buildertest::TestMI;
-using smbiostest::Structure;
-using smbiostest::TableBuilder;
+using namespace buildertest;
 
 namespace {
 
@@ -189,12 +178,7 @@ TEST(PlanarBuilder, FullStructureGivesOnePlanarNodeWithEveryProperty) {
     std::vector<IC::Node*> const planars = run.planars();
     ASSERT_EQ(1u, planars.size()) << log.dump();
     IC::Node const* node = planars[0];
-    EXPECT_EQ(3u, node->getNodeId());
-    EXPECT_EQ(run.parent->getNodeId(), node->getLinkedId());
-    EXPECT_TRUE(hasNodeType(node, 41));
-    EXPECT_EQ(0u, node->getIndex());
-    EXPECT_EQ(1u, node->getStatus());
-    EXPECT_EQ("Planar", node->getDescription());
+    EXPECT_TRUE(isNode(node, 3u, run.parent->getNodeId(), 41, 0u, 1u, "Planar"));
     EXPECT_EQ(run.mi.miIdList, node->getMIIds());
 
     // The version string is not read.
@@ -225,10 +209,9 @@ TEST(PlanarBuilder, FullStructureGivesOnePlanarNodeWithEveryProperty) {
 
 TEST(PlanarBuilder, ShortBaseboardSetsBoardTypeZeroAndLacksTheLaterFields) {
     smbiostest::LogCapture log;
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.add(Structure(2, 0x0200).str("Board Maker").str("MB-100").str("BV-1").str("BRD-1"));
-    PlanarRun run(table);
+    PlanarRun run(
+        tableOf({systemInformation(0x0100),
+                 Structure(2, 0x0200).str("Board Maker").str("MB-100").str("BV-1").str("BRD-1")}));
     ASSERT_EQ(8u, run.parsed.getTables()[1].getLength());
 
     std::vector<IC::Node*> const planars = run.planars();
@@ -243,10 +226,7 @@ TEST(PlanarBuilder, ShortBaseboardSetsBoardTypeZeroAndLacksTheLaterFields) {
 TEST(PlanarBuilder, EmptyProductSetsEmpty39AndNo172OnEitherNode) {
     BoardFields fields;
     fields.product = "";
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.add(baseboard(0x0200, fields));
-    PlanarRun run(table);
+    PlanarRun run(tableOf({systemInformation(0x0100), baseboard(0x0200, fields)}));
 
     std::vector<IC::Node*> const planars = run.planars();
     ASSERT_EQ(1u, planars.size());
@@ -260,10 +240,7 @@ TEST(PlanarBuilder, EmptyProductSetsEmpty39AndNo172OnEitherNode) {
 TEST(PlanarBuilder, EmptyLocationSetsNo31OnEitherNode) {
     BoardFields fields;
     fields.location = "";
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.add(baseboard(0x0200, fields));
-    PlanarRun run(table);
+    PlanarRun run(tableOf({systemInformation(0x0100), baseboard(0x0200, fields)}));
 
     std::vector<IC::Node*> const planars = run.planars();
     ASSERT_EQ(1u, planars.size());
@@ -277,10 +254,8 @@ TEST(PlanarBuilder, EmptyLocationSetsNo31OnEitherNode) {
 // Which baseboard becomes the planar
 
 TEST(PlanarBoardType, MotherboardListedAfterAServerBladeBecomesThePlanar) {
-    TableBuilder table;
-    table.add(baseboard(0x0200, boardOfType(SERVER_BLADE, "Blade")));
-    table.add(baseboard(0x0201, boardOfType(MOTHERBOARD, "Motherboard")));
-    PlanarRun run(table);
+    PlanarRun run(tableOf({baseboard(0x0200, boardOfType(SERVER_BLADE, "Blade")),
+                           baseboard(0x0201, boardOfType(MOTHERBOARD, "Motherboard"))}));
 
     std::vector<IC::Node*> const planars = run.planars();
     ASSERT_EQ(1u, planars.size());
@@ -317,19 +292,15 @@ TEST(PlanarBoardType, MotherboardWinsOverEveryOtherBoardType) {
 }
 
 TEST(PlanarBoardType, FirstOfTwoEqualBoardsBecomesThePlanar) {
-    TableBuilder table;
-    table.add(baseboard(0x0200, boardOfType(MOTHERBOARD, "First")));
-    table.add(baseboard(0x0201, boardOfType(MOTHERBOARD, "Second")));
-    PlanarRun run(table);
+    PlanarRun run(tableOf({baseboard(0x0200, boardOfType(MOTHERBOARD, "First")),
+                           baseboard(0x0201, boardOfType(MOTHERBOARD, "Second"))}));
     std::vector<IC::Node*> const planars = run.planars();
     ASSERT_EQ(1u, planars.size());
     EXPECT_TRUE(hasString(planars[0], 39, "First"));
 }
 
 TEST(PlanarBoardType, BoardTypeOutsideTheListIsStillTakenWhenAlone) {
-    TableBuilder table;
-    table.add(baseboard(0x0200, boardOfType(0x20, "Odd board")));
-    PlanarRun run(table);
+    PlanarRun run(tableOf({baseboard(0x0200, boardOfType(0x20, "Odd board"))}));
     std::vector<IC::Node*> const planars = run.planars();
     ASSERT_EQ(1u, planars.size());
     EXPECT_TRUE(hasString(planars[0], 39, "Odd board"));
@@ -337,21 +308,17 @@ TEST(PlanarBoardType, BoardTypeOutsideTheListIsStillTakenWhenAlone) {
 }
 
 TEST(PlanarBoardType, FirstStructureIsTakenWhenNoBoardTypeIsInTheList) {
-    TableBuilder table;
-    table.add(baseboard(0x0200, boardOfType(0x20, "First")));
-    table.add(baseboard(0x0201, boardOfType(0x00, "Second")));
-    table.add(baseboard(0x0202, boardOfType(0x0E, "Third")));
-    PlanarRun run(table);
+    PlanarRun run(tableOf({baseboard(0x0200, boardOfType(0x20, "First")),
+                           baseboard(0x0201, boardOfType(0x00, "Second")),
+                           baseboard(0x0202, boardOfType(0x0E, "Third"))}));
     std::vector<IC::Node*> const planars = run.planars();
     ASSERT_EQ(1u, planars.size());
     EXPECT_TRUE(hasString(planars[0], 39, "First"));
 }
 
 TEST(PlanarBoardType, UnknownBoardTypeWinsOverATypeOutsideTheList) {
-    TableBuilder table;
-    table.add(baseboard(0x0200, boardOfType(0x20, "Odd")));
-    table.add(baseboard(0x0201, boardOfType(0x01, "Unknown")));
-    PlanarRun run(table);
+    PlanarRun run(tableOf({baseboard(0x0200, boardOfType(0x20, "Odd")),
+                           baseboard(0x0201, boardOfType(0x01, "Unknown"))}));
     std::vector<IC::Node*> const planars = run.planars();
     ASSERT_EQ(1u, planars.size());
     EXPECT_TRUE(hasString(planars[0], 39, "Unknown"));
@@ -420,10 +387,7 @@ TEST(PlanarTakeover, RawTableNodesHangUnderThePlanar) {
 
 TEST(PlanarTakeover, ChildBuildersRunInTheFirstOrderWithABaseboard) {
     smbiostest::LogCapture log;
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.add(baseboard(0x0200));
-    PlanarRun run(table);
+    PlanarRun run(tableOf({systemInformation(0x0100), baseboard(0x0200)}));
     EXPECT_EQ((std::vector<std::string>{
                   "makeCpuNodes entry", "makeSlotNodes entry", "makeConnectorNodes entry",
                   "makeDimmNodes entry", "makeDiskControllerNodes entry",
@@ -434,9 +398,7 @@ TEST(PlanarTakeover, ChildBuildersRunInTheFirstOrderWithABaseboard) {
 
 TEST(PlanarTakeover, ChildBuildersRunInTheSecondOrderWithoutABaseboard) {
     smbiostest::LogCapture log;
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    PlanarRun run(table);
+    PlanarRun run(tableOf({systemInformation(0x0100)}));
     EXPECT_EQ((std::vector<std::string>{"makeCpuNodes entry", "makeSlotNodes entry",
                                         "makeConnectorNodes entry", "makeDimmNodes entry",
                                         "makeFirmwareNodes entry", "makeDiskControllerNodes entry",
@@ -457,12 +419,7 @@ TEST(PlanarTakeover, NoBaseboardMakesABarePlanarAndLeavesTheSharedListsAsTheyAre
     std::vector<IC::Node*> const planars = run.planars();
     ASSERT_EQ(1u, planars.size()) << log.dump();
     IC::Node const* node = planars[0];
-    EXPECT_EQ(3u, node->getNodeId());
-    EXPECT_EQ(run.parent->getNodeId(), node->getLinkedId());
-    EXPECT_TRUE(hasNodeType(node, 41));
-    EXPECT_EQ(0u, node->getIndex());
-    EXPECT_EQ(1u, node->getStatus());
-    EXPECT_EQ("Planar", node->getDescription());
+    EXPECT_TRUE(isNode(node, 3u, run.parent->getNodeId(), 41, 0u, 1u, "Planar"));
     EXPECT_EQ(run.mi.miIdList, node->getMIIds());
     EXPECT_TRUE(propertyIds(node).empty());
     EXPECT_TRUE(propertyIds(run.parent).empty());
@@ -489,10 +446,7 @@ TEST(PlanarTakeover, NoBaseboardMakesABarePlanarAndLeavesTheSharedListsAsTheyAre
 
 TEST(PlanarBuilder, ParentNotFoundBuildsNothing) {
     smbiostest::LogCapture log;
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.add(baseboard(0x0200));
-    PlanarRun run(table, 99);
+    PlanarRun run(tableOf({systemInformation(0x0100), baseboard(0x0200)}), 99);
 
     EXPECT_EQ(1u, run.mi.nodeList.size());
     EXPECT_EQ(3u, run.mi.nextNodeId);
@@ -617,11 +571,9 @@ TEST(PlanarContainedHandles, CountOf121ExceedsTheTableLengthAndIsNotListed) {
 
 TEST(PlanarGroup, GroupHoldingTheBaseboardHandleAsATypeIsReported) {
     smbiostest::LogCapture log;
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.add(baseboard(0x0020));
-    table.add(group(0x0E00, "Board group", {{0x20, 0x0002}, {4, 0x0400}, {7, 0x0700}}));
-    PlanarRun run(table);
+    PlanarRun run(
+        tableOf({systemInformation(0x0100), baseboard(0x0020),
+                 group(0x0E00, "Board group", {{0x20, 0x0002}, {4, 0x0400}, {7, 0x0700}})}));
 
     EXPECT_EQ(2u, log.count(" Planar Group Associations Exist: ")) << log.dump();
     EXPECT_EQ(2u, log.count("    Table Type=4 Handle=1024")) << log.dump();
@@ -631,11 +583,8 @@ TEST(PlanarGroup, GroupHoldingTheBaseboardHandleAsATypeIsReported) {
 
 TEST(PlanarGroup, GroupHoldingTheBaseboardByTypeAndHandleIsNotReported) {
     smbiostest::LogCapture log;
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.add(baseboard(0x0020));
-    table.add(group(0x0E00, "Board group", {{2, 0x0020}, {4, 0x0400}}));
-    PlanarRun run(table);
+    PlanarRun run(tableOf({systemInformation(0x0100), baseboard(0x0020),
+                           group(0x0E00, "Board group", {{2, 0x0020}, {4, 0x0400}})}));
 
     EXPECT_EQ(0u, log.count(" Planar Group Associations Exist: ")) << log.dump();
     EXPECT_EQ(0u, log.count("    Table Type=")) << log.dump();

@@ -10,21 +10,7 @@
 
 #include "BuilderFixture.h"
 
-using buildertest::childrenOf;
-using buildertest::hasBool;
-using buildertest::hasBytes;
-using buildertest::hasEnum;
-using buildertest::hasNodeType;
-using buildertest::hasString;
-using buildertest::hasUnsigned;
-using buildertest::hasUnsignedList;
-using buildertest::lacksProperty;
-using buildertest::nodesOfType;
-using buildertest::propertyIds;
-using buildertest::StructureLists;
-using buildertest::TestMI;
-using smbiostest::Structure;
-using smbiostest::TableBuilder;
+using namespace buildertest;
 
 namespace {
 
@@ -150,6 +136,21 @@ Structure cache(uint16_t handle, std::string const& socket, unsigned int level) 
     return out;
 }
 
+// A table of one default processor per value, with handles from 0x0400 up,
+// each with its value set by set(cpu, value).
+template <typename Value, typename Set>
+TableBuilder oneCpuPerValue(std::vector<Value> const& values, Set set) {
+    TableBuilder table;
+    uint16_t handle = 0x0400;
+    for (Value value : values) {
+        Cpu c;
+        c.handle = handle++;
+        set(c, value);
+        table.add(cpu(c));
+    }
+    return table;
+}
+
 // makeCpuNodes run on mi over the table, under a planar node added first
 // (node id 2); cpus holds the processor nodes (type 4) it made, in order.
 struct CpuRun {
@@ -164,28 +165,6 @@ struct CpuRun {
     std::vector<IC::Node*> cpus;
 };
 
-// The captured log-output texts written under one logger, in order.
-std::vector<std::string> loggedBy(std::string const& loggerName) {
-    std::vector<std::string> texts;
-    for (QNLog::QNLogRecord const& record : QNLog::QNLogger::captured()) {
-        if (record.output == "log" && record.logger == loggerName) {
-            texts.push_back(record.text);
-        }
-    }
-    return texts;
-}
-
-// How many captured log-output texts contain text.
-size_t loggedCount(std::string const& text) {
-    size_t n = 0;
-    for (std::string const& logged : frametest::loggedTexts()) {
-        if (logged.find(text) != std::string::npos) {
-            ++n;
-        }
-    }
-    return n;
-}
-
 }  // namespace
 
 TEST(ProcessorNodes, PopulatedEnabledProcessorWithCachesAndCoresFieldByField) {
@@ -198,13 +177,9 @@ TEST(ProcessorNodes, PopulatedEnabledProcessorWithCachesAndCoresFieldByField) {
     c.coreEnabled = 2;
     c.threadCount = 4;
     c.characteristics = 0x00FC;
-    TableBuilder table;
-    table.add(cache(0x0700, "L1-Cache", 1));
-    table.add(cache(0x0701, "L2-Cache", 2));
-    table.add(cache(0x0702, "L3-Cache", 3));
-    table.add(cpu(c));
     TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(mi, tableOf({cache(0x0700, "L1-Cache", 1), cache(0x0701, "L2-Cache", 2),
+                                  cache(0x0702, "L3-Cache", 3), cpu(c)}));
     ASSERT_EQ(2u, run.planar->getNodeId());
 
     // Planar, processor, three caches, two cores.
@@ -213,12 +188,7 @@ TEST(ProcessorNodes, PopulatedEnabledProcessorWithCachesAndCoresFieldByField) {
     ASSERT_EQ(1u, run.cpus.size());
     IC::Node const* node = run.cpus[0];
     EXPECT_EQ(node, mi.nodeList[1]);
-    EXPECT_TRUE(hasNodeType(node, 4));
-    EXPECT_EQ(3u, node->getNodeId());
-    EXPECT_EQ(2u, node->getLinkedId());
-    EXPECT_EQ(0u, node->getIndex());
-    EXPECT_EQ(1u, node->getStatus());
-    EXPECT_EQ("CPU 1", node->getDescription());
+    EXPECT_TRUE(isNode(node, 3u, 2u, 4, 0u, 1u, "CPU 1"));
     EXPECT_EQ(mi.miIdList, node->getMIIds());
     EXPECT_EQ((std::vector<unsigned int>{2,  15, 19,  36,  38,  45,  50,  53,  55,  80,
                                          87, 89, 124, 125, 189, 190, 296, 298, 304, 307}),
@@ -290,10 +260,8 @@ TEST(ProcessorNodes, PopulatedEnabledProcessorWithCachesAndCoresFieldByField) {
 TEST(ProcessorNodes, StatusPopulatedAndEnabledMakesANode) {
     Cpu c;
     c.status = 0x41;
-    TableBuilder table;
-    table.add(cpu(c));
     TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(mi, tableOf({cpu(c)}));
 
     ASSERT_EQ(1u, run.cpus.size());
     EXPECT_EQ(1u, run.cpus[0]->getStatus());
@@ -332,10 +300,8 @@ TEST(ProcessorNodes, StatusNotPopulatedOrDisabledByBiosMakesNoNodeAndNoCacheNode
 TEST(ProcessorNodes, StatusWithReservedBit7SetStillMakesANode) {
     Cpu c;
     c.status = 0xC1;
-    TableBuilder table;
-    table.add(cpu(c));
     TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(mi, tableOf({cpu(c)}));
 
     ASSERT_EQ(1u, run.cpus.size());
     EXPECT_EQ(1u, run.cpus[0]->getStatus());
@@ -348,18 +314,13 @@ TEST(ProcessorNodes, StatusWithReservedBit7SetStillMakesANode) {
 // status 1 through: those processors get no node at all.
 TEST(ProcessorNodes, StatusesDisabledByUserOrFirmwareOrIdleMakeNoNode) {
     smbiostest::LogCapture log;
-    TableBuilder table;
-    uint16_t handle = 0x0400;
-    for (uint8_t status : {uint8_t{0x42}, uint8_t{0x43}, uint8_t{0x44}}) {
-        Cpu c;
-        c.handle = handle++;
-        c.status = status;
-        c.coreCount = 1;
-        c.coreEnabled = 1;
-        table.add(cpu(c));
-    }
+    std::vector<uint8_t> const statuses = {uint8_t{0x42}, uint8_t{0x43}, uint8_t{0x44}};
     TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(mi, oneCpuPerValue(statuses, [](Cpu& c, uint8_t status) {
+                         c.status = status;
+                         c.coreCount = 1;
+                         c.coreEnabled = 1;
+                     }));
 
     EXPECT_EQ(1u, mi.nodeList.size());
     EXPECT_TRUE(run.cpus.empty());
@@ -371,19 +332,13 @@ TEST(ProcessorNodes, StatusesDisabledByUserOrFirmwareOrIdleMakeNoNode) {
 // Only status 1 reaches the node-status mapping; every other combination of
 // the populated bit and the CPU status bits is left out.
 TEST(ProcessorNodes, OnlyPopulatedWithCpuStatusOneIsSelected) {
-    TableBuilder table;
     std::vector<uint8_t> const statuses = {0x00, 0x01, 0x02, 0x07, 0x40, 0x41, 0x45,
                                            0x46, 0x47, 0x49, 0x61, 0x81, 0xC1, 0xFF};
-    uint16_t handle = 0x0400;
-    for (uint8_t status : statuses) {
-        Cpu c;
-        c.handle = handle++;
-        c.status = status;
-        c.socket = "Socket " + std::to_string(status);
-        table.add(cpu(c));
-    }
     TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(mi, oneCpuPerValue(statuses, [](Cpu& c, uint8_t status) {
+                         c.status = status;
+                         c.socket = "Socket " + std::to_string(status);
+                     }));
 
     // 0x41, 0x49 (bit 3 is outside the mask), 0x61 (bit 5 likewise) and 0xC1.
     ASSERT_EQ(4u, run.cpus.size());
@@ -404,11 +359,8 @@ TEST(ProcessorNodes, FirstProcessorSkippedSecondGetsIndexZeroAndDescriptionEndin
     Cpu present;
     present.handle = 0x0401;
     present.socket = "CPU1";
-    TableBuilder table;
-    table.add(cpu(absent));
-    table.add(cpu(present));
     TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(mi, tableOf({cpu(absent), cpu(present)}));
 
     ASSERT_EQ(1u, run.cpus.size());
     EXPECT_TRUE(hasString(run.cpus[0], 53, "CPU1"));
@@ -441,10 +393,8 @@ TEST(ProcessorNodes, DescriptionCountsFromOneWhileIndexCountsFromZero) {
 TEST(ProcessorNodes, ProcessorIdIsStoredAsItsEightBytesReversed) {
     Cpu c;
     c.id = 0x0123456789ABCDEFull;
-    TableBuilder table;
-    table.add(cpu(c));
     TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(mi, tableOf({cpu(c)}));
     ASSERT_EQ(0xEF, run.parsed.getTables()[0].getByte(0x08));
 
     ASSERT_EQ(1u, run.cpus.size());
@@ -455,18 +405,12 @@ TEST(ProcessorNodes, ProcessorIdIsStoredAsItsEightBytesReversed) {
 
 TEST(ProcessorNodes, SteppingIsTheLowNibbleOfTheFirstIdByteAsDecimalText) {
     smbiostest::LogCapture log;
-    TableBuilder table;
     std::vector<uint8_t> const firstBytes = {0x00, 0x07, 0xA9, 0x5C};
     std::vector<std::string> const steppings = {"0", "7", "9", "12"};
-    uint16_t handle = 0x0400;
-    for (uint8_t first : firstBytes) {
-        Cpu c;
-        c.handle = handle++;
-        c.id = 0xBFEBFBFF00090600ull | first;
-        table.add(cpu(c));
-    }
     TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(mi, oneCpuPerValue(firstBytes, [](Cpu& c, uint8_t first) {
+                         c.id = 0xBFEBFBFF00090600ull | first;
+                     }));
 
     ASSERT_EQ(4u, run.cpus.size());
     for (size_t i = 0; i < run.cpus.size(); ++i) {
@@ -477,18 +421,11 @@ TEST(ProcessorNodes, SteppingIsTheLowNibbleOfTheFirstIdByteAsDecimalText) {
 }
 
 TEST(ProcessorNodes, UpgradeOtherAndUnknownGiveZeroThreeGivesOneAbove22GiveZero) {
-    TableBuilder table;
     std::vector<uint8_t> const upgrades = {1, 2, 3, 22, 23, 0x2B};
     std::vector<long long> const values = {0, 0, 1, 20, 0, 0};
-    uint16_t handle = 0x0400;
-    for (uint8_t upgrade : upgrades) {
-        Cpu c;
-        c.handle = handle++;
-        c.upgrade = upgrade;
-        table.add(cpu(c));
-    }
     TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(
+        mi, oneCpuPerValue(upgrades, [](Cpu& c, uint8_t upgrade) { c.upgrade = upgrade; }));
 
     ASSERT_EQ(upgrades.size(), run.cpus.size());
     for (size_t i = 0; i < run.cpus.size(); ++i) {
@@ -498,18 +435,11 @@ TEST(ProcessorNodes, UpgradeOtherAndUnknownGiveZeroThreeGivesOneAbove22GiveZero)
 }
 
 TEST(ProcessorNodes, CharacteristicsBit2GivesSixtyFourElseThirtyTwo) {
-    TableBuilder table;
     std::vector<uint16_t> const words = {0x0004, 0x0006, 0x00FB, 0x0000, 0xFFFF};
     std::vector<unsigned int> const widths = {64, 64, 32, 32, 64};
-    uint16_t handle = 0x0400;
-    for (uint16_t word : words) {
-        Cpu c;
-        c.handle = handle++;
-        c.characteristics = word;
-        table.add(cpu(c));
-    }
     TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(
+        mi, oneCpuPerValue(words, [](Cpu& c, uint16_t word) { c.characteristics = word; }));
 
     ASSERT_EQ(words.size(), run.cpus.size());
     for (size_t i = 0; i < run.cpus.size(); ++i) {
@@ -530,11 +460,8 @@ TEST(ProcessorNodes, StructureEndingInsideCharacteristicsKeepsPropertiesSetSoFar
     c.coreCount = 2;
     c.coreEnabled = 2;
     c.threadCount = 2;
-    TableBuilder table;
-    table.add(cache(0x0700, "L1-Cache", 1));
-    table.add(cpu(c));
     TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(mi, tableOf({cache(0x0700, "L1-Cache", 1), cpu(c)}));
     ASSERT_EQ(0x27, run.parsed.getTables()[1].getLength());
 
     ASSERT_EQ(1u, run.cpus.size());
@@ -566,11 +493,8 @@ TEST(ProcessorNodes, FailingProcessorDoesNotStopTheNextOne) {
     Cpu whole;
     whole.handle = 0x0401;
     whole.socket = "CPU1";
-    TableBuilder table;
-    table.add(cpu(broken));
-    table.add(cpu(whole));
     TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(mi, tableOf({cpu(broken), cpu(whole)}));
 
     ASSERT_EQ(2u, run.cpus.size());
     EXPECT_TRUE(lacksProperty(run.cpus[0], 15));
@@ -588,12 +512,9 @@ TEST(ProcessorNodes, ThreeCacheCallsPerProcessorAndHandleFFFFMatchesNothing) {
     c.l1 = 0x0700;
     c.l2 = 0xFFFF;
     c.l3 = 0xFFFF;
-    TableBuilder table;
-    table.add(cache(0x0700, "L1-Cache", 1));
-    table.add(cache(0x0701, "L2-Cache", 2));
-    table.add(cpu(c));
     TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(mi,
+                     tableOf({cache(0x0700, "L1-Cache", 1), cache(0x0701, "L2-Cache", 2), cpu(c)}));
 
     EXPECT_EQ(3u, loggedCount("makeCacheNodes entry handle=")) << log.dump();
     EXPECT_EQ(1u, loggedCount("makeCacheNodes entry handle=1792")) << log.dump();
@@ -654,10 +575,8 @@ TEST(ProcessorNodes, FourCoresTwoEnabledEightThreads) {
     c.coreCount = 4;
     c.coreEnabled = 2;
     c.threadCount = 8;
-    TableBuilder table;
-    table.add(cpu(c));
     TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(mi, tableOf({cpu(c)}));
 
     ASSERT_EQ(1u, run.cpus.size());
     EXPECT_TRUE(hasUnsigned(run.cpus[0], 190, 4));
@@ -685,10 +604,8 @@ TEST(ProcessorNodes, ThreadCountZeroLeavesCoresWithoutThreadProperty) {
     c.coreCount = 2;
     c.coreEnabled = 1;
     c.threadCount = 0;
-    TableBuilder table;
-    table.add(cpu(c));
     TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(mi, tableOf({cpu(c)}));
 
     ASSERT_EQ(1u, run.cpus.size());
     EXPECT_TRUE(hasUnsigned(run.cpus[0], 87, 0));
@@ -710,10 +627,8 @@ TEST(ProcessorNodes, Level20StructureHasNoCoreDataAndLogsTheNoCoreSuffix) {
     c.coreCount = 4;
     c.coreEnabled = 4;
     c.threadCount = 8;
-    TableBuilder table;
-    table.add(cpu(c));
     TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(mi, tableOf({cpu(c)}));
     ASSERT_EQ(0x1A, run.parsed.getTables()[0].getLength());
 
     ASSERT_EQ(1u, run.cpus.size());
@@ -743,10 +658,8 @@ TEST(ProcessorNodes, CoreCountZeroMakesNoCoreNodes) {
     c.coreCount = 0;
     c.coreEnabled = 0;
     c.threadCount = 4;
-    TableBuilder table;
-    table.add(cpu(c));
     TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(mi, tableOf({cpu(c)}));
 
     EXPECT_TRUE(nodesOfType(mi, 42).empty());
     ASSERT_EQ(1u, run.cpus.size());
@@ -765,10 +678,8 @@ TEST(ProcessorNodes, EmptyStringsAreSetAsEmptyText) {
     c.serial = "";
     c.assetTag = "";
     c.partNumber = "";
-    TableBuilder table;
-    table.add(cpu(c));
     TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(mi, tableOf({cpu(c)}));
 
     ASSERT_EQ(1u, run.cpus.size());
     for (unsigned int id : {53u, 36u, 307u, 50u, 2u, 45u}) {
@@ -779,10 +690,8 @@ TEST(ProcessorNodes, EmptyStringsAreSetAsEmptyText) {
 
 TEST(ProcessorNodes, NoProcessorStructuresLogCountZeroAndMakeNothing) {
     smbiostest::LogCapture log;
-    TableBuilder table;
-    table.add(cache(0x0700, "L1-Cache", 1));
     TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(mi, tableOf({cache(0x0700, "L1-Cache", 1)}));
 
     EXPECT_EQ(1u, mi.nodeList.size());
     EXPECT_EQ(

@@ -10,20 +10,7 @@
 
 #include "BuilderFixture.h"
 
-using buildertest::childrenOf;
-using buildertest::hasBytes;
-using buildertest::hasDouble;
-using buildertest::hasNodeType;
-using buildertest::hasUnsigned;
-using buildertest::hasUnsignedList;
-using buildertest::lacksProperty;
-using buildertest::nodesOfType;
-using buildertest::propertyIds;
-using buildertest::StructureLists;
-using buildertest::TestMI;
-using smbiostest::LogCapture;
-using smbiostest::Structure;
-using smbiostest::TableBuilder;
+using namespace buildertest;
 
 namespace {
 
@@ -63,16 +50,6 @@ Probe at(uint8_t locationAndStatus) {
 
 std::vector<unsigned int> const SENSOR_STATUSES = {1, 0, 21, 24, 27};
 
-size_t loggedCount(std::string const& text) {
-    size_t count = 0;
-    for (std::string const& logged : frametest::loggedTexts()) {
-        if (logged.find(text) != std::string::npos) {
-            ++count;
-        }
-    }
-    return count;
-}
-
 // The builder's own log texts, without the structure model's string-lookup
 // lines.
 std::vector<std::string> builderTexts() {
@@ -98,24 +75,14 @@ TEST(TemperatureSensorNodes, ProbeAtTheLocationSetsEveryField) {
     p.minimum = 0x0064;          // 10.0
     p.oem = {0x11, 0x22, 0x33, 0x44};
     p.nominal = 0x0190;  // 40.0
-    TableBuilder builder;
-    builder.add(probe(TEMPERATURE, 0x1C00, p));
-    SD::SmBios parsed(builder.build());
-    ASSERT_EQ(0x16, parsed.getTables()[0].getLength());
-    StructureLists lists(parsed);
-    IC::MutableNode* parent = buildertest::addParent(mi);
-    LogCapture log;
-    mi.makeTemperatureSensorNodes(lists.get(), parent->getNodeId(), 3);
+    ParentSetup setup(mi, tableOf({probe(TEMPERATURE, 0x1C00, p)}));
+    ASSERT_EQ(0x16, setup.built.parsed.getTables()[0].getLength());
+    mi.makeTemperatureSensorNodes(setup.built.lists.get(), setup.parent->getNodeId(), 3);
 
     std::vector<IC::Node*> const nodes = nodesOfType(mi, 22);
-    ASSERT_EQ(1u, nodes.size()) << log.dump();
+    ASSERT_EQ(1u, nodes.size()) << setup.log.dump();
     IC::Node const* node = nodes[0];
-    EXPECT_TRUE(hasNodeType(node, 22));
-    EXPECT_EQ(3u, node->getNodeId());
-    EXPECT_EQ(2u, node->getLinkedId());
-    EXPECT_EQ(0u, node->getIndex());
-    EXPECT_EQ(1u, node->getStatus());
-    EXPECT_EQ("CPU 1 Temp", node->getDescription());
+    EXPECT_TRUE(isNode(node, 3u, 2u, 22, 0u, 1u, "CPU 1 Temp"));
     EXPECT_EQ(std::vector<unsigned int>{1}, node->getMIIds());
     EXPECT_EQ((Ids{14, 23, 31, 33, 43, 125}), propertyIds(node));
     EXPECT_TRUE(hasUnsignedList(node, 125, SENSOR_STATUSES));
@@ -125,7 +92,7 @@ TEST(TemperatureSensorNodes, ProbeAtTheLocationSetsEveryField) {
     EXPECT_TRUE(hasDouble(node, 14, 40.0));
     EXPECT_TRUE(hasDouble(node, 23, 80.0));
     EXPECT_TRUE(hasDouble(node, 33, 10.0));
-    EXPECT_EQ(node, lists.storage[TEMPERATURE][0].node);
+    EXPECT_EQ(node, setup.built.lists.storage[TEMPERATURE][0].node);
     EXPECT_EQ(2u, mi.nodeList.size());
     EXPECT_TRUE(childrenOf(mi, 3).empty());
 
@@ -133,7 +100,7 @@ TEST(TemperatureSensorNodes, ProbeAtTheLocationSetsEveryField) {
                                         "Temperature in 0.1 degrees=400",
                                         "makeTemperatureSensorNodes exit"}),
               builderTexts())
-        << log.dump();
+        << setup.log.dump();
 }
 
 TEST(TemperatureSensorNodes, OnlyProbesAtTheLocationMakeNodesAndIndexesCountSkippedOnes) {
@@ -146,11 +113,8 @@ TEST(TemperatureSensorNodes, OnlyProbesAtTheLocationMakeNodesAndIndexesCountSkip
     builder.add(probe(TEMPERATURE, 0x1C00, first));
     builder.add(probe(TEMPERATURE, 0x1C01, at(0x64)));  // location 4
     builder.add(probe(TEMPERATURE, 0x1C02, third));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* parent = buildertest::addParent(mi);
-    LogCapture log;
-    mi.makeTemperatureSensorNodes(lists.get(), parent->getNodeId(), 3);
+    ParentSetup setup(mi, builder);
+    mi.makeTemperatureSensorNodes(setup.built.lists.get(), setup.parent->getNodeId(), 3);
 
     std::vector<IC::Node*> const nodes = nodesOfType(mi, 22);
     ASSERT_EQ(2u, nodes.size());
@@ -160,9 +124,9 @@ TEST(TemperatureSensorNodes, OnlyProbesAtTheLocationMakeNodesAndIndexesCountSkip
     EXPECT_EQ(4u, nodes[1]->getNodeId());
     EXPECT_EQ(2u, nodes[1]->getIndex());
     EXPECT_EQ("third", nodes[1]->getDescription());
-    EXPECT_EQ(nullptr, lists.storage[TEMPERATURE][1].node);
+    EXPECT_EQ(nullptr, setup.built.lists.storage[TEMPERATURE][1].node);
     // Every structure is logged, the skipped one too.
-    EXPECT_EQ(3u, loggedCount("Table 28 length = 22")) << log.dump();
+    EXPECT_EQ(3u, loggedCount("Table 28 length = 22")) << setup.log.dump();
 }
 
 TEST(TemperatureSensorNodes, LocationIsTheLowFiveBitsOfItsByte) {
@@ -170,10 +134,8 @@ TEST(TemperatureSensorNodes, LocationIsTheLowFiveBitsOfItsByte) {
     TableBuilder builder;
     builder.add(probe(TEMPERATURE, 0x1C00, at(0x7F)));  // status 3, location 31
     builder.add(probe(TEMPERATURE, 0x1C01, at(0x83)));  // status 4, location 3
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* parent = buildertest::addParent(mi);
-    mi.makeTemperatureSensorNodes(lists.get(), parent->getNodeId(), 0x1F);
+    ParentSetup setup(mi, builder);
+    mi.makeTemperatureSensorNodes(setup.built.lists.get(), setup.parent->getNodeId(), 0x1F);
 
     std::vector<IC::Node*> const nodes = nodesOfType(mi, 22);
     ASSERT_EQ(1u, nodes.size());
@@ -189,10 +151,8 @@ TEST(TemperatureSensorNodes, StatusFallsThroughToOtherForCriticalAndNonRecoverab
     for (size_t i = 0; i < bytes.size(); ++i) {
         builder.add(probe(TEMPERATURE, static_cast<uint16_t>(0x1C00 + i), at(bytes[i])));
     }
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* parent = buildertest::addParent(mi);
-    mi.makeTemperatureSensorNodes(lists.get(), parent->getNodeId(), 3);
+    ParentSetup setup(mi, builder);
+    mi.makeTemperatureSensorNodes(setup.built.lists.get(), setup.parent->getNodeId(), 3);
 
     std::vector<IC::Node*> const nodes = nodesOfType(mi, 22);
     ASSERT_EQ(bytes.size(), nodes.size());
@@ -217,21 +177,18 @@ TEST(TemperatureSensorNodes, NominalIsInTenthsOfADegreeAndUnknownOnlyAt0x800) {
     builder.add(probe(TEMPERATURE, 0x1C00, p400));
     builder.add(probe(TEMPERATURE, 0x1C01, unknown));
     builder.add(probe(TEMPERATURE, 0x1C02, high));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* parent = buildertest::addParent(mi);
-    LogCapture log;
-    mi.makeTemperatureSensorNodes(lists.get(), parent->getNodeId(), 3);
+    ParentSetup setup(mi, builder);
+    mi.makeTemperatureSensorNodes(setup.built.lists.get(), setup.parent->getNodeId(), 3);
 
     std::vector<IC::Node*> const nodes = nodesOfType(mi, 22);
     ASSERT_EQ(3u, nodes.size());
     EXPECT_TRUE(hasDouble(nodes[0], 14, 40.0));
     EXPECT_TRUE(lacksProperty(nodes[1], 14));
     EXPECT_TRUE(hasDouble(nodes[2], 14, 3276.8));
-    EXPECT_EQ(1u, loggedCount("Temperature in 0.1 degrees=400")) << log.dump();
-    EXPECT_EQ(0u, loggedCount("Temperature in 0.1 degrees=2048")) << log.dump();
-    EXPECT_EQ(1u, loggedCount("Temperature in 0.1 degrees=32768")) << log.dump();
-    EXPECT_EQ(2u, loggedCount("Temperature in 0.1 degrees=")) << log.dump();
+    EXPECT_EQ(1u, loggedCount("Temperature in 0.1 degrees=400")) << setup.log.dump();
+    EXPECT_EQ(0u, loggedCount("Temperature in 0.1 degrees=2048")) << setup.log.dump();
+    EXPECT_EQ(1u, loggedCount("Temperature in 0.1 degrees=32768")) << setup.log.dump();
+    EXPECT_EQ(2u, loggedCount("Temperature in 0.1 degrees=")) << setup.log.dump();
 }
 
 TEST(TemperatureSensorNodes, NegativeReadingIsTakenAsALargeUnsignedValue) {
@@ -241,10 +198,8 @@ TEST(TemperatureSensorNodes, NegativeReadingIsTakenAsALargeUnsignedValue) {
     p.nominal = 0xFF9C;  // -100 as a two's-complement word
     p.minimum = 0xFE0C;  // -500
     builder.add(probe(TEMPERATURE, 0x1C00, p));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* parent = buildertest::addParent(mi);
-    mi.makeTemperatureSensorNodes(lists.get(), parent->getNodeId(), 3);
+    ParentSetup setup(mi, builder);
+    mi.makeTemperatureSensorNodes(setup.built.lists.get(), setup.parent->getNodeId(), 3);
 
     std::vector<IC::Node*> const nodes = nodesOfType(mi, 22);
     ASSERT_EQ(1u, nodes.size());
@@ -263,10 +218,8 @@ TEST(TemperatureSensorNodes, MaximumAndMinimumUnknownAt0x8000AreNotSet) {
     atNominalUnknown.minimum = 0x0000;
     builder.add(probe(TEMPERATURE, 0x1C00, both));
     builder.add(probe(TEMPERATURE, 0x1C01, atNominalUnknown));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* parent = buildertest::addParent(mi);
-    mi.makeTemperatureSensorNodes(lists.get(), parent->getNodeId(), 3);
+    ParentSetup setup(mi, builder);
+    mi.makeTemperatureSensorNodes(setup.built.lists.get(), setup.parent->getNodeId(), 3);
 
     std::vector<IC::Node*> const nodes = nodesOfType(mi, 22);
     ASSERT_EQ(2u, nodes.size());
@@ -288,19 +241,16 @@ TEST(TemperatureSensorNodes, ShortStructureReadsTheMissingNominalAsZeroAndSetsIt
                     .word(0x0005)
                     .word(0x0010)
                     .bytes({0x01, 0x02, 0x03, 0x04}));
-    SD::SmBios parsed(builder.build());
-    ASSERT_EQ(0x14, parsed.getTables()[0].getLength());
-    StructureLists lists(parsed);
-    IC::MutableNode* parent = buildertest::addParent(mi);
-    LogCapture log;
-    mi.makeTemperatureSensorNodes(lists.get(), parent->getNodeId(), 3);
+    ParentSetup setup(mi, builder);
+    ASSERT_EQ(0x14, setup.built.parsed.getTables()[0].getLength());
+    mi.makeTemperatureSensorNodes(setup.built.lists.get(), setup.parent->getNodeId(), 3);
 
     std::vector<IC::Node*> const nodes = nodesOfType(mi, 22);
     ASSERT_EQ(1u, nodes.size());
     EXPECT_TRUE(hasDouble(nodes[0], 14, 0.0));
     EXPECT_TRUE(hasBytes(nodes[0], 43, {0x04, 0x03, 0x02, 0x01}));
-    EXPECT_TRUE(log.contains("getNumber16 offset=20 length=20")) << log.dump();
-    EXPECT_EQ(1u, loggedCount("Temperature in 0.1 degrees=0")) << log.dump();
+    EXPECT_TRUE(setup.log.contains("getNumber16 offset=20 length=20")) << setup.log.dump();
+    EXPECT_EQ(1u, loggedCount("Temperature in 0.1 degrees=0")) << setup.log.dump();
 }
 
 TEST(TemperatureSensorNodes, NoProbeStructureMakesNoNode) {
@@ -308,17 +258,14 @@ TEST(TemperatureSensorNodes, NoProbeStructureMakesNoNode) {
     TableBuilder builder;
     // A voltage probe is not a temperature probe.
     builder.add(probe(VOLTAGE, 0x1A00, at(0x63)));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* parent = buildertest::addParent(mi);
-    LogCapture log;
-    mi.makeTemperatureSensorNodes(lists.get(), parent->getNodeId(), 3);
+    ParentSetup setup(mi, builder);
+    mi.makeTemperatureSensorNodes(setup.built.lists.get(), setup.parent->getNodeId(), 3);
 
     EXPECT_EQ(1u, mi.nodeList.size());
     EXPECT_EQ((std::vector<std::string>{"makeTemperatureSensorNodes entry",
                                         "makeTemperatureSensorNodes exit"}),
               builderTexts())
-        << log.dump();
+        << setup.log.dump();
 }
 
 TEST(TemperatureSensorNodes, FailureLogsTable28AndTheIndexAndGoesOn) {
@@ -328,18 +275,15 @@ TEST(TemperatureSensorNodes, FailureLogsTable28AndTheIndexAndGoesOn) {
     // The last structure claims a formatted area longer than its bytes, so
     // its description string cannot be found: the lookup throws.
     builder.add(probe(TEMPERATURE, 0x1C01, at(0x63)).length(0x40));
-    SD::SmBios parsed(builder.build());
-    ASSERT_EQ(2u, parsed.getTables().size());
-    StructureLists lists(parsed);
-    IC::MutableNode* parent = buildertest::addParent(mi);
-    LogCapture log;
-    mi.makeTemperatureSensorNodes(lists.get(), parent->getNodeId(), 3);
+    ParentSetup setup(mi, builder);
+    ASSERT_EQ(2u, setup.built.parsed.getTables().size());
+    mi.makeTemperatureSensorNodes(setup.built.lists.get(), setup.parent->getNodeId(), 3);
 
     std::string const logged = frametest::firstLogged("Exception=");
-    EXPECT_EQ(0u, logged.find("Exception=")) << log.dump();
+    EXPECT_EQ(0u, logged.find("Exception=")) << setup.log.dump();
     EXPECT_NE(std::string::npos, logged.find(" Type=")) << logged;
     EXPECT_NE(std::string::npos, logged.find("Table 28 index =1")) << logged;
-    EXPECT_EQ((std::vector<int>{6000}), frametest::loggedLevels("Exception=")) << log.dump();
+    EXPECT_EQ((std::vector<int>{6000}), frametest::loggedLevels("Exception=")) << setup.log.dump();
 
     std::vector<IC::Node*> const nodes = nodesOfType(mi, 22);
     ASSERT_EQ(2u, nodes.size());
@@ -348,7 +292,7 @@ TEST(TemperatureSensorNodes, FailureLogsTable28AndTheIndexAndGoesOn) {
     EXPECT_EQ(1u, nodes[1]->getIndex());
     EXPECT_EQ(1u, nodes[1]->getStatus());
     EXPECT_EQ((Ids{125}), propertyIds(nodes[1]));
-    EXPECT_EQ(1u, loggedCount("makeTemperatureSensorNodes exit")) << log.dump();
+    EXPECT_EQ(1u, loggedCount("makeTemperatureSensorNodes exit")) << setup.log.dump();
 }
 
 // ---------------------------------------------------------------- voltage
@@ -362,23 +306,13 @@ TEST(VoltageSensorNodes, ProbeAtTheLocationSetsEveryFieldInVolts) {
     p.minimum = 11400;
     p.oem = {0xA0, 0xB0, 0xC0, 0xD0};
     p.nominal = 12000;
-    TableBuilder builder;
-    builder.add(probe(VOLTAGE, 0x1A00, p));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* parent = buildertest::addParent(mi);
-    LogCapture log;
-    mi.makeVoltageSensorNodes(lists.get(), parent->getNodeId(), 4);
+    ParentSetup setup(mi, tableOf({probe(VOLTAGE, 0x1A00, p)}));
+    mi.makeVoltageSensorNodes(setup.built.lists.get(), setup.parent->getNodeId(), 4);
 
     std::vector<IC::Node*> const nodes = nodesOfType(mi, 21);
-    ASSERT_EQ(1u, nodes.size()) << log.dump();
+    ASSERT_EQ(1u, nodes.size()) << setup.log.dump();
     IC::Node const* node = nodes[0];
-    EXPECT_TRUE(hasNodeType(node, 21));
-    EXPECT_EQ(3u, node->getNodeId());
-    EXPECT_EQ(2u, node->getLinkedId());
-    EXPECT_EQ(0u, node->getIndex());
-    EXPECT_EQ(21u, node->getStatus());
-    EXPECT_EQ("12V Rail", node->getDescription());
+    EXPECT_TRUE(isNode(node, 3u, 2u, 21, 0u, 21u, "12V Rail"));
     EXPECT_EQ(std::vector<unsigned int>{1}, node->getMIIds());
     EXPECT_EQ((Ids{14, 23, 31, 33, 43, 125}), propertyIds(node));
     EXPECT_TRUE(hasUnsignedList(node, 125, SENSOR_STATUSES));
@@ -387,13 +321,13 @@ TEST(VoltageSensorNodes, ProbeAtTheLocationSetsEveryFieldInVolts) {
     EXPECT_TRUE(hasDouble(node, 14, 12.0));
     EXPECT_TRUE(hasDouble(node, 23, 12.6));
     EXPECT_TRUE(hasDouble(node, 33, 11.4));
-    EXPECT_EQ(node, lists.storage[VOLTAGE][0].node);
+    EXPECT_EQ(node, setup.built.lists.storage[VOLTAGE][0].node);
     EXPECT_EQ(2u, mi.nodeList.size());
 
     EXPECT_EQ((std::vector<std::string>{"makeVoltageSensorNodes entry", "Table 26 length = 22",
                                         "Millivolts=12000", "makeVoltageSensorNodes exit"}),
               builderTexts())
-        << log.dump();
+        << setup.log.dump();
 }
 
 TEST(VoltageSensorNodes, Nominal12000Is12VoltsAndMaximum0x8000IsNotSet) {
@@ -402,12 +336,8 @@ TEST(VoltageSensorNodes, Nominal12000Is12VoltsAndMaximum0x8000IsNotSet) {
     p.nominal = 12000;
     p.maximum = 0x8000;
     p.minimum = 0x8000;
-    TableBuilder builder;
-    builder.add(probe(VOLTAGE, 0x1A00, p));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* parent = buildertest::addParent(mi);
-    mi.makeVoltageSensorNodes(lists.get(), parent->getNodeId(), 3);
+    ParentSetup setup(mi, tableOf({probe(VOLTAGE, 0x1A00, p)}));
+    mi.makeVoltageSensorNodes(setup.built.lists.get(), setup.parent->getNodeId(), 3);
 
     std::vector<IC::Node*> const nodes = nodesOfType(mi, 21);
     ASSERT_EQ(1u, nodes.size());
@@ -422,21 +352,15 @@ TEST(VoltageSensorNodes, NominalUnknownOnlyAt0x800) {
     unknown.nominal = 0x0800;
     Probe high = at(0x63);
     high.nominal = 0x8000;
-    TableBuilder builder;
-    builder.add(probe(VOLTAGE, 0x1A00, unknown));
-    builder.add(probe(VOLTAGE, 0x1A01, high));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* parent = buildertest::addParent(mi);
-    LogCapture log;
-    mi.makeVoltageSensorNodes(lists.get(), parent->getNodeId(), 3);
+    ParentSetup setup(mi, tableOf({probe(VOLTAGE, 0x1A00, unknown), probe(VOLTAGE, 0x1A01, high)}));
+    mi.makeVoltageSensorNodes(setup.built.lists.get(), setup.parent->getNodeId(), 3);
 
     std::vector<IC::Node*> const nodes = nodesOfType(mi, 21);
     ASSERT_EQ(2u, nodes.size());
     EXPECT_TRUE(lacksProperty(nodes[0], 14));
     EXPECT_TRUE(hasDouble(nodes[1], 14, 32.768));
-    EXPECT_EQ(1u, loggedCount("Millivolts=")) << log.dump();
-    EXPECT_EQ(1u, loggedCount("Millivolts=32768")) << log.dump();
+    EXPECT_EQ(1u, loggedCount("Millivolts=")) << setup.log.dump();
+    EXPECT_EQ(1u, loggedCount("Millivolts=32768")) << setup.log.dump();
 }
 
 TEST(VoltageSensorNodes, LocationFilterAndStatusesAreThoseOfTheTemperatureProbes) {
@@ -446,11 +370,8 @@ TEST(VoltageSensorNodes, LocationFilterAndStatusesAreThoseOfTheTemperatureProbes
     builder.add(probe(VOLTAGE, 0x1A01, at(0x63)));  // location 3
     builder.add(probe(VOLTAGE, 0x1A02, at(0xC5)));  // non-recoverable, location 5
     builder.add(probe(VOLTAGE, 0x1A03, at(0x65)));  // OK, location 5
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* parent = buildertest::addParent(mi);
-    LogCapture log;
-    mi.makeVoltageSensorNodes(lists.get(), parent->getNodeId(), 5);
+    ParentSetup setup(mi, builder);
+    mi.makeVoltageSensorNodes(setup.built.lists.get(), setup.parent->getNodeId(), 5);
 
     std::vector<IC::Node*> const nodes = nodesOfType(mi, 21);
     ASSERT_EQ(3u, nodes.size());
@@ -460,7 +381,7 @@ TEST(VoltageSensorNodes, LocationFilterAndStatusesAreThoseOfTheTemperatureProbes
     EXPECT_EQ(0u, nodes[1]->getStatus());
     EXPECT_EQ(3u, nodes[2]->getIndex());
     EXPECT_EQ(1u, nodes[2]->getStatus());
-    EXPECT_EQ(4u, loggedCount("Table 26 length = 22")) << log.dump();
+    EXPECT_EQ(4u, loggedCount("Table 26 length = 22")) << setup.log.dump();
 }
 
 TEST(VoltageSensorNodes, NoProbeStructureMakesNoNode) {
@@ -468,30 +389,22 @@ TEST(VoltageSensorNodes, NoProbeStructureMakesNoNode) {
     TableBuilder builder;
     // A temperature probe is not a voltage probe.
     builder.add(probe(TEMPERATURE, 0x1C00, at(0x63)));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* parent = buildertest::addParent(mi);
-    LogCapture log;
-    mi.makeVoltageSensorNodes(lists.get(), parent->getNodeId(), 3);
+    ParentSetup setup(mi, builder);
+    mi.makeVoltageSensorNodes(setup.built.lists.get(), setup.parent->getNodeId(), 3);
 
     EXPECT_EQ(1u, mi.nodeList.size());
     EXPECT_EQ(
         (std::vector<std::string>{"makeVoltageSensorNodes entry", "makeVoltageSensorNodes exit"}),
         frametest::loggedTexts())
-        << log.dump();
+        << setup.log.dump();
 }
 
 TEST(VoltageSensorNodes, FailureLogsTable26AndTheIndex) {
     TestMI mi;
-    TableBuilder builder;
-    builder.add(probe(VOLTAGE, 0x1A00, at(0x63)).length(0x40));
-    SD::SmBios parsed(builder.build());
-    StructureLists lists(parsed);
-    IC::MutableNode* parent = buildertest::addParent(mi);
-    LogCapture log;
-    mi.makeVoltageSensorNodes(lists.get(), parent->getNodeId(), 3);
+    ParentSetup setup(mi, tableOf({probe(VOLTAGE, 0x1A00, at(0x63)).length(0x40)}));
+    mi.makeVoltageSensorNodes(setup.built.lists.get(), setup.parent->getNodeId(), 3);
 
     std::string const logged = frametest::firstLogged("Exception=");
-    EXPECT_NE(std::string::npos, logged.find("Table 26 index =0")) << log.dump();
-    EXPECT_EQ(1u, loggedCount("makeVoltageSensorNodes exit")) << log.dump();
+    EXPECT_NE(std::string::npos, logged.find("Table 26 index =0")) << setup.log.dump();
+    EXPECT_EQ(1u, loggedCount("makeVoltageSensorNodes exit")) << setup.log.dump();
 }

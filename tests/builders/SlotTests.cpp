@@ -13,18 +13,7 @@
 #include "BuilderFixture.h"
 #include "QNLog/QNLogger.h"
 
-using buildertest::addParent;
-using buildertest::hasEnum;
-using buildertest::hasNodeType;
-using buildertest::hasString;
-using buildertest::hasUnsigned;
-using buildertest::lacksProperty;
-using buildertest::nodesOfType;
-using buildertest::propertyIds;
-using buildertest::StructureLists;
-using buildertest::TestMI;
-using smbiostest::Structure;
-using smbiostest::TableBuilder;
+using namespace buildertest;
 
 namespace {
 
@@ -57,37 +46,19 @@ Structure slot(uint16_t handle, std::string const& designation, uint8_t slotType
         .byte(0x00);
 }
 
-// The texts the slot builder itself logged (log output only), in order.
-std::vector<std::string> slotLog() {
-    std::vector<std::string> texts;
-    for (QNLog::QNLogRecord const& record : QNLog::QNLogger::captured()) {
-        if (record.output == "log" && record.logger == SLOT_LOGGER) {
-            texts.push_back(record.text);
-        }
-    }
-    return texts;
-}
-
 // The slot nodes the builder makes from a table, under a planar.
-struct SlotRun {
-    explicit SlotRun(TableBuilder const& table) : parsed(table.build()), lists(parsed) {
-        planar = addParent(mi);
+struct SlotRun : PlanarSetup {
+    explicit SlotRun(TableBuilder const& table) : PlanarSetup(table) {
         mi.makeSlotNodes(lists.get(), planar->getNodeId());
         nodes = nodesOfType(mi, SLOT_NODE);
     }
 
-    SD::SmBios parsed;
-    StructureLists lists;
-    TestMI mi;
-    IC::MutableNode* planar = nullptr;
     std::vector<IC::Node*> nodes;
 };
 
 // The agent's slot type the builder reports for one slot of the SMBIOS type.
 ::testing::AssertionResult slotTypeBecomes(uint8_t smbiosType, unsigned int expected) {
-    TableBuilder table;
-    table.add(slot(0x0900, "SLOT1", smbiosType, 1));
-    SlotRun run(table);
+    SlotRun run(tableOf({slot(0x0900, "SLOT1", smbiosType, 1)}));
     if (run.nodes.size() != 1) {
         return ::testing::AssertionFailure() << run.nodes.size() << " slot nodes, expected 1";
     }
@@ -98,19 +69,12 @@ struct SlotRun {
 
 TEST(SlotBuilder, SlotNodeFieldByField) {
     smbiostest::LogCapture log;
-    TableBuilder table;
-    table.add(slot(0x0900, "PCIE1", 0xA8, 0x0102));
-    SlotRun run(table);
+    SlotRun run(tableOf({slot(0x0900, "PCIE1", 0xA8, 0x0102)}));
 
     ASSERT_EQ(1u, run.nodes.size());
     IC::Node const* node = run.nodes[0];
-    EXPECT_EQ(3u, node->getNodeId());
-    EXPECT_EQ(run.planar->getNodeId(), node->getLinkedId());
-    EXPECT_TRUE(hasNodeType(node, 62));
-    EXPECT_EQ(0u, node->getIndex());
+    EXPECT_TRUE(isNode(node, 3u, run.planar->getNodeId(), 62, 0u, 1u, "System Slot"));
     EXPECT_EQ(run.mi.miIdList, node->getMIIds());
-    EXPECT_EQ(1u, node->getStatus());
-    EXPECT_EQ("System Slot", node->getDescription());
     EXPECT_EQ((std::vector<unsigned int>{108, 128, 270}), propertyIds(node));
     EXPECT_TRUE(hasString(node, 108, "PCIE1"));
     EXPECT_TRUE(hasEnum(node, 128, 4, 21));
@@ -120,17 +84,14 @@ TEST(SlotBuilder, SlotNodeFieldByField) {
     EXPECT_EQ(4u, run.mi.nextNodeId);
     EXPECT_EQ((std::vector<std::string>{"makeSlotNodes entry", "Table 9 length = 13",
                                         "makeSlotNodes exit"}),
-              slotLog())
+              loggedBy(SLOT_LOGGER))
         << log.dump();
 }
 
 TEST(SlotBuilder, SlotTypesA8AndB4Give21_06Gives16_12Gives17) {
-    TableBuilder table;
-    table.add(slot(0x0900, "PCIE x4 gen1", 0xA8, 1));
-    table.add(slot(0x0901, "PCIE x4 gen3", 0xB4, 2));
-    table.add(slot(0x0902, "PCI", 0x06, 3));
-    table.add(slot(0x0903, "PCI-X", 0x12, 4));
-    SlotRun run(table);
+    SlotRun run(
+        tableOf({slot(0x0900, "PCIE x4 gen1", 0xA8, 1), slot(0x0901, "PCIE x4 gen3", 0xB4, 2),
+                 slot(0x0902, "PCI", 0x06, 3), slot(0x0903, "PCI-X", 0x12, 4)}));
 
     ASSERT_EQ(4u, run.nodes.size());
     EXPECT_TRUE(hasEnum(run.nodes[0], 128, 4, 21));
@@ -172,11 +133,9 @@ TEST(SlotBuilder, EmptySlotGroupMakesNoNodesAndLogsOnlyEntryAndExit) {
 }
 
 TEST(SlotBuilder, TwoSlotsGetIndexesZeroAndOneInGroupOrder) {
-    TableBuilder table;
-    table.add(slot(0x0900, "SLOT A", 0xA6, 0x0001));
-    table.add(Structure(8, 0x0800).str("J1").byte(0).str("").byte(0).byte(0x09));
-    table.add(slot(0x0901, "SLOT B", 0xAA, 0x0002));
-    SlotRun run(table);
+    SlotRun run(tableOf({slot(0x0900, "SLOT A", 0xA6, 0x0001),
+                         Structure(8, 0x0800).str("J1").byte(0).str("").byte(0).byte(0x09),
+                         slot(0x0901, "SLOT B", 0xAA, 0x0002)}));
 
     ASSERT_EQ(2u, run.nodes.size());
     EXPECT_EQ(3u, run.nodes[0]->getNodeId());
@@ -195,9 +154,7 @@ TEST(SlotBuilder, TwoSlotsGetIndexesZeroAndOneInGroupOrder) {
 }
 
 TEST(SlotBuilder, SlotTypeIsAFourByteEnumeratedValue) {
-    TableBuilder table;
-    table.add(slot(0x0900, "PCI1", 0x0E, 7));
-    SlotRun run(table);
+    SlotRun run(tableOf({slot(0x0900, "PCI1", 0x0E, 7)}));
 
     ASSERT_EQ(1u, run.nodes.size());
     IC::PropertyValue value;
@@ -208,10 +165,7 @@ TEST(SlotBuilder, SlotTypeIsAFourByteEnumeratedValue) {
 }
 
 TEST(SlotBuilder, SlotIdIsTheWordAtOffset9) {
-    TableBuilder table;
-    table.add(slot(0x0900, "SLOT1", 0xA5, 270));
-    table.add(slot(0x0901, "SLOT2", 0xA5, 0xBEEF));
-    SlotRun run(table);
+    SlotRun run(tableOf({slot(0x0900, "SLOT1", 0xA5, 270), slot(0x0901, "SLOT2", 0xA5, 0xBEEF)}));
 
     ASSERT_EQ(2u, run.nodes.size());
     EXPECT_TRUE(hasUnsigned(run.nodes[0], 270, 270));
@@ -281,7 +235,7 @@ TEST(SlotBuilder, FailureInOneSlotIsLoggedAndTheNextSlotStillGetsANode) {
     EXPECT_TRUE(hasString(run.nodes[1], 108, "WHOLE"));
     EXPECT_TRUE(hasEnum(run.nodes[1], 128, 4, 22));
     EXPECT_TRUE(hasUnsigned(run.nodes[1], 270, 5));
-    std::vector<std::string> const texts = slotLog();
+    std::vector<std::string> const texts = loggedBy(SLOT_LOGGER);
     ASSERT_FALSE(texts.empty());
     EXPECT_EQ("makeSlotNodes exit", texts.back());
 }
