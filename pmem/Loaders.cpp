@@ -96,6 +96,94 @@ bool placeEntryPointAndTable(RegionMemory& memory, std::vector<unsigned char> co
     return memory.place(first, std::move(bytes));
 }
 
+// What the sysfs source presents: an entry point at 0xF0000 and the address
+// at which its table is served.
+struct Presentation {
+    std::vector<unsigned char> entryPoint;
+    unsigned long address = kMovedTableAddress;
+};
+
+uint64_t const kBelow4GiB = 0xFFFFFFFFu;
+uint64_t const kLastAddress = ULONG_MAX;
+
+// A 2.x entry point states at most 65535 bytes: of a larger table, keeps
+// the whole structures of its start that fit, and says so in cut. False
+// when not one fits.
+bool fitTo2x(std::vector<unsigned char>& table, TableCut& cut) {
+    if (table.size() <= smbiosformat::MAX_2X_TABLE_LENGTH) {
+        return true;
+    }
+    smbiosformat::TablePrefix const prefix =
+        smbiosformat::wholeStructuresWithin(table, smbiosformat::MAX_2X_TABLE_LENGTH);
+    cut.cut = true;
+    cut.tableBytes = table.size();
+    cut.tableStructures = smbiosformat::tableStats(table).count;
+    cut.servedBytes = prefix.bytes;
+    cut.servedStructures = prefix.count;
+    table.resize(prefix.bytes);
+    return prefix.bytes != 0;
+}
+
+// "_SM3_": 0x06 length, 0x07 major, 0x08 minor, 0x0C maximum table size,
+// 0x10 the 64-bit table address. Presented as the equivalent "_SM_" entry
+// point, its table at its own address when that lies below 4 GiB. False
+// when the entry point is short.
+bool presentSm3(std::vector<unsigned char> const& entryPoint,
+                std::vector<unsigned char> const& table, Presentation& out) {
+    if (entryPoint.size() < smbiosformat::SM3_ENTRY_POINT_SIZE ||
+        entryPoint[6] < smbiosformat::SM3_ENTRY_POINT_SIZE) {
+        return false;
+    }
+    uint64_t const stated = smbiosformat::getQword(entryPoint, 0x10);
+    if (canServeAt(stated, table.size(), std::min(kBelow4GiB, kLastAddress),
+                   smbiosformat::SM_ENTRY_POINT_SIZE)) {
+        out.address = static_cast<unsigned long>(stated);
+    }
+    smbiosformat::TableStats const stats = smbiosformat::tableStats(table);
+    out.entryPoint = smbiosformat::makeSmEntryPoint(
+        entryPoint[7], entryPoint[8], static_cast<uint16_t>(table.size()),
+        static_cast<uint32_t>(out.address), stats.count, stats.maxSize);
+    return true;
+}
+
+// "_SM_": 0x05 length, 0x15 intermediate checksum over 0x10-0x1E, 0x18 the
+// 32-bit table address. The kernel copies 30 to 32 bytes. Presented as it
+// is, amended when its table must move. False when it is short.
+bool presentSm(std::vector<unsigned char> const& entryPoint,
+               std::vector<unsigned char> const& table, Presentation& out) {
+    if (entryPoint.size() < 0x1E) {
+        return false;
+    }
+    out.entryPoint = entryPoint;
+    uint32_t const stated = smbiosformat::getDword(entryPoint, 0x18);
+    if (canServeAt(stated, table.size(), kLastAddress, entryPoint.size())) {
+        out.address = static_cast<unsigned long>(stated);
+    } else {
+        smbiosformat::putDword(out.entryPoint, 0x18, static_cast<uint32_t>(out.address));
+        setChecksum(out.entryPoint, 0x15, 0x10, 0x1F);
+        setChecksum(out.entryPoint, 0x04, 0, out.entryPoint[5]);
+    }
+    return true;
+}
+
+// "_DMI_": 15 bytes, 0x05 checksum, 0x08 the 32-bit table address.
+// Presented as it is, amended when its table must move. False when short.
+bool presentDmi(std::vector<unsigned char> const& entryPoint,
+                std::vector<unsigned char> const& table, Presentation& out) {
+    if (entryPoint.size() < smbiosformat::DMI_ENTRY_POINT_SIZE) {
+        return false;
+    }
+    out.entryPoint = entryPoint;
+    uint32_t const stated = smbiosformat::getDword(entryPoint, 0x08);
+    if (canServeAt(stated, table.size(), kLastAddress, entryPoint.size())) {
+        out.address = static_cast<unsigned long>(stated);
+    } else {
+        smbiosformat::putDword(out.entryPoint, 0x08, static_cast<uint32_t>(out.address));
+        setChecksum(out.entryPoint, 0x05, 0, smbiosformat::DMI_ENTRY_POINT_SIZE);
+    }
+    return true;
+}
+
 }  // namespace
 
 bool readWholeFile(std::string const& path, size_t limit, std::vector<unsigned char>& bytes,
@@ -180,82 +268,34 @@ bool loadSysfsTables(std::string const& folder, RegionMemory& memory, std::strin
         why = folder + "/DMI: empty";
         return false;
     }
-    std::string const shortEntryPoint = entryPointPath + ": shorter than its entry point";
-    uint64_t const below4GiB = 0xFFFFFFFFu;
-    uint64_t const lastAddress = ULONG_MAX;
-    unsigned long address = kMovedTableAddress;
-    std::vector<unsigned char> presented;
+    Presentation presented;
+    TableCut fitted;
+    bool known = true;
+    bool whole = false;
     if (startsWith(entryPoint, "_SM3_")) {
-        // 0x06 length, 0x07 major, 0x08 minor, 0x0C maximum table size,
-        // 0x10 the 64-bit table address.
-        if (entryPoint.size() < smbiosformat::SM3_ENTRY_POINT_SIZE ||
-            entryPoint[6] < smbiosformat::SM3_ENTRY_POINT_SIZE) {
-            why = shortEntryPoint;
+        if (!fitTo2x(table, fitted)) {
+            why = folder + "/DMI: no whole structure in its first 65535 bytes";
             return false;
         }
-        if (table.size() > smbiosformat::MAX_2X_TABLE_LENGTH) {
-            // A 2.x entry point states at most 65535 bytes: serve the whole
-            // structures of the table's start that fit, and say so.
-            smbiosformat::TablePrefix const prefix =
-                smbiosformat::wholeStructuresWithin(table, smbiosformat::MAX_2X_TABLE_LENGTH);
-            cut.cut = true;
-            cut.tableBytes = table.size();
-            cut.tableStructures = smbiosformat::tableStats(table).count;
-            cut.servedBytes = prefix.bytes;
-            cut.servedStructures = prefix.count;
-            if (prefix.bytes == 0) {
-                why = folder + "/DMI: no whole structure in its first 65535 bytes";
-                return false;
-            }
-            table.resize(prefix.bytes);
-        }
-        uint64_t const stated = smbiosformat::getQword(entryPoint, 0x10);
-        if (canServeAt(stated, table.size(), std::min(below4GiB, lastAddress),
-                       smbiosformat::SM_ENTRY_POINT_SIZE)) {
-            address = static_cast<unsigned long>(stated);
-        }
-        smbiosformat::TableStats const stats = smbiosformat::tableStats(table);
-        presented = smbiosformat::makeSmEntryPoint(
-            entryPoint[7], entryPoint[8], static_cast<uint16_t>(table.size()),
-            static_cast<uint32_t>(address), stats.count, stats.maxSize);
+        whole = presentSm3(entryPoint, table, presented);
     } else if (startsWith(entryPoint, "_SM_")) {
-        // 0x05 length, 0x15 intermediate checksum over 0x10-0x1E, 0x18 the
-        // 32-bit table address. The kernel copies 30 to 32 bytes.
-        if (entryPoint.size() < 0x1E) {
-            why = shortEntryPoint;
-            return false;
-        }
-        presented = entryPoint;
-        uint32_t const stated = smbiosformat::getDword(presented, 0x18);
-        if (canServeAt(stated, table.size(), lastAddress, presented.size())) {
-            address = static_cast<unsigned long>(stated);
-        } else {
-            smbiosformat::putDword(presented, 0x18, static_cast<uint32_t>(address));
-            setChecksum(presented, 0x15, 0x10, 0x1F);
-            setChecksum(presented, 0x04, 0, presented[5]);
-        }
+        whole = presentSm(entryPoint, table, presented);
     } else if (startsWith(entryPoint, "_DMI_")) {
-        // 15 bytes: 0x05 checksum, 0x08 the 32-bit table address.
-        if (entryPoint.size() < smbiosformat::DMI_ENTRY_POINT_SIZE) {
-            why = shortEntryPoint;
-            return false;
-        }
-        presented = entryPoint;
-        uint32_t const stated = smbiosformat::getDword(presented, 0x08);
-        if (canServeAt(stated, table.size(), lastAddress, presented.size())) {
-            address = static_cast<unsigned long>(stated);
-        } else {
-            smbiosformat::putDword(presented, 0x08, static_cast<uint32_t>(address));
-            setChecksum(presented, 0x05, 0, smbiosformat::DMI_ENTRY_POINT_SIZE);
-        }
+        whole = presentDmi(entryPoint, table, presented);
     } else {
-        why = entryPointPath + ": neither a _SM3_, _SM_ nor _DMI_ entry point";
+        known = false;
+    }
+    if (!known || !whole) {
+        why = entryPointPath + (known ? ": shorter than its entry point"
+                                      : ": neither a _SM3_, _SM_ nor _DMI_ entry point");
         return false;
     }
-    if (!placeEntryPointAndTable(memory, presented, address, std::move(table))) {
+    if (!placeEntryPointAndTable(memory, presented.entryPoint, presented.address,
+                                 std::move(table))) {
         why = folder + "/DMI: cannot be served at its address";
         return false;
     }
+    cut = fitted;
     return true;
 }
 

@@ -43,7 +43,8 @@ bool loadImage(std::string const& list, RegionMemory& memory, std::string& why);
 // version, both checksums correct), its table at its own address when that
 // lies below 4 GiB, else at 0x100000. A 3.x table longer than a 2.x entry
 // point can state (65535 bytes) is served as the whole structures of its
-// start that fit, and cut says so. False, with why, when a file is missing,
+// start that fit, and cut says so (cut is set only when the source can
+// serve). False, with why, when a file is missing,
 // unreadable or empty, or the entry point is unknown or short.
 struct TableCut {
     bool cut = false;              // the table served is the start of a larger one
