@@ -9,6 +9,35 @@ namespace IC {
 namespace {
 QNLog::QNLogger logger("Quillon.IC.MI.SmBiosMI.SmBiosMIPlnr");
 
+// The builders a planar node runs under it, in order. Kept: the two orders
+// differ (without a baseboard structure the firmware comes before the disk
+// controller and the raw tables last); node ids, and so the agent's stored
+// inventory, follow them.
+using PlanarBuilder = void (SmBiosMI::*)(TableLists, unsigned int);
+PlanarBuilder const BARE_PLANAR_ORDER[] = {
+    &SmBiosMI::makeCpuNodes,  &SmBiosMI::makeSlotNodes,        &SmBiosMI::makeConnectorNodes,
+    &SmBiosMI::makeDimmNodes, &SmBiosMI::makeFirmwareNodes,    &SmBiosMI::makeDiskControllerNodes,
+    &SmBiosMI::makeKVDNode,   &SmBiosMI::makeSMBIOSTableNodes,
+};
+PlanarBuilder const BASEBOARD_PLANAR_ORDER[] = {
+    &SmBiosMI::makeCpuNodes,
+    &SmBiosMI::makeSlotNodes,
+    &SmBiosMI::makeConnectorNodes,
+    &SmBiosMI::makeDimmNodes,
+    &SmBiosMI::makeDiskControllerNodes,
+    &SmBiosMI::makeSMBIOSTableNodes,
+    &SmBiosMI::makeFirmwareNodes,
+    &SmBiosMI::makeKVDNode,
+};
+
+template <size_t N>
+void runBuilders(SmBiosMI& mi, PlanarBuilder const (&order)[N], TableLists tables,
+                 unsigned int planarId) {
+    for (PlanarBuilder builder : order) {
+        (mi.*builder)(tables, planarId);
+    }
+}
+
 // Baseboard Information (type 2) fields.
 unsigned char const HANDLE = 0x02;
 unsigned char const MANUFACTURER = 0x04;
@@ -36,16 +65,7 @@ void makeBarePlanarNode(SmBiosMI& mi, TableLists tables, unsigned int parentNode
     node->setStatus(1);
     node->setDescription("Planar");
     unsigned int const planarId = node->getNodeId();
-    // Kept: this order differs from the one with a baseboard below; node
-    // ids, and so the agent's stored inventory, follow it.
-    mi.makeCpuNodes(tables, planarId);
-    mi.makeSlotNodes(tables, planarId);
-    mi.makeConnectorNodes(tables, planarId);
-    mi.makeDimmNodes(tables, planarId);
-    mi.makeFirmwareNodes(tables, planarId);
-    mi.makeDiskControllerNodes(tables, planarId);
-    mi.makeKVDNode(tables, planarId);
-    mi.makeSMBIOSTableNodes(tables, planarId);
+    runBuilders(mi, BARE_PLANAR_ORDER, tables, planarId);
 }
 
 size_t chooseBaseboard(SmBiosMI const& mi, TableLists tables) {
@@ -153,14 +173,7 @@ void makeBaseboardPlanarNode(SmBiosMI& mi, TableLists tables, TableData& entry, 
     logContainedHandles(mi, t, groups);
     logGroupAssociations(mi, groups, handle);
 
-    mi.makeCpuNodes(groups, planarId);
-    mi.makeSlotNodes(groups, planarId);
-    mi.makeConnectorNodes(groups, planarId);
-    mi.makeDimmNodes(groups, planarId);
-    mi.makeDiskControllerNodes(groups, planarId);
-    mi.makeSMBIOSTableNodes(groups, planarId);
-    mi.makeFirmwareNodes(groups, planarId);
-    mi.makeKVDNode(groups, planarId);
+    runBuilders(mi, BASEBOARD_PLANAR_ORDER, groups, planarId);
     logStructureLists(logger, groups);
 }
 
