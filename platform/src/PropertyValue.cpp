@@ -156,10 +156,13 @@ PropertyValue& PropertyValue::operator=(PropertyValue&& other) noexcept {
 
 PropertyValue::~PropertyValue() { destroyValue(); }
 
-void PropertyValue::copyValue(PropertyValue const& other) {
+// Constructs this value's alternative (kind_ already set) from other's:
+// copied from an lvalue, moved from an rvalue.
+template <typename Other>
+void PropertyValue::takeValue(Other&& other) {
     switch (kind_) {
         case STRING:
-            new (&string_) std::string(other.string_);
+            new (&string_) std::string(std::forward<Other>(other).string_);
             break;
         case NUMBER:
             new (&number_) Number(other.number_);
@@ -171,13 +174,13 @@ void PropertyValue::copyValue(PropertyValue const& other) {
             byte_ = other.byte_;
             break;
         case BYTES:
-            new (&bytes_) std::vector<unsigned char>(other.bytes_);
+            new (&bytes_) std::vector<unsigned char>(std::forward<Other>(other).bytes_);
             break;
         case NUMBERS:
-            new (&numbers_) std::vector<Number>(other.numbers_);
+            new (&numbers_) std::vector<Number>(std::forward<Other>(other).numbers_);
             break;
         case STRINGS:
-            new (&strings_) std::vector<std::string>(other.strings_);
+            new (&strings_) std::vector<std::string>(std::forward<Other>(other).strings_);
             break;
         case KIND:
             kindValue_ = other.kindValue_;
@@ -187,36 +190,10 @@ void PropertyValue::copyValue(PropertyValue const& other) {
     }
 }
 
-void PropertyValue::moveValue(PropertyValue& other) noexcept {
-    switch (kind_) {
-        case STRING:
-            new (&string_) std::string(std::move(other.string_));
-            break;
-        case NUMBER:
-            new (&number_) Number(other.number_);
-            break;
-        case ENUM:
-            new (&enum_) EnumValue(other.enum_);
-            break;
-        case BYTE:
-            byte_ = other.byte_;
-            break;
-        case BYTES:
-            new (&bytes_) std::vector<unsigned char>(std::move(other.bytes_));
-            break;
-        case NUMBERS:
-            new (&numbers_) std::vector<Number>(std::move(other.numbers_));
-            break;
-        case STRINGS:
-            new (&strings_) std::vector<std::string>(std::move(other.strings_));
-            break;
-        case KIND:
-            kindValue_ = other.kindValue_;
-            break;
-        default:
-            break;
-    }
-}
+void PropertyValue::copyValue(PropertyValue const& other) { takeValue(other); }
+
+// Moving a string or a vector never throws.
+void PropertyValue::moveValue(PropertyValue& other) noexcept { takeValue(std::move(other)); }
 
 void PropertyValue::destroyValue() noexcept {
     using String = std::string;

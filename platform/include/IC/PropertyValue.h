@@ -73,6 +73,8 @@ public:
 private:
     // Makes the member of kind_ from the same member of other, by copy or by
     // move; the kind must already be set and no member alive.
+    template <typename Other>
+    void takeValue(Other&& other);
     void copyValue(PropertyValue const& other);
     void moveValue(PropertyValue& other) noexcept;
     // Ends the life of the member of kind_.
