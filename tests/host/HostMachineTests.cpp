@@ -250,7 +250,7 @@ namespace {
 // A dmidecode --dump-bin image of a 3.x table: the "_SM3_" entry point at 0
 // naming the table at 0x20.
 std::vector<uint8_t> dumpBin3(std::vector<uint8_t> const& table) {
-    std::vector<uint8_t> file(0x20, 0);
+    std::vector<uint8_t> file(0x20 + table.size(), 0);
     std::copy_n("_SM3_", 5, file.begin());
     file[6] = 0x18;
     file[7] = 3;
@@ -261,7 +261,7 @@ std::vector<uint8_t> dumpBin3(std::vector<uint8_t> const& table) {
         file[0x0C + i] = static_cast<uint8_t>(size >> (8 * i));
     }
     file[0x10] = 0x20;
-    file.insert(file.end(), table.begin(), table.end());
+    std::copy(table.begin(), table.end(), file.begin() + 0x20);
     return file;
 }
 
