@@ -33,24 +33,9 @@ public:
 
     // The kernel's copy of a 3.x table: a "_SM3_" entry point and the table.
     void sysfsTables(std::vector<uint8_t> const& table) {
-        std::vector<uint8_t> ep(0x18, 0);
-        std::copy_n("_SM3_", 5, ep.begin());
-        ep[6] = 0x18;
-        ep[7] = 3;
-        ep[8] = 2;
-        ep[0x0A] = 1;
-        uint32_t const size = static_cast<uint32_t>(table.size());
-        for (int i = 0; i < 4; ++i) {
-            ep[0x0C + i] = static_cast<uint8_t>(size >> (8 * i));
-        }
-        ep[0x10] = 0x00;
-        ep[0x12] = 0x20;  // the table at 0x200000
-        uint8_t sum = 0;
-        for (uint8_t b : ep) {
-            sum = static_cast<uint8_t>(sum + b);
-        }
-        ep[5] = static_cast<uint8_t>(0x100 - sum);
-        smbiostest::writeFile(sysfs_.file("smbios_entry_point"), ep);
+        smbiostest::writeFile(
+            sysfs_.file("smbios_entry_point"),
+            smbiostest::sm3EntryPoint(3, 2, 0, static_cast<uint32_t>(table.size()), 0x200000));
         smbiostest::writeFile(sysfs_.file("DMI"), table);
     }
 
@@ -251,16 +236,9 @@ namespace {
 // naming the table at 0x20.
 std::vector<uint8_t> dumpBin3(std::vector<uint8_t> const& table) {
     std::vector<uint8_t> file(0x20 + table.size(), 0);
-    std::copy_n("_SM3_", 5, file.begin());
-    file[6] = 0x18;
-    file[7] = 3;
-    file[8] = 2;
-    file[0x0A] = 1;
-    uint32_t const size = static_cast<uint32_t>(table.size());
-    for (int i = 0; i < 4; ++i) {
-        file[0x0C + i] = static_cast<uint8_t>(size >> (8 * i));
-    }
-    file[0x10] = 0x20;
+    std::vector<uint8_t> const ep =
+        smbiostest::sm3EntryPoint(3, 2, 0, static_cast<uint32_t>(table.size()), 0x20);
+    std::copy(ep.begin(), ep.end(), file.begin());
     std::copy(table.begin(), table.end(), file.begin() + 0x20);
     return file;
 }

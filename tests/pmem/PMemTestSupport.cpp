@@ -207,21 +207,6 @@ std::vector<uint8_t> smEntryPoint(std::vector<uint8_t> const& table, uint8_t maj
                                         stats.count, stats.maxSize);
 }
 
-std::vector<uint8_t> sm3EntryPoint(uint8_t major, uint8_t minor, uint8_t docrev, uint32_t maxSize,
-                                   uint64_t address) {
-    std::vector<uint8_t> ep(0x18, 0);
-    std::memcpy(ep.data(), "_SM3_", 5);
-    ep[6] = 0x18;
-    ep[7] = major;
-    ep[8] = minor;
-    ep[9] = docrev;
-    ep[0x0A] = 1;  // entry-point revision
-    putDword(ep, 0x0C, maxSize);
-    putQword(ep, 0x10, address);
-    setChecksum(ep, 5, 0, 0x18);
-    return ep;
-}
-
 uint8_t byteSum(std::vector<uint8_t> const& bytes, size_t begin, size_t end) {
     uint8_t sum = 0;
     for (size_t i = begin; i < end && i < bytes.size(); ++i) {

@@ -143,8 +143,7 @@ std::vector<uint8_t> sampleTable();
 std::vector<uint8_t> smEntryPoint(std::vector<uint8_t> const& table, uint8_t major, uint8_t minor,
                                   uint32_t address);
 // The 24-byte "_SM3_" entry point, its checksum set.
-std::vector<uint8_t> sm3EntryPoint(uint8_t major, uint8_t minor, uint8_t docrev, uint32_t maxSize,
-                                   uint64_t address);
+using smbiostest::sm3EntryPoint;
 
 uint8_t byteSum(std::vector<uint8_t> const& bytes, size_t begin, size_t end);
 uint16_t word(std::vector<uint8_t> const& bytes, size_t at);

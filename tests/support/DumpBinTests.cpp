@@ -42,24 +42,10 @@ std::vector<uint8_t> image(std::vector<uint8_t> const& header, std::vector<uint8
     return file;
 }
 
-// A "_SM3_" entry point; checksum set.
+// A "_SM3_" entry point (document revision 1); checksum set.
 std::vector<uint8_t> sm3EntryPoint(uint8_t major, uint8_t minor, uint32_t maxSize,
                                    uint64_t address) {
-    std::vector<uint8_t> ep(0x18, 0);
-    std::memcpy(ep.data(), "_SM3_", 5);
-    ep[6] = 0x18;
-    ep[7] = major;
-    ep[8] = minor;
-    ep[9] = 1;     // docrev
-    ep[0x0A] = 1;  // entry-point revision
-    for (size_t i = 0; i < 4; ++i) {
-        ep[0x0C + i] = static_cast<uint8_t>(maxSize >> (8 * i));
-    }
-    for (size_t i = 0; i < 8; ++i) {
-        ep[0x10 + i] = static_cast<uint8_t>(address >> (8 * i));
-    }
-    ep[5] = static_cast<uint8_t>(0x100 - sum(ep, 0, 0x18));
-    return ep;
+    return smbiostest::sm3EntryPoint(major, minor, 1, maxSize, address);
 }
 
 // Expects readDumpBin to refuse the file with a message containing `what`,

@@ -246,6 +246,22 @@ std::string padded(unsigned n, int width) {
 
 }  // namespace
 
+std::vector<uint8_t> sm3EntryPoint(uint8_t major, uint8_t minor, uint8_t docrev, uint32_t maxSize,
+                                   uint64_t address) {
+    std::vector<uint8_t> ep(smbiosformat::SM3_ENTRY_POINT_SIZE, 0);
+    std::memcpy(ep.data(), "_SM3_", 5);
+    ep[6] = static_cast<uint8_t>(smbiosformat::SM3_ENTRY_POINT_SIZE);
+    ep[7] = major;
+    ep[8] = minor;
+    ep[9] = docrev;
+    ep[0x0A] = 1;  // entry-point revision
+    smbiosformat::putDword(ep, 0x0C, maxSize);
+    smbiosformat::putDword(ep, 0x10, static_cast<uint32_t>(address & 0xFFFFFFFFu));
+    smbiosformat::putDword(ep, 0x14, static_cast<uint32_t>(address >> 32));
+    ep[5] = smbiosformat::checksumFor(ep, 0, ep.size());
+    return ep;
+}
+
 std::vector<uint8_t> largeServerTable(unsigned devices) {
     TableBuilder table;
     table.add(Structure(0, 0x0000).str("Corvane").str("CVE2.10").word(0xE800).str("01/15/2026"));

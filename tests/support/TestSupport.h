@@ -100,6 +100,11 @@ std::vector<std::string> commandLine(std::string const& program,
 void writeOverrideDir(std::string const& dataDir, std::vector<uint8_t> const& header,
                       std::vector<uint8_t> const& table);
 
+// The 24-byte "_SM3_" entry point of a 3.x table of at most maxSize bytes
+// at address, entry-point revision 1, its checksum set.
+std::vector<uint8_t> sm3EntryPoint(uint8_t major, uint8_t minor, uint8_t docrev, uint32_t maxSize,
+                                   uint64_t address);
+
 // The table of a large server: BIOS, system, baseboard, chassis, one
 // memory array, then `devices` memory devices of 16 GB (type 17, all of one
 // length: locator "DIMM_<nnnn>", bank "NODE <nn>", maker, serial "SN<nnnnnnnn>",
