@@ -55,6 +55,44 @@ unsigned int deviceSize(SD::SmBios::Table const* t, unsigned int length) {
     return size << 10;
 }
 
+// The properties of an installed memory device's node (size in KB).
+void setMemoryDeviceProperties(SmBiosMI& mi, TableData const& entry, unsigned int size,
+                               MutableNode* node) {
+    SD::SmBios::Table const* t = entry.table;
+    node->setStatus(1);
+    node->setProperty(125, PropertyValue(std::vector<Number>{Number(1u), Number(14u)}, true));
+    node->setProperty(112, PropertyValue(Number(size), true));
+    node->setProperty(73, PropertyValue(Number(size), true));
+    mi.propNumber16(t, TOTAL_WIDTH, 61, node);
+    mi.propNumber16(t, DATA_WIDTH, 15, node);
+    node->setProperty(69, PropertyValue(Number(1024u), true));
+    unsigned int const formFactor = mi.getNumber8(t, FORM_FACTOR);
+    node->setProperty(85,
+                      PropertyValue(EnumValue(formFactor <= 0x0F ? FORM_FACTORS[formFactor]
+                                                                 : static_cast<unsigned char>(0)),
+                                    true));
+    if (entry.length > 0x11) {
+        std::string const device = mi.getString(t, DEVICE_LOCATOR);
+        std::string const bank = mi.getString(t, BANK_LOCATOR);
+        std::string const locator =
+            !device.empty() && !bank.empty() ? device + ":" + bank : device + bank;
+        if (!locator.empty()) {
+            node->setProperty(68, PropertyValue(locator, true));
+            node->setDescription(locator);
+        }
+    }
+    unsigned int const memoryType = mi.getNumber8(t, MEMORY_TYPE);
+    node->setProperty(295,
+                      PropertyValue(EnumValue(memoryType <= 0x19 ? MEMORY_TYPES[memoryType]
+                                                                 : static_cast<unsigned char>(1)),
+                                    true));
+    node->setProperty(135, PropertyValue(Number(mi.getBool16(t, TYPE_DETAIL, 0x1000)), true));
+    mi.propNumber16(t, SPEED, 57, node);
+    mi.propString(t, MANUFACTURER, 36, node);
+    mi.propString(t, SERIAL, 50, node);
+    mi.propString(t, PART_NUMBER, 45, node);
+}
+
 }  // namespace
 
 // One node per memory array and one per installed memory device, all
@@ -94,38 +132,7 @@ void SmBiosMI::makeDimmNodes(TableLists tables, unsigned int parentNodeId) {
             return;
         }
         MutableNode* node = newNode(parentNodeId, 19, deviceIndex++);
-        node->setStatus(1);
-        node->setProperty(125, PropertyValue(std::vector<Number>{Number(1u), Number(14u)}, true));
-        node->setProperty(112, PropertyValue(Number(size), true));
-        node->setProperty(73, PropertyValue(Number(size), true));
-        propNumber16(t, TOTAL_WIDTH, 61, node);
-        propNumber16(t, DATA_WIDTH, 15, node);
-        node->setProperty(69, PropertyValue(Number(1024u), true));
-        unsigned int const formFactor = getNumber8(t, FORM_FACTOR);
-        node->setProperty(
-            85, PropertyValue(EnumValue(formFactor <= 0x0F ? FORM_FACTORS[formFactor]
-                                                           : static_cast<unsigned char>(0)),
-                              true));
-        if (entry.length > 0x11) {
-            std::string const device = getString(t, DEVICE_LOCATOR);
-            std::string const bank = getString(t, BANK_LOCATOR);
-            std::string const locator =
-                !device.empty() && !bank.empty() ? device + ":" + bank : device + bank;
-            if (!locator.empty()) {
-                node->setProperty(68, PropertyValue(locator, true));
-                node->setDescription(locator);
-            }
-        }
-        unsigned int const memoryType = getNumber8(t, MEMORY_TYPE);
-        node->setProperty(
-            295, PropertyValue(EnumValue(memoryType <= 0x19 ? MEMORY_TYPES[memoryType]
-                                                            : static_cast<unsigned char>(1)),
-                               true));
-        node->setProperty(135, PropertyValue(Number(getBool16(t, TYPE_DETAIL, 0x1000)), true));
-        propNumber16(t, SPEED, 57, node);
-        propString(t, MANUFACTURER, 36, node);
-        propString(t, SERIAL, 50, node);
-        propString(t, PART_NUMBER, 45, node);
+        setMemoryDeviceProperties(*this, entry, size, node);
     });
     SMBIOS_DETAIL(logger, "makeDimmNodes exit");
 }
