@@ -280,8 +280,7 @@ int captureFromMachine(CommandLine const& line, smbiosdump::Capture& capture) {
     std::string error;
     bool const captured = smbiosdump::captureFromMachine(library, capture, error);
     // Asked afresh, the library tells what it found when it chose its source.
-    smbiostool::MachineReport const report(library.find('/') == std::string::npos ? "./" + library
-                                                                                  : library);
+    smbiostool::MachineReport const report(smbiostool::libraryFile(library));
     if (!captured) {
         complain("cannot read this machine's SMBIOS table: " + error);
         for (std::string const& text :

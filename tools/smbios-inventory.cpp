@@ -355,7 +355,7 @@ std::string pluginPath(std::string const& option) {
     if (option.empty()) {
         return smbiostool::installedLibrary(smbiostool::ownFolder(), kPluginName);
     }
-    return option.find('/') == std::string::npos ? "./" + option : option;
+    return smbiostool::libraryFile(option);
 }
 
 // Loads the plug-in, initializes it, makes the extra nodes when asked to

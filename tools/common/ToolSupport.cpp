@@ -123,6 +123,10 @@ std::string ownFolder() {
     return slash == 0 ? std::string("/") : path.substr(0, slash);
 }
 
+std::string libraryFile(std::string const& name) {
+    return name.find('/') == std::string::npos ? "./" + name : name;
+}
+
 std::string installedLibrary(std::string const& programFolder, std::string const& name) {
     std::string const beside = programFolder + "/" + name;
     if (access(beside.c_str(), F_OK) == 0) {

@@ -59,4 +59,9 @@ std::string ownFolder();
 // PREFIX/lib).
 std::string installedLibrary(std::string const& programFolder, std::string const& name);
 
+// A library named on the command line as a path to load: a bare file name
+// means the file in the current folder ("./name"), never a search of the
+// library path.
+std::string libraryFile(std::string const& name);
+
 }  // namespace smbiostool

@@ -183,10 +183,7 @@ bool captureFromMemory(PMemFunctions const& pmem, Capture& out, std::string& err
 }
 
 bool captureFromMachine(std::string const& libraryPath, Capture& out, std::string& error) {
-    // A bare file name means the file in the current folder, not a search
-    // of the library path.
-    std::string const path =
-        libraryPath.find('/') == std::string::npos ? "./" + libraryPath : libraryPath;
+    std::string const path = smbiostool::libraryFile(libraryPath);
     pmem::BoundLibrary library(path);
     if (!library.loadAndBind()) {
         error =
