@@ -9,14 +9,9 @@ namespace {
 QNLog::QNLogger logger("Quillon.IC.MI.SmBiosMI.SmBiosMICache");
 
 // Cache Information (type 7) fields.
-unsigned char const HANDLE = 0x02;
-unsigned char const SOCKET = 0x04;
-unsigned char const CONFIGURATION = 0x05;
-unsigned char const MAXIMUM_SIZE = 0x07;
-unsigned char const INSTALLED_SIZE = 0x09;
-unsigned char const SPEED = 0x0F;
-unsigned char const SYSTEM_CACHE_TYPE = 0x11;
-unsigned char const ASSOCIATIVITY = 0x12;
+unsigned char const HANDLE = 0x02, SOCKET = 0x04, CONFIGURATION = 0x05, MAXIMUM_SIZE = 0x07,
+                    INSTALLED_SIZE = 0x09, SPEED = 0x0F, SYSTEM_CACHE_TYPE = 0x11,
+                    ASSOCIATIVITY = 0x12;
 
 // A size word in 1 KB blocks: the low 15 bits, times 64 when the
 // granularity bit (15) is set.

@@ -17,20 +17,10 @@ QNLog::QNLogger logger("Quillon.IC.MI.SmBiosMI.SmBiosMIChsss");
 char const* const NO_SYSTEM_TABLE = "Bios system information table does not exist";
 
 // System Enclosure or Chassis (type 3) fields.
-unsigned char const MANUFACTURER = 0x04;
-unsigned char const TYPE = 0x05;
-unsigned char const VERSION = 0x06;
-unsigned char const SERIAL = 0x07;
-unsigned char const ASSET_TAG = 0x08;
-unsigned char const BOOT_UP_STATE = 0x09;
-unsigned char const POWER_SUPPLY_STATE = 0x0A;
-unsigned char const THERMAL_STATE = 0x0B;
-unsigned char const SECURITY_STATUS = 0x0C;
-unsigned char const OEM_DEFINED = 0x0D;
-unsigned char const HEIGHT = 0x11;
-unsigned char const POWER_CORDS = 0x12;
-unsigned char const ELEMENT_COUNT = 0x13;
-unsigned char const ELEMENT_RECORD_LENGTH = 0x14;
+unsigned char const MANUFACTURER = 0x04, TYPE = 0x05, VERSION = 0x06, SERIAL = 0x07,
+                    ASSET_TAG = 0x08, BOOT_UP_STATE = 0x09, POWER_SUPPLY_STATE = 0x0A,
+                    THERMAL_STATE = 0x0B, SECURITY_STATUS = 0x0C, OEM_DEFINED = 0x0D, HEIGHT = 0x11,
+                    POWER_CORDS = 0x12, ELEMENT_COUNT = 0x13, ELEMENT_RECORD_LENGTH = 0x14;
 unsigned int const ELEMENTS = 0x15;
 
 unsigned int const EXPANSION_CHASSIS = 0x12;

@@ -14,15 +14,8 @@ namespace {
 QNLog::QNLogger logger("Quillon.IC.MI.SmBiosMI.SmBiosMICmptr");
 
 // System Information (type 1) fields.
-unsigned char const MANUFACTURER = 0x04;
-unsigned char const PRODUCT = 0x05;
-unsigned char const VERSION = 0x06;
-unsigned char const SERIAL = 0x07;
-unsigned char const UUID = 0x08;
-unsigned char const UUID_SIZE = 16;
-unsigned char const WAKE_UP = 0x18;
-unsigned char const SKU = 0x19;
-unsigned char const FAMILY = 0x1A;
+unsigned char const MANUFACTURER = 0x04, PRODUCT = 0x05, VERSION = 0x06, SERIAL = 0x07, UUID = 0x08,
+                    UUID_SIZE = 16, WAKE_UP = 0x18, SKU = 0x19, FAMILY = 0x1A;
 
 // The local offset from UTC in whole hours, truncated toward zero.
 double timeZoneHours() {

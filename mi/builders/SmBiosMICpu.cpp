@@ -20,28 +20,14 @@ namespace {
 QNLog::QNLogger logger("Quillon.IC.MI.SmBiosMI.SmBiosMICpu");
 
 // Processor Information (type 4) fields.
-unsigned char const SOCKET = 0x04;
-unsigned char const PROCESSOR_TYPE = 0x05;
-unsigned char const FAMILY = 0x06;
-unsigned char const MANUFACTURER = 0x07;
-unsigned char const PROCESSOR_ID = 0x08;
-unsigned char const VERSION = 0x10;
-unsigned char const VOLTAGE = 0x11;
-unsigned char const EXTERNAL_CLOCK = 0x12;
-unsigned char const MAX_SPEED = 0x14;
-unsigned char const CURRENT_SPEED = 0x16;
-unsigned char const STATUS = 0x18;
-unsigned char const UPGRADE = 0x19;
+unsigned char const SOCKET = 0x04, PROCESSOR_TYPE = 0x05, FAMILY = 0x06, MANUFACTURER = 0x07,
+                    PROCESSOR_ID = 0x08, VERSION = 0x10, VOLTAGE = 0x11, EXTERNAL_CLOCK = 0x12,
+                    MAX_SPEED = 0x14, CURRENT_SPEED = 0x16, STATUS = 0x18, UPGRADE = 0x19;
 unsigned char const CACHE_HANDLES[] = {0x1A, 0x1C, 0x1E};
 char const* const CACHE_LABELS[] = {
     " L1 Cache handle = ", " L2 Cache handle = ", " L3 Cache handle = "};
-unsigned char const SERIAL = 0x20;
-unsigned char const ASSET_TAG = 0x21;
-unsigned char const PART_NUMBER = 0x22;
-unsigned char const CORE_COUNT = 0x23;
-unsigned char const CORE_ENABLED = 0x24;
-unsigned char const THREAD_COUNT = 0x25;
-unsigned char const CHARACTERISTICS = 0x26;
+unsigned char const SERIAL = 0x20, ASSET_TAG = 0x21, PART_NUMBER = 0x22, CORE_COUNT = 0x23,
+                    CORE_ENABLED = 0x24, THREAD_COUNT = 0x25, CHARACTERISTICS = 0x26;
 
 // Socket populated (bit 6) and CPU enabled (status 1).
 unsigned int const STATUS_MASK = 0x47;

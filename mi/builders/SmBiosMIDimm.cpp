@@ -8,26 +8,15 @@ namespace {
 QNLog::QNLogger logger("Quillon.IC.MI.SmBiosMI.SmBiosMIDimm");
 
 // Physical Memory Array (type 16) fields.
-unsigned char const ARRAY_LOCATION = 0x04;
-unsigned char const ARRAY_USE = 0x05;
-unsigned char const ARRAY_ERROR_CORRECTION = 0x06;
-unsigned char const ARRAY_MAXIMUM_CAPACITY = 0x07;
-unsigned char const ARRAY_ERROR_HANDLE = 0x0B;
+unsigned char const ARRAY_LOCATION = 0x04, ARRAY_USE = 0x05, ARRAY_ERROR_CORRECTION = 0x06,
+                    ARRAY_MAXIMUM_CAPACITY = 0x07, ARRAY_ERROR_HANDLE = 0x0B;
 unsigned int const CAPACITY_UNKNOWN = 0x80000000u;
 
 // Memory Device (type 17) fields.
-unsigned char const TOTAL_WIDTH = 0x08;
-unsigned char const DATA_WIDTH = 0x0A;
-unsigned char const SIZE = 0x0C;
-unsigned char const FORM_FACTOR = 0x0E;
-unsigned char const DEVICE_LOCATOR = 0x10;
-unsigned char const BANK_LOCATOR = 0x11;
-unsigned char const MEMORY_TYPE = 0x12;
-unsigned char const TYPE_DETAIL = 0x13;
-unsigned char const SPEED = 0x15;
-unsigned char const MANUFACTURER = 0x17;
-unsigned char const SERIAL = 0x18;
-unsigned char const PART_NUMBER = 0x1A;
+unsigned char const TOTAL_WIDTH = 0x08, DATA_WIDTH = 0x0A, SIZE = 0x0C, FORM_FACTOR = 0x0E,
+                    DEVICE_LOCATOR = 0x10, BANK_LOCATOR = 0x11, MEMORY_TYPE = 0x12,
+                    TYPE_DETAIL = 0x13, SPEED = 0x15, MANUFACTURER = 0x17, SERIAL = 0x18,
+                    PART_NUMBER = 0x1A;
 
 // Form factor byte to property 85 (bytes above 0x0F give 0). Kept with its
 // irregular rows (Row of chips gives 1), as the agent's reports expect.

@@ -13,11 +13,8 @@ QNLog::QNLogger logger("Quillon.IC.MI.SmBiosMI.SmBiosMIFirmware");
 unsigned char const OEM_COUNT = 0x04;
 
 // BIOS Information (type 0) fields.
-unsigned char const VENDOR = 0x04;
-unsigned char const BIOS_VERSION = 0x05;
-unsigned char const RELEASE_DATE = 0x08;
-unsigned char const EC_MAJOR = 0x16;
-unsigned char const EC_MINOR = 0x17;
+unsigned char const VENDOR = 0x04, BIOS_VERSION = 0x05, RELEASE_DATE = 0x08, EC_MAJOR = 0x16,
+                    EC_MINOR = 0x17;
 unsigned int const EC_NOT_SUPPORTED = 255;
 
 // strtol of a version text, as the unsigned property value.

@@ -8,17 +8,10 @@ namespace {
 QNLog::QNLogger logger("Quillon.IC.MI.SmBiosMI.SmBiosMILog");
 
 // System Event Log (type 15) fields.
-unsigned char const HANDLE = 0x02;
-unsigned char const AREA_LENGTH = 0x04;
-unsigned char const HEADER_START = 0x06;
-unsigned char const DATA_START = 0x08;
-unsigned char const ACCESS_METHOD = 0x0A;
-unsigned char const LOG_STATUS = 0x0B;
-unsigned char const CHANGE_TOKEN = 0x0C;
-unsigned char const ACCESS_ADDRESS = 0x10;
-unsigned char const HEADER_FORMAT = 0x14;
-unsigned char const DESCRIPTOR_COUNT = 0x15;
-unsigned char const DESCRIPTOR_LENGTH = 0x16;
+unsigned char const HANDLE = 0x02, AREA_LENGTH = 0x04, HEADER_START = 0x06, DATA_START = 0x08,
+                    ACCESS_METHOD = 0x0A, LOG_STATUS = 0x0B, CHANGE_TOKEN = 0x0C,
+                    ACCESS_ADDRESS = 0x10, HEADER_FORMAT = 0x14, DESCRIPTOR_COUNT = 0x15,
+                    DESCRIPTOR_LENGTH = 0x16;
 unsigned int const DESCRIPTORS = 0x17;
 
 // The text a byte vector has as a property value.

@@ -39,18 +39,11 @@ void runBuilders(SmBiosMI& mi, PlanarBuilder const (&order)[N], TableLists table
 }
 
 // Baseboard Information (type 2) fields.
-unsigned char const HANDLE = 0x02;
-unsigned char const MANUFACTURER = 0x04;
-unsigned char const PRODUCT = 0x05;
+unsigned char const HANDLE = 0x02, MANUFACTURER = 0x04, PRODUCT = 0x05;
 // Kept: the Version string (0x06) is deliberately not read; the planar nodes
 // that agents have stored carry no version, and adding one would change them.
-unsigned char const SERIAL = 0x07;
-unsigned char const ASSET_TAG = 0x08;
-unsigned char const FEATURE_FLAGS = 0x09;
-unsigned char const LOCATION = 0x0A;
-unsigned char const CHASSIS_HANDLE = 0x0B;
-unsigned char const BOARD_TYPE = 0x0D;
-unsigned char const CONTAINED_COUNT = 0x0E;
+unsigned char const SERIAL = 0x07, ASSET_TAG = 0x08, FEATURE_FLAGS = 0x09, LOCATION = 0x0A,
+                    CHASSIS_HANDLE = 0x0B, BOARD_TYPE = 0x0D, CONTAINED_COUNT = 0x0E;
 unsigned int const CONTAINED_HANDLES = 0x0F;
 
 // Which baseboard becomes the planar: the first of these board types found

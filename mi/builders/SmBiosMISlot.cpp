@@ -11,9 +11,7 @@ namespace {
 QNLog::QNLogger logger("Quillon.IC.MI.SmBiosMI.SmBiosMISlot");
 
 // System Slots (type 9) fields.
-unsigned char const DESIGNATION = 0x04;
-unsigned char const SLOT_TYPE = 0x05;
-unsigned char const SLOT_ID = 0x09;
+unsigned char const DESIGNATION = 0x04, SLOT_TYPE = 0x05, SLOT_ID = 0x09;
 
 // SMBIOS slot type to the agent's slot type.
 constexpr std::pair<unsigned int, unsigned int> SLOT_TYPES[] = {

@@ -10,12 +10,8 @@ QNLog::QNLogger logger("Quillon.IC.MI.SmBiosMI.SmBiosMITemperature");
 
 // Probe fields, shared by the temperature (type 28) and voltage (type 26)
 // probes.
-unsigned char const DESCRIPTION = 0x04;
-unsigned char const LOCATION_AND_STATUS = 0x05;
-unsigned char const MAXIMUM = 0x06;
-unsigned char const MINIMUM = 0x08;
-unsigned char const OEM_DEFINED = 0x10;
-unsigned char const NOMINAL = 0x14;
+unsigned char const DESCRIPTION = 0x04, LOCATION_AND_STATUS = 0x05, MAXIMUM = 0x06, MINIMUM = 0x08,
+                    OEM_DEFINED = 0x10, NOMINAL = 0x14;
 // Kept: the nominal value's "unknown" is tested against 0x800, not 0x8000 as
 // for the limits; the agent's sensor history was recorded with this test.
 unsigned int const NOMINAL_UNKNOWN = 0x800;
