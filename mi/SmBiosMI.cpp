@@ -148,60 +148,55 @@ std::unique_ptr<StructureGroups> SmBiosMI::groupAcquiredTable() const {
 #define SMBIOSMI_FAIL(text, off, length) \
     SMBIOS_DETAIL(logger, text << static_cast<unsigned int>(off) << " length=" << (length))
 
-bool SmBiosMI::getBool16(SD::SmBios::Table const* t, unsigned char off, unsigned short mask) const {
+namespace {
+
+// The one body of every checked reader: read() when the offset lies inside
+// the formatted area, otherwise "<name>offset=... length=..." is logged and
+// fallback returned. read() runs only after the check.
+template <typename Value, typename Read>
+Value readField(SD::SmBios::Table const* t, unsigned char off, char const* name, Value fallback,
+                Read read) {
     unsigned int const length = t->getLength();
     if (off < length) {
-        return (t->getWord(off) & mask) != 0;
+        return read();
     }
-    SMBIOSMI_FAIL("getBool16 offset=", off, length);
-    return false;
+    SMBIOSMI_FAIL(name, off, length);
+    return fallback;
+}
+
+}  // namespace
+
+bool SmBiosMI::getBool16(SD::SmBios::Table const* t, unsigned char off, unsigned short mask) const {
+    return readField(t, off, "getBool16 offset=", false,
+                     [&] { return (t->getWord(off) & mask) != 0; });
 }
 
 unsigned int SmBiosMI::getNumber16(SD::SmBios::Table const* t, unsigned char off) const {
-    unsigned int const length = t->getLength();
-    if (off < length) {
-        return t->getWord(off);
-    }
-    SMBIOSMI_FAIL("getNumber16 offset=", off, length);
-    return 0;
+    return readField(t, off, "getNumber16 offset=", 0u,
+                     [&] { return static_cast<unsigned int>(t->getWord(off)); });
 }
 
+// Kept: "gtetEnumValue16" is the text the agent's log readers know.
 unsigned int SmBiosMI::getEnumValue16(SD::SmBios::Table const* t, unsigned char off,
                                       unsigned short mask, unsigned char shift) const {
-    unsigned int const length = t->getLength();
-    if (off < length) {
-        return static_cast<unsigned int>(t->getWord(off) & mask) >> shift;
-    }
-    SMBIOSMI_FAIL("gtetEnumValue16 offset=", off, length);
-    return 0;
+    return readField(t, off, "gtetEnumValue16 offset=", 0u,
+                     [&] { return static_cast<unsigned int>(t->getWord(off) & mask) >> shift; });
 }
 
 bool SmBiosMI::getBool8(SD::SmBios::Table const* t, unsigned char off, unsigned char mask) const {
-    unsigned int const length = t->getLength();
-    if (off < length) {
-        return (t->getByte(off) & mask) != 0;
-    }
-    SMBIOSMI_FAIL("getBool8 offset=", off, length);
-    return false;
+    return readField(t, off, "getBool8 offset=", false,
+                     [&] { return (t->getByte(off) & mask) != 0; });
 }
 
 unsigned int SmBiosMI::getNumber8(SD::SmBios::Table const* t, unsigned char off) const {
-    unsigned int const length = t->getLength();
-    if (off < length) {
-        return t->getByte(off);
-    }
-    SMBIOSMI_FAIL("getNumber8 offset=", off, length);
-    return 0;
+    return readField(t, off, "getNumber8 offset=", 0u,
+                     [&] { return static_cast<unsigned int>(t->getByte(off)); });
 }
 
 unsigned int SmBiosMI::getEnumValue(SD::SmBios::Table const* t, unsigned char off,
                                     unsigned char mask) const {
-    unsigned int const length = t->getLength();
-    if (off < length) {
-        return static_cast<unsigned int>(t->getByte(off) & mask);
-    }
-    SMBIOSMI_FAIL("getEnumValue offset=", off, length);
-    return 0;
+    return readField(t, off, "getEnumValue offset=", 0u,
+                     [&] { return static_cast<unsigned int>(t->getByte(off) & mask); });
 }
 
 unsigned int SmBiosMI::getNumber8Unprot(SD::SmBios::Table const* t, unsigned int off) const {
@@ -214,12 +209,8 @@ std::string SmBiosMI::getStrByIdx(SD::SmBios::Table const* t, unsigned char inde
 }
 
 std::string SmBiosMI::getString(SD::SmBios::Table const* t, unsigned char off) const {
-    unsigned int const length = t->getLength();
-    if (off < length) {
-        return getStrByIdx(t, t->getByte(off));
-    }
-    SMBIOSMI_FAIL("getString invalid offset=", off, length);
-    return std::string();
+    return readField(t, off, "getString invalid offset=", std::string(),
+                     [&] { return getStrByIdx(t, t->getByte(off)); });
 }
 
 std::vector<unsigned char> SmBiosMI::getBuffer(SD::SmBios::Table const* t, unsigned char off,

@@ -177,24 +177,30 @@ int PMemIsInitialized(void) {
     }
 }
 
-int PMemOpen(void) {
+namespace {
+
+// Runs use on the chosen source under the library's lock, and gives
+// fallback when there is no source or anything throws: nothing may escape
+// into a C caller.
+template <typename Result, typename Use>
+Result withSource(Result fallback, Use use) {
     try {
         pmem::Library& lib = library();
         std::lock_guard<std::mutex> lock(lib.mutex);
-        return lib.source && lib.source->open() ? 1 : 0;
+        return lib.source ? use(*lib.source) : fallback;
     } catch (...) {
-        return 0;
+        return fallback;
     }
 }
 
+}  // namespace
+
+int PMemOpen(void) {
+    return withSource(0, [](pmem::Source& source) { return source.open() ? 1 : 0; });
+}
+
 int PMemClose(void) {
-    try {
-        pmem::Library& lib = library();
-        std::lock_guard<std::mutex> lock(lib.mutex);
-        return lib.source && lib.source->close() ? 1 : 0;
-    } catch (...) {
-        return 0;
-    }
+    return withSource(0, [](pmem::Source& source) { return source.close() ? 1 : 0; });
 }
 
 // 0 when exactly `count` bytes were copied; -1 otherwise. A read of no
@@ -203,12 +209,7 @@ int PMemRead(void* buffer, unsigned long address, long count) {
     if (buffer == nullptr || count < 0) {
         return -1;
     }
-    try {
-        pmem::Library& lib = library();
-        std::lock_guard<std::mutex> lock(lib.mutex);
-        if (!lib.source) {
-            return -1;
-        }
+    return withSource(-1, [&](pmem::Source& source) {
         if (count == 0) {
             return 0;
         }
@@ -216,10 +217,8 @@ int PMemRead(void* buffer, unsigned long address, long count) {
         if (n - 1 > ULONG_MAX - address) {
             return -1;  // past the last address
         }
-        return lib.source->read(static_cast<unsigned char*>(buffer), address, n) ? 0 : -1;
-    } catch (...) {
-        return -1;
-    }
+        return source.read(static_cast<unsigned char*>(buffer), address, n) ? 0 : -1;
+    });
 }
 
 // The first address from `start`, advancing by `step` while not past `end`,
@@ -229,18 +228,11 @@ unsigned long PMemSearch(char const* anchor, unsigned long start, unsigned long 
     if (anchor == nullptr || *anchor == '\0' || step <= 0 || start > end) {
         return 0;
     }
-    try {
-        pmem::Library& lib = library();
-        std::lock_guard<std::mutex> lock(lib.mutex);
-        if (!lib.source) {
-            return 0;
-        }
+    return withSource(0ul, [&](pmem::Source& source) {
         unsigned long const length = static_cast<unsigned long>(std::strlen(anchor));
-        return lib.source->search(reinterpret_cast<unsigned char const*>(anchor), length, start,
-                                  end, static_cast<unsigned long>(step));
-    } catch (...) {
-        return 0;
-    }
+        return source.search(reinterpret_cast<unsigned char const*>(anchor), length, start, end,
+                             static_cast<unsigned long>(step));
+    });
 }
 
 // What the library found when it chose its source, for the tools to show a

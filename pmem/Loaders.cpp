@@ -195,32 +195,15 @@ bool readWholeFile(std::string const& path, size_t limit, std::vector<unsigned c
         why = path + ": " + why;
         return false;
     }
-    bytes.clear();
-    std::vector<unsigned char> chunk(64 * 1024);
-    bool ok = true;
-    for (;;) {
-        ssize_t const r = ::read(fd, chunk.data(), chunk.size());
-        if (r < 0) {
-            if (errno == EINTR) {
-                continue;
-            }
-            why = path + ": " + std::strerror(errno);
-            ok = false;
-            break;
-        }
-        if (r == 0) {
-            break;
-        }
-        size_t const n = static_cast<size_t>(r);
-        if (n > limit - bytes.size()) {
-            why = path + ": larger than " + std::to_string(limit) + " bytes";
-            ok = false;
-            break;
-        }
-        bytes.insert(bytes.end(), chunk.begin(), chunk.begin() + static_cast<std::ptrdiff_t>(n));
-    }
+    int error = 0;
+    SD::ReadEnd const end = SD::readToEnd(fd, limit, bytes, error);
     ::close(fd);
-    return ok;
+    if (end == SD::ReadEnd::Failed) {
+        why = path + ": " + std::strerror(error);
+    } else if (end == SD::ReadEnd::TooLarge) {
+        why = path + ": larger than " + std::to_string(limit) + " bytes";
+    }
+    return end == SD::ReadEnd::Whole;
 }
 
 bool loadImage(std::string const& list, RegionMemory& memory, std::string& why) {

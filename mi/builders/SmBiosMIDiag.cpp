@@ -11,6 +11,17 @@ unsigned char const OEM_COUNT = 0x04;
 
 bool isDigit(char c) { return c >= '0' && c <= '9'; }
 
+// The decimal number whose digits start at p (0 when none); p is left on
+// the first character after them.
+unsigned int readDecimal(std::string const& s, size_t& p) {
+    unsigned int value = 0;
+    while (p < s.length() && isDigit(s[p])) {
+        value = value * 10 + static_cast<unsigned int>(s[p] - '0');
+        ++p;
+    }
+    return value;
+}
+
 void makeKVDNodeOf(SmBiosMI& mi, TableData& entry, unsigned int parentId, unsigned int index,
                    unsigned int& ix) {
     SD::SmBios::Table const* t = entry.table;
@@ -61,21 +72,13 @@ bool SmBiosMI::parseKVDString(std::string const& s, KVDVersion& version) {
     }
     version.text = s.substr(p);
     SMBIOS_DETAIL(logger, "Found KVD version string: " << version.text);
-    version.major = 0;
-    while (p < length && isDigit(s[p])) {
-        version.major = version.major * 10 + static_cast<unsigned int>(s[p] - '0');
-        ++p;
-    }
+    version.major = readDecimal(s, p);
     if (p >= length || s[p] != '.') {
         SMBIOS_DETAIL(logger, "KVD string version number is not x.y form: " << s);
         return false;
     }
     ++p;
-    version.minor = 0;
-    while (p < length && isDigit(s[p])) {
-        version.minor = version.minor * 10 + static_cast<unsigned int>(s[p] - '0');
-        ++p;
-    }
+    version.minor = readDecimal(s, p);
     if (p >= length || s[p] != ' ') {
         SMBIOS_DETAIL(logger, "KVD string version number missing blank termination: " << s);
         return false;

@@ -127,6 +127,15 @@ void logGroupAssociations(SmBiosMI& mi, TableLists groups, unsigned int handle) 
     }
 }
 
+// A text the planar shares with its chassis, set on both when there is one.
+void setOnPlanarAndChassis(MutableNode* node, Node* parent, unsigned int id,
+                           std::string const& text) {
+    if (!text.empty()) {
+        node->setProperty(id, PropertyValue(text, true));
+        parent->setProperty(id, PropertyValue(text, true));
+    }
+}
+
 void makeBaseboardPlanarNode(SmBiosMI& mi, TableLists tables, TableData& entry, Node* parent,
                              unsigned int parentNodeId, StructureGroups& owned) {
     SD::SmBios::Table const* t = entry.table;
@@ -141,18 +150,12 @@ void makeBaseboardPlanarNode(SmBiosMI& mi, TableLists tables, TableData& entry, 
     mi.propString(t, MANUFACTURER, 36, node);
     mi.propString(t, PRODUCT, 39, node);
     std::string const product = mi.getString(t, PRODUCT);
-    if (!product.empty()) {
-        node->setProperty(172, PropertyValue(product, true));
-        parent->setProperty(172, PropertyValue(product, true));
-    }
+    setOnPlanarAndChassis(node, parent, 172, product);
     mi.propString(t, SERIAL, 50, node);
     mi.propString(t, ASSET_TAG, 2, node);
     mi.propEnumValue(t, FEATURE_FLAGS, 44, node);
     std::string const location = mi.getString(t, LOCATION);
-    if (!location.empty()) {
-        node->setProperty(31, PropertyValue(location, true));
-        parent->setProperty(31, PropertyValue(location, true));
-    }
+    setOnPlanarAndChassis(node, parent, 31, location);
     // Read whatever the log thresholds: a chassis handle cut off by a short
     // structure ends the planar here at every level alike.
     unsigned int const chassisHandle = mi.getNumber16(t, CHASSIS_HANDLE);

@@ -26,34 +26,14 @@ bool readInputFile(std::string const& path, std::vector<std::uint8_t>& bytes, st
         return false;
     }
     std::vector<std::uint8_t> content;
-    std::uint8_t buffer[65536];
-    bool tooLarge = false;
     int readErrno = 0;
-    for (;;) {
-        ssize_t const count = ::read(fd, buffer, sizeof buffer);
-        if (count < 0) {
-            if (errno == EINTR) {
-                continue;
-            }
-            readErrno = errno;
-            break;
-        }
-        if (count == 0) {
-            break;
-        }
-        size_t const size = static_cast<size_t>(count);
-        if (size > MAX_INPUT_FILE_SIZE - content.size()) {
-            tooLarge = true;
-            break;
-        }
-        content.insert(content.end(), buffer, buffer + size);
-    }
+    SD::ReadEnd const end = SD::readToEnd(fd, MAX_INPUT_FILE_SIZE, content, readErrno);
     ::close(fd);
-    if (readErrno != 0) {
+    if (end == SD::ReadEnd::Failed) {
         error = std::string("cannot read: ") + std::strerror(readErrno);
         return false;
     }
-    if (tooLarge) {
+    if (end == SD::ReadEnd::TooLarge) {
         error = "larger than " + std::to_string(MAX_INPUT_FILE_SIZE / (1024 * 1024)) +
                 " MiB, too large for an SMBIOS table";
         return false;

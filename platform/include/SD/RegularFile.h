@@ -10,34 +10,31 @@
 #include <unistd.h>
 
 #include <cerrno>
+#include <cstddef>
 #include <cstring>
 #include <string>
+#include <vector>
 
 namespace SD {
 
 // What kind of file a mode says, as a message names it: "a FIFO",
 // "a directory", ... ; "" for a regular file.
 inline char const* fileKind(mode_t mode) {
-    if (S_ISREG(mode)) {
-        return "";
-    }
-    if (S_ISDIR(mode)) {
-        return "a directory";
-    }
-    if (S_ISFIFO(mode)) {
-        return "a FIFO";
-    }
-    if (S_ISSOCK(mode)) {
-        return "a socket";
-    }
-    if (S_ISCHR(mode)) {
-        return "a character device";
-    }
-    if (S_ISBLK(mode)) {
-        return "a block device";
-    }
-    if (S_ISLNK(mode)) {
-        return "a symbolic link";
+    struct Kind {
+        mode_t type;
+        char const* name;
+    };
+    static Kind const kinds[] = {{S_IFREG, ""},
+                                 {S_IFDIR, "a directory"},
+                                 {S_IFIFO, "a FIFO"},
+                                 {S_IFSOCK, "a socket"},
+                                 {S_IFCHR, "a character device"},
+                                 {S_IFBLK, "a block device"},
+                                 {S_IFLNK, "a symbolic link"}};
+    for (Kind const& kind : kinds) {
+        if ((mode & S_IFMT) == kind.type) {
+            return kind.name;
+        }
     }
     return "not a regular file";
 }
@@ -87,6 +84,35 @@ inline int openRegularFile(char const* path, std::string& why,
         ::fcntl(fd, F_SETFL, flags & ~O_NONBLOCK);
     }
     return fd;
+}
+
+// How a read of a file to its end came out.
+enum class ReadEnd { Whole, TooLarge, Failed };
+
+// Reads fd to its end into bytes, at most limit bytes (a read interrupted by
+// a signal is taken again). TooLarge as soon as the file holds more than
+// limit bytes; Failed with the read's errno in error.
+inline ReadEnd readToEnd(int fd, std::size_t limit, std::vector<unsigned char>& bytes, int& error) {
+    bytes.clear();
+    std::vector<unsigned char> chunk(64 * 1024);
+    for (;;) {
+        ssize_t const count = ::read(fd, chunk.data(), chunk.size());
+        if (count < 0) {
+            if (errno == EINTR) {
+                continue;
+            }
+            error = errno;
+            return ReadEnd::Failed;
+        }
+        if (count == 0) {
+            return ReadEnd::Whole;
+        }
+        std::size_t const size = static_cast<std::size_t>(count);
+        if (size > limit - bytes.size()) {
+            return ReadEnd::TooLarge;
+        }
+        bytes.insert(bytes.end(), chunk.begin(), chunk.begin() + static_cast<std::ptrdiff_t>(size));
+    }
 }
 
 }  // namespace SD
