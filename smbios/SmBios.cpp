@@ -262,31 +262,38 @@ bool _sort_criterion_handle(SmBios::Table const& a, SmBios::Table const& b) {
     return a.getHandle() < b.getHandle();
 }
 
-std::ostream& operator<<(std::ostream& out, std::vector<SmBios::Byte> const& bytes) {
-    SMBIOS_DETAIL(loggerSmBios, "<< entry vector<SmBios::Byte>");
-    for (SmBios::Byte b : bytes) {
-        out << "<" << static_cast<unsigned int>(b) << ">";
+namespace {
+
+// Each item as "<item>", between the entry and return lines that name the
+// list's type.
+template <typename Item, typename Show>
+std::ostream& writeList(std::ostream& out, std::vector<Item> const& items, char const* type,
+                        Show show) {
+    SMBIOS_DETAIL(loggerSmBios, "<< entry vector<SmBios::" << type << ">");
+    for (Item const& item : items) {
+        out << "<";
+        show(item);
+        out << ">";
     }
-    SMBIOS_DETAIL(loggerSmBios, "<< return vector<SmBios::Byte> =");
+    SMBIOS_DETAIL(loggerSmBios, "<< return vector<SmBios::" << type << "> =");
     return out;
+}
+
+}  // namespace
+
+std::ostream& operator<<(std::ostream& out, std::vector<SmBios::Byte> const& bytes) {
+    return writeList(out, bytes, "Byte",
+                     [&](SmBios::Byte b) { out << static_cast<unsigned int>(b); });
 }
 
 std::ostream& operator<<(std::ostream& out, std::vector<SmBios::Word> const& words) {
-    SMBIOS_DETAIL(loggerSmBios, "<< entry vector<SmBios::Word>");
-    for (SmBios::Word w : words) {
-        out << "<" << static_cast<unsigned int>(w) << ">";
-    }
-    SMBIOS_DETAIL(loggerSmBios, "<< return vector<SmBios::Word> =");
-    return out;
+    return writeList(out, words, "Word",
+                     [&](SmBios::Word w) { out << static_cast<unsigned int>(w); });
 }
 
 std::ostream& operator<<(std::ostream& out, std::vector<SmBios::String> const& strings) {
-    SMBIOS_DETAIL(loggerSmBios, "<< entry vector<SmBios::String>");
-    for (SmBios::String s : strings) {
-        out << "<" << (s != nullptr ? s : "") << ">";
-    }
-    SMBIOS_DETAIL(loggerSmBios, "<< return vector<SmBios::String> =");
-    return out;
+    return writeList(out, strings, "String",
+                     [&](SmBios::String s) { out << (s != nullptr ? s : ""); });
 }
 
 }  // namespace SD
