@@ -20,6 +20,7 @@
 #include <string>
 #include <vector>
 
+#include "AtomicFile.h"
 #include "DumpFormat.h"
 #include "IC/Node.h"
 #include "MachineReport.h"
@@ -31,6 +32,7 @@
 #include "inventory/Inventory.h"
 #include "inventory/PluginHost.h"
 #include "inventory/PrivateDataDir.h"
+#include "inventory/Prometheus.h"
 
 namespace {
 
@@ -170,6 +172,17 @@ CLI::Validator logFileValidator() {
         "");
 }
 
+// --output: replaced only when it is a regular file or a symbolic link (the
+// link itself is replaced), or made when nothing is there.
+CLI::Validator outputFileValidator() {
+    return CLI::Validator(
+        [](std::string& path) {
+            std::string why;
+            return smbiostool::mayReplace(path, why) ? std::string() : why;
+        },
+        "");
+}
+
 // A validator that adds nothing to the value's name in the help text; the
 // option's own type name says it all.
 CLI::Validator quiet(CLI::Validator validator) {
@@ -185,6 +198,7 @@ struct Options {
     std::string codeDir;
     std::string pluginPath;
     std::string format = "tree";
+    std::string outputFile;
     std::string logFile;
     std::string logLevel;
     std::string traceLevel;
@@ -221,9 +235,16 @@ void addOptions(CLI::App& app, Options& options) {
                    std::string("The plug-in to load (default: ") + kPluginName +
                        " beside this program, else in ../lib from it)")
         ->type_name("PATH");
-    app.add_option("--format", options.format, "Output format: tree (default) or json")
-        ->type_name("tree|json")
-        ->check(quiet(CLI::IsMember({"tree", "json"})));
+    app.add_option("--format", options.format,
+                   "Output format: tree (default), json, or prometheus (the text exposition "
+                   "format, for node_exporter's textfile collector)")
+        ->type_name("tree|json|prometheus")
+        ->check(quiet(CLI::IsMember({"tree", "json", "prometheus"})));
+    app.add_option("--output", options.outputFile,
+                   "Write the inventory to this file instead of standard output, all or nothing "
+                   "(a temporary file in the same folder, renamed into place)")
+        ->type_name("FILE")
+        ->check(outputFileValidator());
     app.add_option("--log", options.logFile,
                    "Append log messages to this file instead of standard error")
         ->type_name("FILE")
@@ -425,6 +446,39 @@ int checkMachineAnswer(inventory::PluginHost const& host) {
     return smbiostool::EXIT_FAILED;
 }
 
+std::string renderInventory(std::string const& format, std::vector<IC::Node*> const& nodes) {
+    if (format == "json") {
+        return inventory::renderJson(nodes);
+    }
+    if (format == "prometheus") {
+        return inventory::renderPrometheus(nodes);
+    }
+    return inventory::renderTree(nodes);
+}
+
+// The inventory in the asked format, on standard output or, with --output,
+// all or nothing into the file, so that a collector reading it never sees a
+// part of it.
+int writeInventory(Options const& options, std::vector<IC::Node*> const& nodes) {
+    std::string const text = renderInventory(options.format, nodes);
+    if (!options.outputFile.empty()) {
+        std::string why;
+        if (smbiostool::writeFileAtomically(options.outputFile, text, true, why) !=
+            smbiostool::WriteResult::WRITTEN) {
+            complain("--output: " + why);
+            return smbiostool::EXIT_FAILED;
+        }
+        return 0;
+    }
+    std::cout << text;
+    std::cout.flush();
+    if (!std::cout) {
+        complain("cannot write the inventory to standard output");
+        return smbiostool::EXIT_FAILED;
+    }
+    return 0;
+}
+
 int run(int argc, char** argv) {
     CLI::App app{
         "Loads a management-interface plug-in the way the inventory agent does and prints "
@@ -458,14 +512,7 @@ int run(int argc, char** argv) {
         (!onDump && (status = checkMachineAnswer(host)) != 0)) {
         return status;
     }
-    std::cout << (options.format == "json" ? inventory::renderJson(nodes)
-                                           : inventory::renderTree(nodes));
-    std::cout.flush();
-    if (!std::cout) {
-        complain("cannot write the inventory to standard output");
-        return smbiostool::EXIT_FAILED;
-    }
-    return 0;
+    return writeInventory(options, nodes);
 }
 
 }  // namespace
