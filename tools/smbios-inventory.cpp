@@ -1,6 +1,7 @@
 // smbios-inventory: loads a management-interface plug-in the way the
 // inventory agent does (the library, OpenMI, initialize, getMap) and prints
-// the inventory tree that it builds, as a tree for people or as JSON.
+// the inventory tree that it builds: as a tree for people, as JSON or as a
+// one-screen summary.
 //
 // Exit status: 0 after printing, 1 when the plug-in cannot be loaded or
 // fails, 2 for a wrong command line or a dump file that is not usable, and
@@ -31,6 +32,7 @@
 #include "inventory/Inventory.h"
 #include "inventory/PluginHost.h"
 #include "inventory/PrivateDataDir.h"
+#include "inventory/Summary.h"
 
 namespace {
 
@@ -221,9 +223,11 @@ void addOptions(CLI::App& app, Options& options) {
                    std::string("The plug-in to load (default: ") + kPluginName +
                        " beside this program, else in ../lib from it)")
         ->type_name("PATH");
-    app.add_option("--format", options.format, "Output format: tree (default) or json")
-        ->type_name("tree|json")
-        ->check(quiet(CLI::IsMember({"tree", "json"})));
+    app.add_option("--format", options.format,
+                   "Output format: tree (default), json or summary (one screen of the main "
+                   "facts)")
+        ->type_name("tree|json|summary")
+        ->check(quiet(CLI::IsMember({"tree", "json", "summary"})));
     app.add_option("--log", options.logFile,
                    "Append log messages to this file instead of standard error")
         ->type_name("FILE")
@@ -425,6 +429,17 @@ int checkMachineAnswer(inventory::PluginHost const& host) {
     return smbiostool::EXIT_FAILED;
 }
 
+// The inventory in the format asked for.
+std::string render(std::string const& format, std::vector<IC::Node*> const& nodes) {
+    if (format == "json") {
+        return inventory::renderJson(nodes);
+    }
+    if (format == "summary") {
+        return inventory::renderSummary(nodes);
+    }
+    return inventory::renderTree(nodes);
+}
+
 int run(int argc, char** argv) {
     CLI::App app{
         "Loads a management-interface plug-in the way the inventory agent does and prints "
@@ -458,8 +473,7 @@ int run(int argc, char** argv) {
         (!onDump && (status = checkMachineAnswer(host)) != 0)) {
         return status;
     }
-    std::cout << (options.format == "json" ? inventory::renderJson(nodes)
-                                           : inventory::renderTree(nodes));
+    std::cout << render(options.format, nodes);
     std::cout.flush();
     if (!std::cout) {
         complain("cannot write the inventory to standard output");
