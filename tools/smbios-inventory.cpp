@@ -1,7 +1,7 @@
 // smbios-inventory: loads a management-interface plug-in the way the
 // inventory agent does (the library, OpenMI, initialize, getMap) and prints
-// the inventory tree that it builds: as a tree for people, as JSON or as a
-// one-screen summary.
+// the inventory tree that it builds: as a tree for people, as JSON, as a
+// one-screen summary or as one self-contained HTML page.
 //
 // Exit status: 0 after printing, 1 when the plug-in cannot be loaded or
 // fails, 2 for a wrong command line or a dump file that is not usable, and
@@ -29,6 +29,7 @@
 #include "SD/RegularFile.h"
 #include "ToolSupport.h"
 #include "inventory/DumpCheck.h"
+#include "inventory/HtmlPage.h"
 #include "inventory/Inventory.h"
 #include "inventory/PluginHost.h"
 #include "inventory/PrivateDataDir.h"
@@ -224,10 +225,10 @@ void addOptions(CLI::App& app, Options& options) {
                        " beside this program, else in ../lib from it)")
         ->type_name("PATH");
     app.add_option("--format", options.format,
-                   "Output format: tree (default), json or summary (one screen of the main "
-                   "facts)")
-        ->type_name("tree|json|summary")
-        ->check(quiet(CLI::IsMember({"tree", "json", "summary"})));
+                   "Output format: tree (default), json, summary (one screen of the main "
+                   "facts) or html (one self-contained page)")
+        ->type_name("tree|json|summary|html")
+        ->check(quiet(CLI::IsMember({"tree", "json", "summary", "html"})));
     app.add_option("--log", options.logFile,
                    "Append log messages to this file instead of standard error")
         ->type_name("FILE")
@@ -436,6 +437,9 @@ std::string render(std::string const& format, std::vector<IC::Node*> const& node
     }
     if (format == "summary") {
         return inventory::renderSummary(nodes);
+    }
+    if (format == "html") {
+        return inventory::renderHtml(nodes);
     }
     return inventory::renderTree(nodes);
 }
