@@ -7,6 +7,8 @@
 #   make              build (build/)
 #   make demo         build the host program, the plug-in and libpmem only, and
 #                     run the host on the example dump
+#   make screenshot   the example's inventory as one HTML page (build/inventory.html)
+#                     and a picture of it in headless Chromium (build/inventory.png)
 #   make test         build and run every test for this machine's architecture
 #   make check        the tests again under ASan+UBSan (clang), as a 32-bit x86 build, and
 #                     the plug-in's thread tests under ThreadSanitizer (clang)
@@ -30,7 +32,7 @@ TSAN_BUILD := build-tsan
 FUZZ_BUILD := build-fuzz
 EXAMPLE := examples/demo-server.smbios.txt
 
-.PHONY: all build demo test check check-asan check-m32 check-tsan install fuzz bench format clean
+.PHONY: all build demo screenshot test check check-asan check-m32 check-tsan install fuzz bench format clean
 
 all: build
 
@@ -46,10 +48,32 @@ build: packages-build $(BUILD)/CMakeCache.txt
 
 # What the demo runs, and nothing else: no test or benchmark is compiled.
 DEMO_TARGETS := smbios-inventory smbiosmi pmem
+DEMO_OPTIONS := --sensors processor --sensors disk --bmc
 
 demo: packages-build $(BUILD)/CMakeCache.txt
 	$(CMAKE) --build $(BUILD) -j $(JOBS) --target $(DEMO_TARGETS)
-	$(BUILD)/out/smbios-inventory --dump $(EXAMPLE) --sensors processor --sensors disk --bmc
+	$(BUILD)/out/smbios-inventory --dump $(EXAMPLE) $(DEMO_OPTIONS)
+
+# The demo's page as a browser shows it: headless Chromium with a fresh
+# profile that is removed afterwards, no network, killed after two minutes.
+# Chromium's own chatter goes to build/screenshot.log, shown when it fails.
+CHROMIUM_FLAGS := --headless --no-sandbox --disable-gpu --disable-quic --no-first-run \
+  --disable-background-networking --disable-component-update --disable-sync
+
+screenshot: packages-build packages-browser $(BUILD)/CMakeCache.txt
+	$(CMAKE) --build $(BUILD) -j $(JOBS) --target $(DEMO_TARGETS)
+	$(BUILD)/out/smbios-inventory --dump $(EXAMPLE) $(DEMO_OPTIONS) --format html \
+	  >$(BUILD)/inventory.html
+	@rm -f $(BUILD)/inventory.png; \
+	profile=$$(mktemp -d) || exit 1; \
+	timeout -k 5 120 chromium $(CHROMIUM_FLAGS) --user-data-dir="$$profile" \
+	  --window-size=1280,2000 --screenshot="$(CURDIR)/$(BUILD)/inventory.png" \
+	  "file://$(CURDIR)/$(BUILD)/inventory.html" >$(BUILD)/screenshot.log 2>&1; \
+	status=$$?; rm -rf "$$profile"; \
+	if [ $$status -ne 0 ] || [ ! -s $(BUILD)/inventory.png ]; then \
+	  cat $(BUILD)/screenshot.log >&2; echo "chromium failed (status $$status)" >&2; exit 1; \
+	fi; \
+	echo "wrote $(BUILD)/inventory.html and $(BUILD)/inventory.png"
 
 test: build
 	$(CTEST) --test-dir $(BUILD) --output-on-failure -j $(JOBS)

@@ -1,6 +1,7 @@
 // smbios-inventory: loads a management-interface plug-in the way the
 // inventory agent does (the library, OpenMI, initialize, getMap) and prints
-// the inventory tree that it builds, as a tree for people or as JSON.
+// the inventory tree that it builds: as a tree for people, as JSON, as a
+// one-screen summary or as one self-contained HTML page.
 //
 // Exit status: 0 after printing, 1 when the plug-in cannot be loaded or
 // fails, 2 for a wrong command line or a dump file that is not usable, and
@@ -29,10 +30,12 @@
 #include "SD/RegularFile.h"
 #include "ToolSupport.h"
 #include "inventory/DumpCheck.h"
+#include "inventory/HtmlPage.h"
 #include "inventory/Inventory.h"
 #include "inventory/PluginHost.h"
 #include "inventory/PrivateDataDir.h"
 #include "inventory/Prometheus.h"
+#include "inventory/Summary.h"
 
 namespace {
 
@@ -236,10 +239,11 @@ void addOptions(CLI::App& app, Options& options) {
                        " beside this program, else in ../lib from it)")
         ->type_name("PATH");
     app.add_option("--format", options.format,
-                   "Output format: tree (default), json, or prometheus (the text exposition "
+                   "Output format: tree (default), json, summary (one screen of the main "
+                   "facts), html (one self-contained page) or prometheus (the text exposition "
                    "format, for node_exporter's textfile collector)")
-        ->type_name("tree|json|prometheus")
-        ->check(quiet(CLI::IsMember({"tree", "json", "prometheus"})));
+        ->type_name("tree|json|summary|html|prometheus")
+        ->check(quiet(CLI::IsMember({"tree", "json", "summary", "html", "prometheus"})));
     app.add_option("--output", options.outputFile,
                    "Write the inventory to this file instead of standard output, all or nothing "
                    "(a temporary file in the same folder, renamed into place)")
@@ -446,9 +450,16 @@ int checkMachineAnswer(inventory::PluginHost const& host) {
     return smbiostool::EXIT_FAILED;
 }
 
+// The inventory in the format asked for.
 std::string renderInventory(std::string const& format, std::vector<IC::Node*> const& nodes) {
     if (format == "json") {
         return inventory::renderJson(nodes);
+    }
+    if (format == "summary") {
+        return inventory::renderSummary(nodes);
+    }
+    if (format == "html") {
+        return inventory::renderHtml(nodes);
     }
     if (format == "prometheus") {
         return inventory::renderPrometheus(nodes);

@@ -15,18 +15,7 @@ namespace {
 
 using Json = nlohmann::ordered_json;
 
-// What the host shows of one node; type, path and parent are known only for
-// the framework's ordinary nodes.
-struct NodeFacts {
-    unsigned int id = 0;
-    unsigned int linked = 0;
-    unsigned int type = 0;
-    unsigned int index = 0;
-    unsigned int status = 0;
-    std::string description;
-    std::string path;
-    std::string parent;
-};
+}  // namespace
 
 NodeFacts readFacts(IC::Node const& node) {
     NodeFacts facts;
@@ -42,6 +31,8 @@ NodeFacts readFacts(IC::Node const& node) {
     }
     return facts;
 }
+
+namespace {
 
 char const kHexDigits[] = "0123456789ABCDEF";
 
@@ -434,17 +425,6 @@ std::string renderJson(std::vector<IC::Node*> const& nodes) {
     return document.dump(2) + "\n";
 }
 
-namespace {
-
-// The nodes of a tree printout and how they hang together: each node's
-// children in list order, and whether it starts a tree of its own (its
-// linked id names no node of the list).
-struct TreeShape {
-    std::vector<IC::Node const*> list;
-    std::vector<std::vector<size_t>> children;
-    std::vector<bool> topLevel;
-};
-
 TreeShape treeShape(std::vector<IC::Node*> const& nodes) {
     TreeShape shape;
     for (IC::Node const* node : nodes) {
@@ -469,6 +449,8 @@ TreeShape treeShape(std::vector<IC::Node*> const& nodes) {
     }
     return shape;
 }
+
+namespace {
 
 // One node's line and its property lines beneath it, indented by depth.
 void printNode(IC::Node const& node, size_t depth, std::string& out) {

@@ -4,6 +4,7 @@
 // nodes compute values when they are read.
 #pragma once
 
+#include <cstddef>
 #include <cstdint>
 #include <string>
 #include <vector>
@@ -12,6 +13,35 @@
 #include "IC/PropertyValue.h"
 
 namespace inventory {
+
+// What the host shows of one node; type, path and parent are known only for
+// the framework's ordinary nodes.
+struct NodeFacts {
+    unsigned int id = 0;
+    unsigned int linked = 0;
+    unsigned int type = 0;
+    unsigned int index = 0;
+    unsigned int status = 0;
+    std::string description;
+    std::string path;
+    std::string parent;
+};
+
+// The facts of a node, read through its own operations.
+NodeFacts readFacts(IC::Node const& node);
+
+// The nodes of a tree printout and how they hang together: each node's
+// children in list order, and whether it starts a tree of its own (its
+// linked id names no node of the list).
+struct TreeShape {
+    std::vector<IC::Node const*> list;
+    std::vector<std::vector<std::size_t>> children;
+    std::vector<bool> topLevel;
+};
+
+// The shape of the node list (null entries left out); a node hangs under
+// the first node of the list whose id is its linked id.
+TreeShape treeShape(std::vector<IC::Node*> const& nodes);
 
 // Treats every byte of the text as a Latin-1 character and returns the text
 // as UTF-8 (bytes below 0x80 stay as they are).
