@@ -273,6 +273,28 @@ TEST(InventoryDiff, SiblingsThatTieAreNumberedInListOrder) {
                                            ": 21 -> 99\n" + "- " + planar() + "/Memory Array #3\n");
 }
 
+TEST(InventoryDiff, MemoryDevicesPairByDeviceLocatorAndByBankWhereThoseTie) {
+    // A new bank locator of a device whose device locator is its own: the
+    // same device, with a changed locator property.
+    Json after = server();
+    nodeWithId(after, 13)["description"] = "DIMM_B1:NODE 1";
+    nodeWithId(after, 13)["properties"]["68"] = text("DIMM_B1:NODE 1");
+    EXPECT_EQ(diffText(server(), after), "~ " + planar() + "/DIMM_B1:NODE 1: " + nameOf(19, 68) +
+                                             ": \"DIMM_B1:BANK 1\" -> \"DIMM_B1:NODE 1\"\n");
+
+    // Two devices in socket DIMM_A1 of two banks: the bank tells them
+    // apart, also when only one of them is left.
+    Json before = server();
+    before["nodes"].push_back(node(30, 5, 19, "DIMM_A1:BANK 1", {{"68", text("DIMM_A1:BANK 1")}}));
+    Json emptied = before;
+    removeNode(emptied, 12);  // DIMM_A1:BANK 0
+    nodeWithId(emptied, 30)["status"] = 14;
+    EXPECT_EQ(diffText(before, emptied), "- " + planar() + "/DIMM_A1:BANK 0\n" + "~ " + planar() +
+                                             "/DIMM_A1:BANK 1: Status: 1 -> 14\n");
+    EXPECT_EQ(diffText(emptied, before), "+ " + planar() + "/DIMM_A1:BANK 0\n" + "~ " + planar() +
+                                             "/DIMM_A1:BANK 1: Status: 14 -> 1\n");
+}
+
 TEST(InventoryDiff, RawStructuresPairByTypeAndHandle) {
     Json after = server();
     nodeWithId(after, 15)["properties"]["181"] = number(3);
@@ -310,6 +332,22 @@ TEST(InventoryDiff, NodesLinkedInACycleAreStillCompared) {
     Json after = before;
     nodeWithId(after, 61)["status"] = 14;
     EXPECT_EQ(diffText(before, after), "~ System Slot \"LOOP\"/LOOPED: Status: 1 -> 14\n");
+}
+
+TEST(InventoryDiff, AVeryDeepTreeIsWalkedWithoutRecursion) {
+    // 50,000 nodes each under the one before: the walk, the paths and
+    // their end neither recurse nor hold a path for every node.
+    unsigned int const depth = 50000;
+    Json before = Json({{"nodes", Json::array()}});
+    for (unsigned int id = 1; id <= depth; ++id) {
+        before["nodes"].push_back(node(id, id - 1, 62, "S"));
+    }
+    Json after = before;
+    nodeWithId(after, depth)["status"] = 16;
+    std::vector<inventory::Difference> const found = differences(before, after);
+    ASSERT_EQ(found.size(), 1u);
+    EXPECT_EQ(found[0].path.size(), 2 * depth - 1);
+    EXPECT_EQ(found[0].path.substr(0, 6), "S/S/S/");
 }
 
 TEST(InventoryDiff, NamesAndMeaningsTheDocumentAddsAreNotCompared) {

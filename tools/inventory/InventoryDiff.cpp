@@ -5,7 +5,6 @@
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
-#include <iterator>
 #include <unordered_map>
 #include <utility>
 
@@ -18,42 +17,58 @@ namespace {
 
 // ---- How components are paired ----------------------------------------------
 
-// A property that tells apart siblings of one node type, and how a path
-// shows it: after its label, quoted when it is text, in hexadecimal when
-// hex is set.
+// How a key property's value names a component.
+enum class KeyText {
+    WHOLE,         // the value
+    HEX,           // the value; a path shows the number in hexadecimal
+    BEFORE_COLON,  // the text before the first ':' (a device locator of "device:bank")
+};
+
+// A property that tells apart siblings of one node type. A path shows it
+// after its label ("" for none) unless the label is nullptr.
 struct KeyField {
     unsigned int property;  // 0: none
+    KeyText text;
     char const* label;
-    bool hex;
 };
 
 // What names a component of one node type besides the chain above it. By
-// default a node is named by its type and description; a rule adds up to
-// two properties, and replaces the description by `name` where the
-// description is no name (a processor's "CPU 1" counts the enabled
-// processors, so it shifts when one is disabled). Siblings that still tie
-// are numbered in list order (#2, #3, ...).
+// default a node is named by its type and description. A rule adds up to
+// two properties; it may leave the description out where it is no name (a
+// processor's "CPU 1" counts the enabled processors, so it shifts when one
+// is disabled) and give the path a name in its place. The tie-breaker is
+// added only among siblings that the rest leaves tied in either inventory.
+// Siblings that still tie are numbered in list order (#2, #3, ...).
 struct PairingRule {
     unsigned int nodeType;
-    char const* name;  // nullptr: the description names the component
+    bool byDescription;  // the description is part of the key
+    char const* name;    // shown in paths in place of the description; nullptr: the description
     KeyField fields[2];
+    KeyField tieBreaker;
 };
+
+constexpr KeyField kNoField = {0, KeyText::WHOLE, nullptr};
 
 constexpr PairingRule kPairingRules[] = {
     // processor: by socket designation
-    {4, "CPU", {{53, "", false}, {0, "", false}}},
+    {4, false, "CPU", {{53, KeyText::WHOLE, ""}, kNoField}, kNoField},
     // processor cache: by its own socket designation ("L1 Cache")
-    {31, nullptr, {{53, "", false}, {0, "", false}}},
-    // memory device: by its locators ("device:bank")
-    {19, nullptr, {{68, "", false}, {0, "", false}}},
+    {31, true, nullptr, {{53, KeyText::WHOLE, ""}, kNoField}, kNoField},
+    // memory device: by device locator, and by bank locator too where the
+    // device locators tie (its description is "device:bank")
+    {19,
+     false,
+     nullptr,
+     {{68, KeyText::BEFORE_COLON, nullptr}, kNoField},
+     {68, KeyText::WHOLE, nullptr}},
     // system slot: by designation
-    {62, nullptr, {{108, "", false}, {0, "", false}}},
+    {62, true, nullptr, {{108, KeyText::WHOLE, ""}, kNoField}, kNoField},
     // port connector: by internal reference designator
-    {70, nullptr, {{108, "", false}, {0, "", false}}},
-    // firmware: by name
-    {3, nullptr, {{108, "", false}, {0, "", false}}},
+    {70, true, nullptr, {{108, KeyText::WHOLE, ""}, kNoField}, kNoField},
+    // firmware: by name (its description too)
+    {3, true, nullptr, {{108, KeyText::WHOLE, nullptr}, kNoField}, kNoField},
     // raw SMBIOS structure: by structure type and handle
-    {55, nullptr, {{177, "type", false}, {178, "handle", true}}},
+    {55, true, nullptr, {{177, KeyText::WHOLE, "type"}, {178, KeyText::HEX, "handle"}}, kNoField},
 };
 
 // The framework's own nodes above the components (management interface,
@@ -340,25 +355,19 @@ bool readNode(DiffJson const& node, InventoryNode& out, std::string& why) {
 
 // ---- Shape and keys ----------------------------------------------------------
 
-// An inventory's nodes as a tree, with each node's key (what pairs it with
-// a node of the other inventory) and the path people read.
-struct KeyedTree {
-    // children[i]: the nodes under node i in list order; children[size]:
-    // the nodes at the top.
-    std::vector<std::vector<size_t>> children;
-    std::vector<std::string> key;
-    std::vector<std::string> path;
-    std::unordered_map<std::string, size_t> byKey;
-};
-
-// The value of a property as a key holds it ("" when the node lacks it).
-std::string keyValue(InventoryNode const& node, unsigned int property) {
-    auto const found = node.properties.find(property);
+// The value of a key property as the key holds it ("" when the node lacks
+// it).
+std::string keyValue(InventoryNode const& node, KeyField const& field) {
+    auto const found = node.properties.find(field.property);
     if (found == node.properties.end()) {
         return "";
     }
     DiffJson const& value = found->second["value"];
-    return value.is_string() ? value.get<std::string>() : value.dump();
+    if (!value.is_string()) {
+        return value.dump();
+    }
+    std::string text = value.get<std::string>();
+    return field.text == KeyText::BEFORE_COLON ? text.substr(0, text.find(':')) : text;
 }
 
 // How a key property appears in a path: `label "text"`, `label 0x002F`.
@@ -371,8 +380,8 @@ std::string showKeyField(InventoryNode const& node, KeyField const& field) {
     std::string shown;
     std::uint64_t number = 0;
     if (value.is_string()) {
-        shown = showText(value.get<std::string>(), true);
-    } else if (field.hex && asUnsigned(value, number)) {
+        shown = showText(keyValue(node, field), true);
+    } else if (field.text == KeyText::HEX && asUnsigned(value, number)) {
         char buffer[32];
         std::snprintf(buffer, sizeof buffer, "0x%04llX", static_cast<unsigned long long>(number));
         shown = buffer;
@@ -390,43 +399,47 @@ void addKeyPart(std::string& key, std::string const& part) {
     key += part;
 }
 
-// A node's segment of the key (without its number among equal siblings)
-// and of the path.
-std::pair<std::string, std::string> segment(InventoryNode const& node) {
-    PairingRule const* const rule = pairingRule(node.type);
+// What names a node among its siblings, without the tie-breaker and the
+// number among equals, and how its path shows it.
+struct Segment {
     std::string key;
-    addKeyPart(key, std::to_string(node.type));
     std::string shown;
+};
+
+Segment segmentOf(InventoryNode const& node) {
+    PairingRule const* const rule = pairingRule(node.type);
+    Segment segment;
+    addKeyPart(segment.key, std::to_string(node.type));
+    if (rule == nullptr || rule->byDescription) {
+        addKeyPart(segment.key, node.description);
+    }
     if (rule != nullptr && rule->name != nullptr) {
-        addKeyPart(key, rule->name);
-        shown = rule->name;
+        segment.shown = rule->name;
     } else {
-        addKeyPart(key, node.description);
-        shown =
+        segment.shown =
             node.description.empty() ? nodeTypeLabel(node.type) : showText(node.description, false);
     }
     if (rule == nullptr) {
-        return {key, shown};
+        return segment;
     }
     for (KeyField const& field : rule->fields) {
         if (field.property == 0) {
             continue;
         }
-        std::string const value = keyValue(node, field.property);
-        addKeyPart(key, value);
-        // A property that repeats the description (a memory device's
-        // locators, a firmware's name) adds nothing to the path.
-        bool const repeats = rule->name == nullptr && value == node.description;
-        if (!value.empty() && !repeats) {
-            shown += " " + showKeyField(node, field);
+        std::string const value = keyValue(node, field);
+        addKeyPart(segment.key, value);
+        if (field.label != nullptr && !value.empty()) {
+            segment.shown += " " + showKeyField(node, field);
         }
     }
-    return {key, shown};
+    return segment;
 }
 
 // The tree of the nodes by linked id: a node hangs under the first node of
 // the list with its linked id; nodes whose linked id names none are at the
 // top, and so are nodes whose linked ids only lead round in a cycle.
+// children[i] are the nodes under node i in list order, children[size] the
+// nodes at the top.
 std::vector<std::vector<size_t>> treeOf(std::vector<InventoryNode> const& nodes) {
     size_t const top = nodes.size();
     std::unordered_map<unsigned int, size_t> byId;
@@ -472,36 +485,58 @@ std::vector<std::vector<size_t>> treeOf(std::vector<InventoryNode> const& nodes)
     return children;
 }
 
-KeyedTree keyedTree(std::vector<InventoryNode> const& nodes) {
-    KeyedTree tree;
-    tree.children = treeOf(nodes);
-    tree.key.resize(nodes.size());
-    tree.path.resize(nodes.size());
-    size_t const top = nodes.size();
-    // The path prefix that a node gives its children: frame nodes give
-    // their own prefix on.
-    std::vector<std::string> prefix(nodes.size() + 1);
-    std::vector<size_t> pending{top};
-    while (!pending.empty()) {
-        size_t const at = pending.back();
-        pending.pop_back();
-        std::string const parentKey = at == top ? std::string() : tree.key[at];
-        std::unordered_map<std::string, unsigned int> seen;
-        for (size_t child : tree.children[at]) {
-            auto [key, shown] = segment(nodes[child]);
-            unsigned int const number = ++seen[key];
-            addKeyPart(key, std::to_string(number));
-            if (number > 1) {
-                shown += " #" + std::to_string(number);
-            }
-            tree.key[child] = parentKey + key;
-            tree.path[child] = prefix[at].empty() ? shown : prefix[at] + "/" + shown;
-            prefix[child] = isFrame(nodes[child].type) ? prefix[at] : tree.path[child];
-            tree.byKey.emplace(tree.key[child], child);
-            pending.push_back(child);
+// One inventory: its nodes and their tree.
+struct Side {
+    std::vector<InventoryNode> const& nodes;
+    std::vector<std::vector<size_t>> children;
+};
+
+// The children of one node, each with its key among them and its segment
+// of the path.
+struct KeyedChildren {
+    std::vector<size_t> nodes;
+    std::vector<std::string> keys;
+    std::vector<std::string> shown;
+};
+
+// Keys the children of one node of each inventory. The base keys that tie
+// among the children of either side take the tie-breaker on both sides, so
+// that a component is named alike in both; what still ties is numbered.
+std::pair<KeyedChildren, KeyedChildren> keyChildren(Side const& old, size_t oldParent,
+                                                    Side const& now, size_t newParent) {
+    std::pair<KeyedChildren, KeyedChildren> keyed;
+    std::unordered_map<std::string, unsigned int> counts[2];
+    std::vector<Segment> segments[2];
+    Side const* const sides[2] = {&old, &now};
+    KeyedChildren* const out[2] = {&keyed.first, &keyed.second};
+    size_t const parents[2] = {oldParent, newParent};
+    for (int side = 0; side < 2; ++side) {
+        out[side]->nodes = sides[side]->children[parents[side]];
+        for (size_t child : out[side]->nodes) {
+            segments[side].push_back(segmentOf(sides[side]->nodes[child]));
+            ++counts[side][segments[side].back().key];
         }
     }
-    return tree;
+    for (int side = 0; side < 2; ++side) {
+        std::unordered_map<std::string, unsigned int> seen;
+        for (size_t i = 0; i < out[side]->nodes.size(); ++i) {
+            InventoryNode const& node = sides[side]->nodes[out[side]->nodes[i]];
+            Segment segment = segments[side][i];
+            PairingRule const* const rule = pairingRule(node.type);
+            if (rule != nullptr && rule->tieBreaker.property != 0 &&
+                (counts[0][segment.key] > 1 || counts[1][segment.key] > 1)) {
+                addKeyPart(segment.key, keyValue(node, rule->tieBreaker));
+            }
+            unsigned int const number = ++seen[segment.key];
+            addKeyPart(segment.key, std::to_string(number));
+            if (number > 1) {
+                segment.shown += " #" + std::to_string(number);
+            }
+            out[side]->keys.push_back(std::move(segment.key));
+            out[side]->shown.push_back(std::move(segment.shown));
+        }
+    }
+    return keyed;
 }
 
 // ---- Comparison --------------------------------------------------------------
@@ -548,9 +583,11 @@ std::string showField(DiffJson const& value) {
     return value.is_string() ? showText(value.get<std::string>(), true) : value.dump();
 }
 
-// The changes of one component present in both inventories.
-void compareNode(InventoryNode const& before, InventoryNode const& after, std::string const& path,
+// The changes of one component present in both inventories, without their
+// path.
+void compareNode(InventoryNode const& before, InventoryNode const& after,
                  std::vector<Difference>& out) {
+    std::string const path;
     for (NodeField const& field : kNodeFields) {
         DiffJson const old = field.read(before);
         DiffJson const now = field.read(after);
@@ -582,48 +619,92 @@ void compareNode(InventoryNode const& before, InventoryNode const& after, std::s
     }
 }
 
+constexpr size_t kNone = static_cast<size_t>(-1);
+
+// A component's place as a path shows it: its segment and the place its
+// path continues from (kNone at the top; a frame node's children continue
+// from the frame node's own place, since paths leave frame nodes out).
+// Places are kept in one list and name the one above by its position, so
+// that a deep tree holds no long text for every node.
+struct Place {
+    size_t up;
+    std::string shown;
+};
+
+std::string pathOf(std::vector<Place> const& places, size_t place) {
+    std::vector<std::string const*> segments;
+    for (size_t at = place; at != kNone; at = places[at].up) {
+        segments.push_back(&places[at].shown);
+    }
+    std::string path;
+    for (auto segment = segments.rbegin(); segment != segments.rend(); ++segment) {
+        path += (path.empty() ? "" : "/") + **segment;
+    }
+    return path;
+}
+
 // One step of the walk over both trees: a pair to compare (both set), or
 // one component to report as removed (only `before`) or added (only
-// `after`). npos stands for "none"; the top of both trees is the pair
-// (size, size).
+// `after`); kNone stands for "none", and the top of both trees is the pair
+// (size, size). `place` is the component's own place, `prefix` where its
+// children's paths continue from.
 struct Step {
     size_t before;
     size_t after;
+    size_t place;
+    size_t prefix;
 };
-constexpr size_t kNone = static_cast<size_t>(-1);
 
 // The children of a pair in the order they are reported: the new
 // inventory's children in its order, each removed child right after the
 // child it followed in the old inventory.
-std::vector<Step> childSteps(KeyedTree const& old, KeyedTree const& now, Step pair) {
-    std::vector<size_t> const& oldChildren = old.children[pair.before];
-    std::vector<size_t> const& newChildren = now.children[pair.after];
-    // Removed children by the paired old child they follow (kNone: first).
+std::vector<Step> childSteps(Side const& old, Side const& now, Step const& pair,
+                             std::vector<Place>& places) {
+    std::pair<KeyedChildren, KeyedChildren> const keyed =
+        keyChildren(old, pair.before, now, pair.after);
+    KeyedChildren const& oldKeyed = keyed.first;
+    KeyedChildren const& newKeyed = keyed.second;
+    std::unordered_map<std::string, size_t> oldByKey;
+    for (size_t i = 0; i < oldKeyed.nodes.size(); ++i) {
+        oldByKey.emplace(oldKeyed.keys[i], i);
+    }
+    std::unordered_map<std::string, size_t> newByKey;
+    for (size_t i = 0; i < newKeyed.nodes.size(); ++i) {
+        newByKey.emplace(newKeyed.keys[i], i);
+    }
+    auto const childStep = [&](size_t before, size_t after, std::string const& shown) {
+        places.push_back(Place{pair.prefix, shown});
+        size_t const place = places.size() - 1;
+        unsigned int const type = after != kNone ? now.nodes[after].type : old.nodes[before].type;
+        return Step{before, after, place, isFrame(type) ? pair.prefix : place};
+    };
+    // Removed children by the position of the paired old child they
+    // follow (kNone: before the first).
     std::multimap<size_t, size_t> removedAfter;
     size_t lastPaired = kNone;
-    for (size_t child : oldChildren) {
-        if (now.byKey.count(old.key[child]) == 0) {
-            removedAfter.emplace(lastPaired, child);
+    for (size_t i = 0; i < oldKeyed.nodes.size(); ++i) {
+        if (newByKey.count(oldKeyed.keys[i]) == 0) {
+            removedAfter.emplace(lastPaired, i);
         } else {
-            lastPaired = child;
+            lastPaired = i;
         }
     }
     std::vector<Step> steps;
     auto const addRemoved = [&](size_t after) {
         auto const range = removedAfter.equal_range(after);
         for (auto it = range.first; it != range.second; ++it) {
-            steps.push_back({it->second, kNone});
+            steps.push_back(
+                childStep(oldKeyed.nodes[it->second], kNone, oldKeyed.shown[it->second]));
         }
     };
     addRemoved(kNone);
-    for (size_t child : newChildren) {
-        auto const partner = old.byKey.find(now.key[child]);
-        if (partner == old.byKey.end()) {
-            steps.push_back({kNone, child});
-            continue;
+    for (size_t i = 0; i < newKeyed.nodes.size(); ++i) {
+        auto const partner = oldByKey.find(newKeyed.keys[i]);
+        size_t const before = partner != oldByKey.end() ? oldKeyed.nodes[partner->second] : kNone;
+        steps.push_back(childStep(before, newKeyed.nodes[i], newKeyed.shown[i]));
+        if (partner != oldByKey.end()) {
+            addRemoved(partner->second);
         }
-        steps.push_back({partner->second, child});
-        addRemoved(partner->second);
     }
     return steps;
 }
@@ -652,26 +733,34 @@ bool parseInventory(DiffJson const& document, std::vector<InventoryNode>& nodes,
 
 std::vector<Difference> compareInventories(std::vector<InventoryNode> const& before,
                                            std::vector<InventoryNode> const& after) {
-    KeyedTree const old = keyedTree(before);
-    KeyedTree const now = keyedTree(after);
+    Side const old{before, treeOf(before)};
+    Side const now{after, treeOf(after)};
     std::vector<Difference> out;
-    std::vector<Step> pending{{before.size(), after.size()}};
+    std::vector<Place> places;
+    std::vector<Step> pending{{before.size(), after.size(), kNone, kNone}};
     while (!pending.empty()) {
         Step const step = pending.back();
         pending.pop_back();
         if (step.after == kNone) {
             out.push_back(
-                component(Difference::REMOVED, old.path[step.before], before[step.before]));
+                component(Difference::REMOVED, pathOf(places, step.place), before[step.before]));
             continue;
         }
         if (step.before == kNone) {
-            out.push_back(component(Difference::ADDED, now.path[step.after], after[step.after]));
+            out.push_back(
+                component(Difference::ADDED, pathOf(places, step.place), after[step.after]));
             continue;
         }
         if (step.after < after.size()) {
-            compareNode(before[step.before], after[step.after], now.path[step.after], out);
+            size_t const first = out.size();
+            compareNode(before[step.before], after[step.after], out);
+            std::string const path =
+                out.size() > first ? pathOf(places, step.place) : std::string();
+            for (size_t i = first; i < out.size(); ++i) {
+                out[i].path = path;
+            }
         }
-        std::vector<Step> const children = childSteps(old, now, step);
+        std::vector<Step> const children = childSteps(old, now, step, places);
         pending.insert(pending.end(), children.rbegin(), children.rend());
     }
     return out;
