@@ -1,11 +1,15 @@
 // smbios-inventory: loads a management-interface plug-in the way the
 // inventory agent does (the library, OpenMI, initialize, getMap) and prints
 // the inventory tree that it builds: as a tree for people, as JSON, as a
-// one-screen summary or as one self-contained HTML page.
+// one-screen summary, as one self-contained HTML page or in the Prometheus
+// text exposition format. `smbios-inventory diff OLD NEW` compares two
+// inventories.
 //
 // Exit status: 0 after printing, 1 when the plug-in cannot be loaded or
 // fails, 2 for a wrong command line or a dump file that is not usable, and
 // 128 + the signal's number when SIGINT, SIGTERM or SIGHUP ends the run.
+// diff, like diff(1): 0 when the inventories are equal, 1 when they differ,
+// 2 on an error.
 
 #include <stdlib.h>
 #include <sys/stat.h>
@@ -29,9 +33,11 @@
 #include "SD/PlatformUtilities.h"
 #include "SD/RegularFile.h"
 #include "ToolSupport.h"
+#include "inventory/DiffInput.h"
 #include "inventory/DumpCheck.h"
 #include "inventory/HtmlPage.h"
 #include "inventory/Inventory.h"
+#include "inventory/InventoryDiff.h"
 #include "inventory/PluginHost.h"
 #include "inventory/PrivateDataDir.h"
 #include "inventory/Prometheus.h"
@@ -209,6 +215,18 @@ struct Options {
     bool bmc = false;
 };
 
+// The command line of diff; --plugin and --code-dir go to Options.
+struct DiffOptions {
+    std::string oldFile;
+    std::string newFile;
+    std::string format = "text";
+};
+
+// The exit statuses of diff, as diff(1) has them.
+constexpr int kDiffEqual = 0;
+constexpr int kDiffDiffer = 1;
+constexpr int kDiffTrouble = 2;
+
 // The table's sources: the machine (through the data directory), --dump or
 // --from-bin, one at a time.
 void addSourceOptions(CLI::App& app, Options& options) {
@@ -271,6 +289,71 @@ void addOptions(CLI::App& app, Options& options) {
     app.add_flag("--bmc", options.bmc, "Also make the BMC nodes");
     app.set_version_flag("--version", std::string(kProgram) + " " + PROJECT_VERSION,
                          "Print the version and exit");
+}
+
+// smbios-inventory diff [--format text|json] [--plugin PATH] [--code-dir DIR] OLD NEW
+CLI::App* addDiffCommand(CLI::App& app, DiffOptions& diff, Options& options) {
+    CLI::App* command = app.add_subcommand(
+        "diff", "Compares two inventories (JSON, override dump or --dump-bin files)");
+    command->footer(
+        "Each FILE is a JSON inventory (--format json), an override dump file or a dmidecode "
+        "--dump-bin file. One line per added (+) or removed (-) component and per changed "
+        "property (~). Exit status: 0 when the inventories are equal, 1 when they differ, 2 on "
+        "an error.");
+    command->add_option("OLD", diff.oldFile, "The inventory compared against")
+        ->type_name("FILE")
+        ->required();
+    command->add_option("NEW", diff.newFile, "The inventory compared")
+        ->type_name("FILE")
+        ->required();
+    command->add_option("--format", diff.format, "Output format: text (default) or json")
+        ->type_name("text|json")
+        ->check(quiet(CLI::IsMember({"text", "json"})));
+    command->add_option("--plugin", options.pluginPath, "The plug-in that reads the dump files")
+        ->type_name("PATH");
+    command
+        ->add_option("--code-dir", options.codeDir,
+                     "Code directory of the agent (KESTREL_CODE_DIR) for the dump files")
+        ->type_name("DIR");
+    return command;
+}
+
+// The options before "diff" belong to the inventory run; diff takes its own
+// after it. Returns 0, or the exit status after saying which one is wrong.
+int checkNoRunOptions(CLI::App const& app) {
+    for (CLI::Option const* option : app.get_options()) {
+        if (option->count() > 0) {
+            return smbiostool::usage(kProgram, option->get_name() +
+                                                   " is not an option of diff (diff takes "
+                                                   "--format, --plugin and --code-dir after "
+                                                   "\"diff\")");
+        }
+    }
+    return 0;
+}
+
+// diff: reads both inventories (a dump through a child run of this
+// program), compares them and prints the differences.
+int runDiff(DiffOptions const& diff, Options const& options) {
+    inventory::ChildOptions const child{options.pluginPath, options.codeDir};
+    std::vector<inventory::InventoryNode> before;
+    std::vector<inventory::InventoryNode> after;
+    std::string why;
+    if (!inventory::readInventoryFile(diff.oldFile, child, before, why) ||
+        !inventory::readInventoryFile(diff.newFile, child, after, why)) {
+        complain("diff: " + why);
+        return kDiffTrouble;
+    }
+    std::vector<inventory::Difference> const differences =
+        inventory::compareInventories(before, after);
+    std::cout << (diff.format == "json" ? inventory::renderDiffJson(differences)
+                                        : inventory::renderDiffText(differences));
+    std::cout.flush();
+    if (!std::cout) {
+        complain("diff: cannot write the differences to standard output");
+        return kDiffTrouble;
+    }
+    return differences.empty() ? kDiffEqual : kDiffDiffer;
 }
 
 // The logger's thresholds and file, as the options ask. Quiet unless asked:
@@ -497,9 +580,16 @@ int run(int argc, char** argv) {
         kProgram};
     Options options;
     addOptions(app, options);
+    DiffOptions diff;
+    CLI::App const* const diffCommand = addDiffCommand(app, diff, options);
     int status = 0;
-    if (!smbiostool::parseCommandLine(app, argc, argv, kProgram, status) ||
-        (status = applyLogOptions(options)) != 0) {
+    if (!smbiostool::parseCommandLine(app, argc, argv, kProgram, status)) {
+        return status;
+    }
+    if (diffCommand->parsed()) {
+        return (status = checkNoRunOptions(app)) != 0 ? status : runDiff(diff, options);
+    }
+    if ((status = applyLogOptions(options)) != 0) {
         return status;
     }
     // Read the dump before anything is created, so that an unreadable file
