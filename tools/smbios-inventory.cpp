@@ -425,6 +425,24 @@ int checkMachineAnswer(inventory::PluginHost const& host) {
     return smbiostool::EXIT_FAILED;
 }
 
+// Writes the inventory to standard output as it is rendered. Returns 0, or
+// 1 after saying why.
+int printInventory(Options const& options, std::vector<IC::Node*> const& nodes) {
+    inventory::TextSink const toStdout = [](char const* data, size_t size) {
+        std::fwrite(data, 1, size, stdout);
+    };
+    if (options.format == "json") {
+        inventory::writeJson(nodes, toStdout);
+    } else {
+        inventory::writeTree(nodes, toStdout);
+    }
+    if (std::fflush(stdout) != 0 || std::ferror(stdout) != 0) {
+        complain("cannot write the inventory to standard output");
+        return smbiostool::EXIT_FAILED;
+    }
+    return 0;
+}
+
 int run(int argc, char** argv) {
     CLI::App app{
         "Loads a management-interface plug-in the way the inventory agent does and prints "
@@ -458,14 +476,7 @@ int run(int argc, char** argv) {
         (!onDump && (status = checkMachineAnswer(host)) != 0)) {
         return status;
     }
-    std::cout << (options.format == "json" ? inventory::renderJson(nodes)
-                                           : inventory::renderTree(nodes));
-    std::cout.flush();
-    if (!std::cout) {
-        complain("cannot write the inventory to standard output");
-        return smbiostool::EXIT_FAILED;
-    }
-    return 0;
+    return printInventory(options, nodes);
 }
 
 }  // namespace

@@ -179,7 +179,7 @@ TEST_F(HostTest, JsonGivesEveryPropertyKindItsExactValue) {
     EXPECT_EQ(property(kKindsNode, kByteProperty),
               Json::parse(R"({"kind": "byte", "value": 171})"));
     EXPECT_EQ(property(kKindsNode, kBytesProperty),
-              Json::parse(R"({"kind": "bytes", "value": "001FABFF"})"));
+              Json::parse(R"({"kind": "bytes", "value": "001FABFF", "name": "Family"})"));
     EXPECT_EQ(property(kKindsNode, kNumbersProperty), Json::parse(R"({"kind": "numbers", "value": [
                   {"kind": "unsigned", "value": 1},
                   {"kind": "bool", "value": true},
@@ -309,7 +309,7 @@ TEST_F(HostTest, TreeShowsEveryPropertyKindBeneathItsNode) {
         "      11 enum16  60000\n"
         "      12 enum32  70000\n"
         "      13 byte  171\n"
-        "      20 bytes  00 1F AB FF\n"
+        "      20 Family  00 1F AB FF\n"
         "      30 numbers  {1, true, 2.5, 1.2, (none)}\n"
         "      100 strings  {\"alpha\", \"Caf\xC3\xA9\", \"\"}\n"
         "      101 kind  7\n";
