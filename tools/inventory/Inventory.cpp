@@ -20,59 +20,96 @@ namespace {
 
 // ---- Output -----------------------------------------------------------------
 
-// The text being rendered. With a sink it is handed on whenever a node or
-// property leaves it past kChunk bytes, so that the whole text is never
-// held; without one it collects everything.
+// The text being rendered, written straight into one buffer. With a sink
+// the buffer is handed on whenever a node or a property leaves it past
+// kChunk bytes, so that the whole text is never held; without one it
+// collects everything.
 class Output {
 public:
     explicit Output(TextSink const* sink) : sink_(sink) {
-        if (sink_ != nullptr) {
-            text_.reserve(kChunk + kChunk / 4);
-        }
+        buffer_.resize(sink_ != nullptr ? kChunk + kChunk / 4 : 256);
     }
     Output(Output const&) = delete;
     Output& operator=(Output const&) = delete;
 
-    std::string& text() { return text_; }
+    void put(char c) {
+        *room(1) = c;
+        ++size_;
+    }
+    void put(char const* data, std::size_t size) {
+        std::memcpy(room(size), data, size);
+        size_ += size;
+    }
+    void put(std::string const& chars) { put(chars.data(), chars.size()); }
+    // A string literal, its length known where it is written.
+    template <std::size_t N>
+    void literal(char const (&chars)[N]) {
+        put(chars, N - 1);
+    }
+    // A C string of unknown length.
+    void text(char const* chars) { put(chars, std::strlen(chars)); }
+    void spaces(std::size_t count) {
+        std::memset(room(count), ' ', count);
+        size_ += count;
+    }
+    // A line end and the next line's indentation.
+    void newline(std::size_t indent) {
+        char* const at = room(indent + 1);
+        *at = '\n';
+        std::memset(at + 1, ' ', indent);
+        size_ += indent + 1;
+    }
+    template <typename Integer>
+    void integer(Integer value) {
+        char* const at = room(kIntegerRoom);
+        size_ += static_cast<std::size_t>(std::to_chars(at, at + kIntegerRoom, value).ptr - at);
+    }
+    void hexByte(unsigned char byte) {
+        static char const kHexDigits[] = "0123456789ABCDEF";
+        char* const at = room(2);
+        at[0] = kHexDigits[byte >> 4];
+        at[1] = kHexDigits[byte & 0x0F];
+        size_ += 2;
+    }
 
     // Hands the text on once there is enough of it.
     void pass() {
-        if (sink_ != nullptr && text_.size() >= kChunk) {
+        if (sink_ != nullptr && size_ >= kChunk) {
             flush();
         }
     }
 
     void flush() {
-        if (sink_ != nullptr && !text_.empty()) {
-            (*sink_)(text_.data(), text_.size());
-            text_.clear();
+        if (sink_ != nullptr && size_ != 0) {
+            (*sink_)(buffer_.data(), size_);
+            size_ = 0;
         }
+    }
+
+    // Everything written, when there is no sink.
+    std::string take() {
+        buffer_.resize(size_);
+        size_ = 0;
+        return std::move(buffer_);
     }
 
 private:
     static constexpr std::size_t kChunk = 64 * 1024;
+    // The longest decimal integer of 64 bits with its sign.
+    static constexpr std::size_t kIntegerRoom = 20;
+
+    // Room for count more characters at the end of the text.
+    char* room(std::size_t count) {
+        if (buffer_.size() - size_ < count) {
+            buffer_.resize(std::max(2 * buffer_.size(), size_ + count));
+        }
+        return &buffer_[size_];
+    }
 
     TextSink const* sink_;
-    std::string text_;
+    std::string buffer_;
+    std::size_t size_ = 0;
 };
-
-void appendRaw(std::string& out, char const* text) { out.append(text, std::strlen(text)); }
-
-template <typename Integer>
-void appendInteger(std::string& out, Integer value) {
-    char buffer[24];
-    auto const result = std::to_chars(buffer, buffer + sizeof buffer, value);
-    out.append(buffer, result.ptr);
-}
-
-char const kHexDigits[] = "0123456789ABCDEF";
-
-void appendHexByte(std::string& out, unsigned char byte) {
-    out += kHexDigits[byte >> 4];
-    out += kHexDigits[byte & 0x0F];
-}
-
-void appendIndent(std::string& out, std::size_t width) { out.append(width, ' '); }
 
 // ---- Node facts ---------------------------------------------------------------
 
@@ -150,114 +187,119 @@ std::string formatDouble(double value) {
 // The text on one line: control characters as \xNN, a backslash (and a
 // double quote when the text goes between quotes) behind a backslash,
 // Latin-1 letters in UTF-8.
-void appendEscaped(std::string& out, std::string const& text, bool quoted) {
+void putEscaped(Output& out, std::string const& text, bool quoted) {
     for (char c : text) {
         auto const byte = static_cast<unsigned char>(c);
         if (byte == '\\' || (quoted && byte == '"')) {
-            out += '\\';
-            out += c;
+            out.put('\\');
+            out.put(c);
         } else if (byte < 0x20 || byte == 0x7F || (byte >= 0x80 && byte < 0xA0)) {
-            out += "\\x";
-            appendHexByte(out, byte);
+            out.literal("\\x");
+            out.hexByte(byte);
         } else if (byte >= 0xA0) {
-            out += static_cast<char>(0xC0 | (byte >> 6));
-            out += static_cast<char>(0x80 | (byte & 0x3F));
+            out.put(static_cast<char>(0xC0 | (byte >> 6)));
+            out.put(static_cast<char>(0x80 | (byte & 0x3F)));
         } else {
-            out += c;
+            out.put(c);
         }
     }
 }
 
-// escapeText's text with quoted set, appended.
-void appendQuoted(std::string& out, std::string const& text) {
-    out += '"';
-    appendEscaped(out, text, true);
-    out += '"';
+// escapeText's text with quoted set.
+void putQuoted(Output& out, std::string const& text) {
+    out.put('"');
+    putEscaped(out, text, true);
+    out.put('"');
 }
 
-void appendNumber(std::string& out, IC::Number const& number) {
+void putNumber(Output& out, IC::Number const& number) {
     switch (number.getKind()) {
         case IC::Number::BOOL:
-            appendRaw(out, number.getBool() ? "true" : "false");
+            if (number.getBool()) {
+                out.literal("true");
+            } else {
+                out.literal("false");
+            }
             return;
         case IC::Number::UNSIGNED:
-            appendInteger(out, number.getUnsigned());
+            out.integer(number.getUnsigned());
             return;
         case IC::Number::DOUBLE:
-            out += formatDouble(number.getDouble());
+            out.put(formatDouble(number.getDouble()));
             return;
         case IC::Number::VERSION:
-            appendInteger(out, number.getVersion().getMajor());
-            out += '.';
-            appendInteger(out, number.getVersion().getMinor());
+            out.integer(number.getVersion().getMajor());
+            out.put('.');
+            out.integer(number.getVersion().getMinor());
             return;
         case IC::Number::DATETIME:
-            out += formatDateTime(number.getDateTime());
+            out.put(formatDateTime(number.getDateTime()));
             return;
         case IC::Number::NONE:
             break;
     }
-    appendRaw(out, "(none)");
+    out.literal("(none)");
 }
 
-void appendValue(std::string& out, IC::PropertyValue const& value) {
+// The value as the tree shows it.
+void putValue(Output& out, IC::PropertyValue const& value) {
     switch (value.getKind()) {
         case IC::PropertyValue::STRING:
-            appendQuoted(out, value.getString());
+            putQuoted(out, value.getString());
             return;
         case IC::PropertyValue::NUMBER:
-            appendNumber(out, value.getNumber());
+            putNumber(out, value.getNumber());
             return;
         case IC::PropertyValue::ENUM:
-            appendInteger(out, value.getEnum().getValue());
+            out.integer(value.getEnum().getValue());
             return;
         case IC::PropertyValue::BYTE:
-            appendInteger(out, static_cast<unsigned int>(value.getByte()));
+            out.integer(static_cast<unsigned int>(value.getByte()));
             return;
         case IC::PropertyValue::BYTES: {
             bool first = true;
             for (unsigned char byte : value.getBytes()) {
                 if (!first) {
-                    out += ' ';
+                    out.put(' ');
                 }
                 first = false;
-                appendHexByte(out, byte);
+                out.hexByte(byte);
             }
             return;
         }
         case IC::PropertyValue::NUMBERS: {
-            out += '{';
+            out.put('{');
             bool first = true;
             for (IC::Number const& number : value.getNumbers()) {
                 if (!first) {
-                    out += ", ";
+                    out.literal(", ");
                 }
                 first = false;
-                appendNumber(out, number);
+                putNumber(out, number);
             }
-            out += '}';
+            out.put('}');
             return;
         }
         case IC::PropertyValue::STRINGS: {
-            out += '{';
+            out.put('{');
             bool first = true;
             for (std::string const& text : value.getStrings()) {
                 if (!first) {
-                    out += ", ";
+                    out.literal(", ");
                 }
                 first = false;
-                appendQuoted(out, text);
+                putQuoted(out, text);
             }
-            out += '}';
+            out.put('}');
             return;
         }
         case IC::PropertyValue::KIND:
-            appendInteger(out, static_cast<unsigned int>(value.getKindValue()));
+            out.integer(static_cast<unsigned int>(value.getKindValue()));
             return;
         case IC::PropertyValue::NONE:
             break;
     }
-    appendRaw(out, "(none)");
+    out.literal("(none)");
 }
 
 char const* numberKindText(IC::Number const& number) {
@@ -332,74 +374,76 @@ bool wholeNumber(IC::PropertyValue const& value, std::int64_t& number) {
 
 // ---- JSON ---------------------------------------------------------------------
 // The layout is that of a JSON library's 2-space pretty printing, byte for
-// byte: the keys of an object each on a line of their own, "key": value,
-// empty objects and arrays as {} and [].
+// byte: every member of an object and every element of an array on a line
+// of its own, "key": value, empty objects and arrays as {} and []. The
+// document's depth is fixed, so is the indentation of each part.
+
+std::size_t const kNodeIndent = 4;          // a node's braces
+std::size_t const kNodeKeyIndent = 6;       // its keys
+std::size_t const kPropertyIndent = 8;      // a property's key and braces
+std::size_t const kPropertyKeyIndent = 10;  // "kind", "value", "name", ...
+std::size_t const kElementIndent = 12;      // elements of a value that is an array
+std::size_t const kElementKeyIndent = 14;   // keys of a number in such an array
 
 // A JSON string of UTF-8 text: the quote, the backslash and the control
 // characters escaped, everything else as it is.
-void appendJsonUtf8(std::string& out, char const* text, std::size_t size) {
-    out += '"';
+void putJsonUtf8(Output& out, char const* text, std::size_t size) {
+    static char const kLowerHex[] = "0123456789abcdef";
+    out.put('"');
     for (std::size_t i = 0; i < size; ++i) {
         auto const byte = static_cast<unsigned char>(text[i]);
         switch (byte) {
             case '"':
-                out += "\\\"";
+                out.literal("\\\"");
                 break;
             case '\\':
-                out += "\\\\";
+                out.literal("\\\\");
                 break;
             case '\b':
-                out += "\\b";
+                out.literal("\\b");
                 break;
             case '\f':
-                out += "\\f";
+                out.literal("\\f");
                 break;
             case '\n':
-                out += "\\n";
+                out.literal("\\n");
                 break;
             case '\r':
-                out += "\\r";
+                out.literal("\\r");
                 break;
             case '\t':
-                out += "\\t";
+                out.literal("\\t");
                 break;
             default:
                 if (byte < 0x20) {
-                    static char const kLowerHex[] = "0123456789abcdef";
-                    out += "\\u00";
-                    out += kLowerHex[byte >> 4];
-                    out += kLowerHex[byte & 0x0F];
+                    out.literal("\\u00");
+                    out.put(kLowerHex[byte >> 4]);
+                    out.put(kLowerHex[byte & 0x0F]);
                 } else {
-                    out += static_cast<char>(byte);
+                    out.put(static_cast<char>(byte));
                 }
                 break;
         }
     }
-    out += '"';
+    out.put('"');
 }
 
-void appendJsonUtf8(std::string& out, char const* text) {
-    appendJsonUtf8(out, text, std::strlen(text));
-}
+void putJsonUtf8(Output& out, char const* text) { putJsonUtf8(out, text, std::strlen(text)); }
 
 // A JSON string of Latin-1 text, turned into UTF-8 on the way.
-void appendJsonLatin1(std::string& out, std::string const& text) {
-    bool plain = true;
-    for (char c : text) {
+void putJsonLatin1(Output& out, std::string const& text) {
+    bool const plain = std::all_of(text.begin(), text.end(), [](char c) {
         auto const byte = static_cast<unsigned char>(c);
-        if (byte < 0x20 || byte >= 0x80 || byte == '"' || byte == '\\') {
-            plain = false;
-            break;
-        }
-    }
+        return byte >= 0x20 && byte < 0x80 && byte != '"' && byte != '\\';
+    });
     if (plain) {
-        out += '"';
-        out += text;
-        out += '"';
+        out.put('"');
+        out.put(text);
+        out.put('"');
         return;
     }
     std::string const utf8 = latin1ToUtf8(text);
-    appendJsonUtf8(out, utf8.data(), utf8.size());
+    putJsonUtf8(out, utf8.data(), utf8.size());
 }
 
 // A double as JSON: the shortest digits that read back as the value, in
@@ -407,17 +451,17 @@ void appendJsonLatin1(std::string& out, std::string const& text) {
 // within 15 digits of the start and no more than 4 zeros after the point,
 // else with an exponent of at least two digits ("1e+20", "1.5e-07");
 // anything not finite is null.
-void appendJsonDouble(std::string& out, double value) {
+void putJsonDouble(Output& out, double value) {
     if (!std::isfinite(value)) {
-        appendRaw(out, "null");
+        out.literal("null");
         return;
     }
     if (std::signbit(value)) {
-        out += '-';
+        out.put('-');
         value = -value;
     }
     if (value == 0.0) {
-        appendRaw(out, "0.0");
+        out.literal("0.0");
         return;
     }
     char scientific[40];
@@ -438,337 +482,367 @@ void appendJsonDouble(std::string& out, double value) {
     int const kMaxDigitsBeforePoint = 15;
     int const kMinPoint = -4;
     if (count <= point && point <= kMaxDigitsBeforePoint) {
-        out.append(digits, static_cast<std::size_t>(count));
-        out.append(static_cast<std::size_t>(point - count), '0');
-        appendRaw(out, ".0");
+        out.put(digits, static_cast<std::size_t>(count));
+        for (int zeros = point - count; zeros > 0; --zeros) {
+            out.put('0');
+        }
+        out.literal(".0");
     } else if (0 < point && point <= kMaxDigitsBeforePoint) {
-        out.append(digits, static_cast<std::size_t>(point));
-        out += '.';
-        out.append(digits + point, static_cast<std::size_t>(count - point));
+        out.put(digits, static_cast<std::size_t>(point));
+        out.put('.');
+        out.put(digits + point, static_cast<std::size_t>(count - point));
     } else if (kMinPoint < point && point <= 0) {
-        appendRaw(out, "0.");
-        out.append(static_cast<std::size_t>(-point), '0');
-        out.append(digits, static_cast<std::size_t>(count));
+        out.literal("0.");
+        for (int zeros = -point; zeros > 0; --zeros) {
+            out.put('0');
+        }
+        out.put(digits, static_cast<std::size_t>(count));
     } else {
-        out += digits[0];
+        out.put(digits[0]);
         if (count > 1) {
-            out += '.';
-            out.append(digits + 1, static_cast<std::size_t>(count - 1));
+            out.put('.');
+            out.put(digits + 1, static_cast<std::size_t>(count - 1));
         }
         int const shown = point - 1;
-        out += 'e';
-        out += shown < 0 ? '-' : '+';
+        out.put('e');
+        out.put(shown < 0 ? '-' : '+');
         unsigned int const magnitude = static_cast<unsigned int>(shown < 0 ? -shown : shown);
         if (magnitude < 10) {
-            out += '0';
+            out.put('0');
         }
-        appendInteger(out, magnitude);
+        out.integer(magnitude);
     }
 }
 
-// "key": at the given indentation.
-void appendJsonKey(std::string& out, std::size_t indent, char const* key) {
-    appendIndent(out, indent);
-    out += '"';
-    appendRaw(out, key);
-    appendRaw(out, "\": ");
-}
-
-// The value of a number as JSON; a version is an array of its two parts at
-// the given indentation.
-void appendJsonNumberValue(std::string& out, IC::Number const& number, std::size_t indent) {
+// The value of a number as JSON; a version is an array of its two parts,
+// whose brackets go at the given indentation.
+void putJsonNumberValue(Output& out, IC::Number const& number, std::size_t indent) {
     switch (number.getKind()) {
         case IC::Number::BOOL:
-            appendRaw(out, number.getBool() ? "true" : "false");
+            if (number.getBool()) {
+                out.literal("true");
+            } else {
+                out.literal("false");
+            }
             return;
         case IC::Number::UNSIGNED:
-            appendInteger(out, number.getUnsigned());
+            out.integer(number.getUnsigned());
             return;
         case IC::Number::DOUBLE:
-            appendJsonDouble(out, number.getDouble());
+            putJsonDouble(out, number.getDouble());
             return;
         case IC::Number::VERSION:
-            appendRaw(out, "[\n");
-            appendIndent(out, indent + 2);
-            appendInteger(out, number.getVersion().getMajor());
-            appendRaw(out, ",\n");
-            appendIndent(out, indent + 2);
-            appendInteger(out, number.getVersion().getMinor());
-            out += '\n';
-            appendIndent(out, indent);
-            out += ']';
+            out.put('[');
+            out.newline(indent + 2);
+            out.integer(number.getVersion().getMajor());
+            out.put(',');
+            out.newline(indent + 2);
+            out.integer(number.getVersion().getMinor());
+            out.newline(indent);
+            out.put(']');
             return;
         case IC::Number::DATETIME:
-            appendInteger(out, number.getDateTime());
+            out.integer(number.getDateTime());
             return;
         case IC::Number::NONE:
             break;
     }
-    appendRaw(out, "null");
+    out.literal("null");
 }
 
-// {"kind": ..., "value": ...} of a number at the given indentation (of its
-// braces).
-void appendJsonNumber(std::string& out, IC::Number const& number, std::size_t indent) {
-    appendRaw(out, "{\n");
-    appendJsonKey(out, indent + 2, "kind");
-    appendJsonUtf8(out, numberKindText(number));
-    appendRaw(out, ",\n");
-    appendJsonKey(out, indent + 2, "value");
-    appendJsonNumberValue(out, number, indent + 2);
-    out += '\n';
-    appendIndent(out, indent);
-    out += '}';
+// A number as an element of a value that is an array: {"kind", "value"}.
+void putJsonNumberElement(Output& out, IC::Number const& number) {
+    out.put('{');
+    out.newline(kElementKeyIndent);
+    out.literal("\"kind\": \"");
+    out.text(numberKindText(number));
+    out.literal("\",");
+    out.newline(kElementKeyIndent);
+    out.literal("\"value\": ");
+    putJsonNumberValue(out, number, kElementKeyIndent);
+    out.newline(kElementIndent);
+    out.put('}');
 }
 
-// The "value" of a property; indent is that of its key.
-void appendJsonValue(std::string& out, IC::PropertyValue const& value, std::size_t indent) {
+// A value that is an array: "[]", or each element on a line of its own.
+template <typename Element, typename PutElement>
+void putJsonArray(Output& out, std::vector<Element> const& elements, PutElement&& putElement) {
+    if (elements.empty()) {
+        out.literal("[]");
+        return;
+    }
+    out.put('[');
+    bool first = true;
+    for (Element const& element : elements) {
+        if (!first) {
+            out.put(',');
+        }
+        first = false;
+        out.newline(kElementIndent);
+        putElement(element);
+    }
+    out.newline(kPropertyKeyIndent);
+    out.put(']');
+}
+
+// The "value" of a property.
+void putJsonValue(Output& out, IC::PropertyValue const& value) {
     switch (value.getKind()) {
         case IC::PropertyValue::STRING:
-            appendJsonLatin1(out, value.getString());
+            putJsonLatin1(out, value.getString());
             return;
         case IC::PropertyValue::NUMBER:
-            appendJsonNumberValue(out, value.getNumber(), indent);
+            putJsonNumberValue(out, value.getNumber(), kPropertyKeyIndent);
             return;
         case IC::PropertyValue::ENUM:
-            appendInteger(out, value.getEnum().getValue());
+            out.integer(value.getEnum().getValue());
             return;
         case IC::PropertyValue::BYTE:
-            appendInteger(out, static_cast<unsigned int>(value.getByte()));
+            out.integer(static_cast<unsigned int>(value.getByte()));
             return;
         case IC::PropertyValue::BYTES:
-            out += '"';
+            out.put('"');
             for (unsigned char byte : value.getBytes()) {
-                appendHexByte(out, byte);
+                out.hexByte(byte);
             }
-            out += '"';
+            out.put('"');
             return;
-        case IC::PropertyValue::NUMBERS: {
-            std::vector<IC::Number> const& numbers = value.getNumbers();
-            if (numbers.empty()) {
-                appendRaw(out, "[]");
-                return;
-            }
-            appendRaw(out, "[\n");
-            bool first = true;
-            for (IC::Number const& number : numbers) {
-                if (!first) {
-                    appendRaw(out, ",\n");
-                }
-                first = false;
-                appendIndent(out, indent + 2);
-                appendJsonNumber(out, number, indent + 2);
-            }
-            out += '\n';
-            appendIndent(out, indent);
-            out += ']';
+        case IC::PropertyValue::NUMBERS:
+            putJsonArray(out, value.getNumbers(),
+                         [&out](IC::Number const& number) { putJsonNumberElement(out, number); });
             return;
-        }
-        case IC::PropertyValue::STRINGS: {
-            std::vector<std::string> const& strings = value.getStrings();
-            if (strings.empty()) {
-                appendRaw(out, "[]");
-                return;
-            }
-            appendRaw(out, "[\n");
-            bool first = true;
-            for (std::string const& text : strings) {
-                if (!first) {
-                    appendRaw(out, ",\n");
-                }
-                first = false;
-                appendIndent(out, indent + 2);
-                appendJsonLatin1(out, text);
-            }
-            out += '\n';
-            appendIndent(out, indent);
-            out += ']';
+        case IC::PropertyValue::STRINGS:
+            putJsonArray(out, value.getStrings(),
+                         [&out](std::string const& text) { putJsonLatin1(out, text); });
             return;
-        }
         case IC::PropertyValue::KIND:
-            appendInteger(out, static_cast<unsigned int>(value.getKindValue()));
+            out.integer(static_cast<unsigned int>(value.getKindValue()));
             return;
         case IC::PropertyValue::NONE:
             break;
     }
-    appendRaw(out, "null");
+    out.literal("null");
 }
 
-// Indentation of the parts of the document: a node's braces, its keys, its
-// properties' keys and their members.
-std::size_t const kNodeIndent = 4;
-std::size_t const kNodeKeyIndent = 6;
-std::size_t const kPropertyIndent = 8;
-std::size_t const kPropertyKeyIndent = 10;
+// "key": at a property's member indentation, after the line end of the
+// member before it.
+template <std::size_t N>
+void putJsonMemberKey(Output& out, char const (&key)[N]) {
+    out.put(',');
+    out.newline(kPropertyKeyIndent);
+    out.literal(key);
+}
 
-void appendJsonProperty(std::string& out, unsigned int type, unsigned int id,
-                        IC::PropertyValue const& value) {
-    appendIndent(out, kPropertyIndent);
-    out += '"';
-    appendInteger(out, id);
-    appendRaw(out, "\": {\n");
-    appendJsonKey(out, kPropertyKeyIndent, "kind");
-    appendJsonUtf8(out, valueKindText(value));
-    appendRaw(out, ",\n");
-    appendJsonKey(out, kPropertyKeyIndent, "value");
-    appendJsonValue(out, value, kPropertyKeyIndent);
+// One property: its id as the key, then kind, value, and the catalog's
+// name, unit and meaning where it has them.
+void putJsonProperty(Output& out, unsigned int type, unsigned int id,
+                     IC::PropertyValue const& value) {
+    out.put('"');
+    out.integer(id);
+    out.literal("\": {");
+    out.newline(kPropertyKeyIndent);
+    out.literal("\"kind\": \"");
+    out.text(valueKindText(value));
+    out.put('"');
+    putJsonMemberKey(out, "\"value\": ");
+    putJsonValue(out, value);
     PropertyLabel const label = labelProperty(type, id, value);
     if (*label.name != '\0') {
-        appendRaw(out, ",\n");
-        appendJsonKey(out, kPropertyKeyIndent, "name");
-        appendJsonUtf8(out, label.name);
+        putJsonMemberKey(out, "\"name\": ");
+        putJsonUtf8(out, label.name);
     }
     if (label.unit != nullptr) {
-        appendRaw(out, ",\n");
-        appendJsonKey(out, kPropertyKeyIndent, "unit");
-        appendJsonUtf8(out, label.unit);
+        putJsonMemberKey(out, "\"unit\": ");
+        putJsonUtf8(out, label.unit);
     }
     if (label.meaning != nullptr) {
-        appendRaw(out, ",\n");
-        appendJsonKey(out, kPropertyKeyIndent, "meaning");
-        appendJsonUtf8(out, label.meaning);
+        putJsonMemberKey(out, "\"meaning\": ");
+        putJsonUtf8(out, label.meaning);
     }
-    out += '\n';
-    appendIndent(out, kPropertyIndent);
-    out += '}';
+    out.newline(kPropertyIndent);
+    out.put('}');
 }
 
-void appendJsonNode(Output& output, IC::Node const& node) {
+// "key": at a node's member indentation, on a line of its own.
+template <std::size_t N>
+void putJsonNodeKey(Output& out, char const (&key)[N]) {
+    out.newline(kNodeKeyIndent);
+    out.literal(key);
+}
+
+void putJsonNode(Output& out, IC::Node const& node) {
     NodeFacts const facts = readFacts(node);
-    std::string& out = output.text();
-    appendIndent(out, kNodeIndent);
-    appendRaw(out, "{\n");
-    struct Field {
-        char const* key;
-        unsigned int value;
-    };
-    Field const fields[] = {{"id", facts.id},
-                            {"linked", facts.linked},
-                            {"type", facts.type},
-                            {"index", facts.index},
-                            {"status", facts.status}};
-    for (Field const& field : fields) {
-        appendJsonKey(out, kNodeKeyIndent, field.key);
-        appendInteger(out, field.value);
-        appendRaw(out, ",\n");
-    }
-    appendJsonKey(out, kNodeKeyIndent, "description");
-    appendJsonLatin1(out, facts.description);
-    appendRaw(out, ",\n");
+    out.put('{');
+    putJsonNodeKey(out, "\"id\": ");
+    out.integer(facts.id);
+    out.put(',');
+    putJsonNodeKey(out, "\"linked\": ");
+    out.integer(facts.linked);
+    out.put(',');
+    putJsonNodeKey(out, "\"type\": ");
+    out.integer(facts.type);
+    out.put(',');
+    putJsonNodeKey(out, "\"index\": ");
+    out.integer(facts.index);
+    out.put(',');
+    putJsonNodeKey(out, "\"status\": ");
+    out.integer(facts.status);
+    out.put(',');
+    putJsonNodeKey(out, "\"description\": ");
+    putJsonLatin1(out, facts.description);
+    out.put(',');
     if (!facts.path.empty()) {
-        appendJsonKey(out, kNodeKeyIndent, "path");
-        appendJsonLatin1(out, facts.path);
-        appendRaw(out, ",\n");
+        putJsonNodeKey(out, "\"path\": ");
+        putJsonLatin1(out, facts.path);
+        out.put(',');
     }
     if (!facts.parent.empty()) {
-        appendJsonKey(out, kNodeKeyIndent, "parent");
-        appendJsonLatin1(out, facts.parent);
-        appendRaw(out, ",\n");
+        putJsonNodeKey(out, "\"parent\": ");
+        putJsonLatin1(out, facts.parent);
+        out.put(',');
     }
-    appendJsonKey(out, kNodeKeyIndent, "properties");
+    putJsonNodeKey(out, "\"properties\": ");
     // The ids come in ascending numeric order.
     bool first = true;
     eachProperty(node, [&](unsigned int id, IC::PropertyValue const& value) {
-        std::string& text = output.text();
-        appendRaw(text, first ? "{\n" : ",\n");
+        out.put(first ? '{' : ',');
         first = false;
-        appendJsonProperty(text, facts.type, id, value);
-        output.pass();
+        out.newline(kPropertyIndent);
+        putJsonProperty(out, facts.type, id, value);
+        out.pass();
     });
-    std::string& tail = output.text();
     if (first) {
-        appendRaw(tail, "{}");
+        out.literal("{}");
     } else {
-        tail += '\n';
-        appendIndent(tail, kNodeKeyIndent);
-        tail += '}';
+        out.newline(kNodeKeyIndent);
+        out.put('}');
     }
-    tail += '\n';
-    appendIndent(tail, kNodeIndent);
-    tail += '}';
+    out.newline(kNodeIndent);
+    out.put('}');
 }
 
-void writeJsonTo(std::vector<IC::Node*> const& nodes, Output& output) {
-    appendRaw(output.text(), "{\n  \"nodes\": [");
+void writeJsonTo(std::vector<IC::Node*> const& nodes, Output& out) {
+    out.literal("{\n  \"nodes\": [");
     bool first = true;
     for (IC::Node const* node : nodes) {
         if (node == nullptr) {
             continue;
         }
-        appendRaw(output.text(), first ? "\n" : ",\n");
+        if (!first) {
+            out.put(',');
+        }
         first = false;
-        appendJsonNode(output, *node);
-        output.pass();
+        out.newline(kNodeIndent);
+        putJsonNode(out, *node);
+        out.pass();
     }
-    appendRaw(output.text(), first ? "]\n}\n" : "\n  ]\n}\n");
-    output.flush();
+    if (first) {
+        out.literal("]\n}\n");
+    } else {
+        out.literal("\n  ]\n}\n");
+    }
+    out.flush();
 }
 
 // ---- Tree ---------------------------------------------------------------------
 
-void appendNodeLine(std::string& out, NodeFacts const& facts, bool topLevel) {
-    appendEscaped(out, facts.description, false);
-    appendRaw(out, "  [type ");
-    appendInteger(out, facts.type);
-    std::string const name = nodeTypeName(facts.type);
-    if (!name.empty()) {
-        out += ' ';
-        out += name;
+// Node type names by type, ascending.
+struct TypeName {
+    unsigned int type;
+    char const* name;
+};
+TypeName const kNodeTypeNames[] = {
+    {1, "chassis"},
+    {3, "firmware"},
+    {4, "processor"},
+    {13, "BMC"},
+    {15, "management interface"},
+    {19, "memory device"},
+    {21, "voltage sensor"},
+    {22, "temperature sensor"},
+    {31, "processor cache"},
+    {32, "memory array"},
+    {35, "system event log"},
+    {40, "computer system"},
+    {41, "planar"},
+    {42, "processor core"},
+    {50, "disk controller"},
+    {53, "diagnostics firmware"},
+    {55, "raw SMBIOS table"},
+    {59, "root"},
+    {62, "system slot"},
+    {70, "port connector"},
+};
+
+// The name of a node type, or nullptr.
+char const* typeName(unsigned int type) {
+    auto const found = std::lower_bound(
+        std::begin(kNodeTypeNames), std::end(kNodeTypeNames), type,
+        [](TypeName const& entry, unsigned int wanted) { return entry.type < wanted; });
+    return found != std::end(kNodeTypeNames) && found->type == type ? found->name : nullptr;
+}
+
+void putNodeLine(Output& out, NodeFacts const& facts, bool topLevel) {
+    putEscaped(out, facts.description, false);
+    out.literal("  [type ");
+    out.integer(facts.type);
+    if (char const* const name = typeName(facts.type)) {
+        out.put(' ');
+        out.text(name);
     }
-    appendRaw(out, ", index ");
-    appendInteger(out, facts.index);
-    appendRaw(out, ", id ");
-    appendInteger(out, facts.id);
-    appendRaw(out, ", status ");
-    appendInteger(out, facts.status);
+    out.literal(", index ");
+    out.integer(facts.index);
+    out.literal(", id ");
+    out.integer(facts.id);
+    out.literal(", status ");
+    out.integer(facts.status);
     if (topLevel && facts.linked != 0) {
         // Linked to a node that is not in the list.
-        appendRaw(out, ", linked ");
-        appendInteger(out, facts.linked);
+        out.literal(", linked ");
+        out.integer(facts.linked);
     }
     if (!facts.path.empty()) {
-        appendRaw(out, ", path ");
-        appendQuoted(out, facts.path);
+        out.literal(", path ");
+        putQuoted(out, facts.path);
     }
     if (!facts.parent.empty()) {
-        appendRaw(out, ", parent ");
-        appendQuoted(out, facts.parent);
+        out.literal(", parent ");
+        putQuoted(out, facts.parent);
     }
-    appendRaw(out, "]\n");
+    out.literal("]\n");
 }
 
 // One property line: id, name, value, unit and meaning.
-void appendPropertyLine(std::string& out, std::size_t indent, unsigned int type, unsigned int id,
-                        IC::PropertyValue const& value) {
+void putPropertyLine(Output& out, std::size_t indent, unsigned int type, unsigned int id,
+                     IC::PropertyValue const& value) {
     PropertyLabel const label = labelProperty(type, id, value);
-    appendIndent(out, indent);
-    appendInteger(out, id);
-    out += ' ';
-    appendRaw(out, *label.name != '\0' ? label.name : valueKindText(value));
-    appendRaw(out, "  ");
-    appendValue(out, value);
+    out.spaces(indent);
+    out.integer(id);
+    out.put(' ');
+    out.text(*label.name != '\0' ? label.name : valueKindText(value));
+    out.literal("  ");
+    putValue(out, value);
     if (label.unit != nullptr) {
-        out += ' ';
-        appendRaw(out, label.unit);
+        out.put(' ');
+        out.text(label.unit);
     }
     if (label.meaning != nullptr) {
-        appendRaw(out, " (");
-        appendRaw(out, label.meaning);
-        out += ')';
+        out.literal(" (");
+        out.text(label.meaning);
+        out.put(')');
     }
-    out += '\n';
+    out.put('\n');
 }
 
 // One node's line and its property lines beneath it, indented by depth.
-void appendTreeNode(Output& output, IC::Node const& node, std::size_t depth) {
+void putTreeNode(Output& out, IC::Node const& node, std::size_t depth) {
     NodeFacts const facts = readFacts(node);
-    std::string& out = output.text();
-    appendIndent(out, 2 * depth);
-    appendNodeLine(out, facts, depth == 0);
+    out.spaces(2 * depth);
+    putNodeLine(out, facts, depth == 0);
     std::size_t const indent = 2 * depth + 2;
     eachProperty(node, [&](unsigned int id, IC::PropertyValue const& value) {
-        appendPropertyLine(output.text(), indent, facts.type, id, value);
-        output.pass();
+        putPropertyLine(out, indent, facts.type, id, value);
+        out.pass();
     });
 }
 
@@ -814,8 +888,8 @@ TreeShape treeShape(std::vector<IC::Node*> const& nodes) {
 }
 
 // The node at `start` and everything below it that is not printed yet.
-void appendSubtree(TreeShape const& shape, std::size_t start, std::vector<bool>& printed,
-                   Output& output) {
+void putSubtree(TreeShape const& shape, std::size_t start, std::vector<bool>& printed,
+                Output& out) {
     // Depth first with an explicit stack; a node is printed once, which
     // also ends any cycle of linked ids.
     std::vector<std::pair<std::size_t, std::size_t>> stack;  // node, depth
@@ -827,8 +901,8 @@ void appendSubtree(TreeShape const& shape, std::size_t start, std::vector<bool>&
             continue;
         }
         printed[index] = true;
-        appendTreeNode(output, *shape.list[index], depth);
-        output.pass();
+        putTreeNode(out, *shape.list[index], depth);
+        out.pass();
         auto const& below = shape.children[index];
         for (auto child = below.rbegin(); child != below.rend(); ++child) {
             if (!printed[*child]) {
@@ -838,51 +912,23 @@ void appendSubtree(TreeShape const& shape, std::size_t start, std::vector<bool>&
     }
 }
 
-void writeTreeTo(std::vector<IC::Node*> const& nodes, Output& output) {
+void writeTreeTo(std::vector<IC::Node*> const& nodes, Output& out) {
     TreeShape const shape = treeShape(nodes);
     std::vector<bool> printed(shape.list.size(), false);
     for (std::size_t i = 0; i < shape.list.size(); ++i) {
         if (shape.topLevel[i]) {
-            appendSubtree(shape, i, printed, output);
+            putSubtree(shape, i, printed, out);
         }
     }
     // Nodes whose linked ids only lead round in a cycle start trees of
     // their own.
     for (std::size_t i = 0; i < shape.list.size(); ++i) {
         if (!printed[i]) {
-            appendSubtree(shape, i, printed, output);
+            putSubtree(shape, i, printed, out);
         }
     }
-    output.flush();
+    out.flush();
 }
-
-// Node type names by type, ascending.
-struct TypeName {
-    unsigned int type;
-    char const* name;
-};
-TypeName const kNodeTypeNames[] = {
-    {1, "chassis"},
-    {3, "firmware"},
-    {4, "processor"},
-    {13, "BMC"},
-    {15, "management interface"},
-    {19, "memory device"},
-    {21, "voltage sensor"},
-    {22, "temperature sensor"},
-    {31, "processor cache"},
-    {32, "memory array"},
-    {35, "system event log"},
-    {40, "computer system"},
-    {41, "planar"},
-    {42, "processor core"},
-    {50, "disk controller"},
-    {53, "diagnostics firmware"},
-    {55, "raw SMBIOS table"},
-    {59, "root"},
-    {62, "system slot"},
-    {70, "port connector"},
-};
 
 }  // namespace
 
@@ -902,21 +948,18 @@ std::string latin1ToUtf8(std::string const& text) {
 }
 
 std::string escapeText(std::string const& text, bool quoted) {
-    std::string out;
+    Output out(nullptr);
     if (quoted) {
-        appendQuoted(out, text);
+        putQuoted(out, text);
     } else {
-        appendEscaped(out, text, false);
+        putEscaped(out, text, false);
     }
-    return out;
+    return out.take();
 }
 
 std::string nodeTypeName(unsigned int type) {
-    auto const found = std::lower_bound(
-        std::begin(kNodeTypeNames), std::end(kNodeTypeNames), type,
-        [](TypeName const& entry, unsigned int wanted) { return entry.type < wanted; });
-    return found != std::end(kNodeTypeNames) && found->type == type ? std::string(found->name)
-                                                                    : std::string();
+    char const* const name = typeName(type);
+    return name != nullptr ? std::string(name) : std::string();
 }
 
 std::string nodeTypeLabel(unsigned int type) {
@@ -962,9 +1005,9 @@ std::string formatDateTime(std::int64_t seconds) {
 }
 
 std::string formatValue(IC::PropertyValue const& value) {
-    std::string out;
-    appendValue(out, value);
-    return out;
+    Output out(nullptr);
+    putValue(out, value);
+    return out.take();
 }
 
 PropertyLabel labelProperty(unsigned int nodeType, unsigned int id,
@@ -1002,25 +1045,25 @@ std::vector<std::pair<unsigned int, IC::PropertyValue>> readProperties(IC::Node 
 }
 
 void writeJson(std::vector<IC::Node*> const& nodes, TextSink const& sink) {
-    Output output(&sink);
-    writeJsonTo(nodes, output);
+    Output out(&sink);
+    writeJsonTo(nodes, out);
 }
 
 std::string renderJson(std::vector<IC::Node*> const& nodes) {
-    Output output(nullptr);
-    writeJsonTo(nodes, output);
-    return std::move(output.text());
+    Output out(nullptr);
+    writeJsonTo(nodes, out);
+    return out.take();
 }
 
 void writeTree(std::vector<IC::Node*> const& nodes, TextSink const& sink) {
-    Output output(&sink);
-    writeTreeTo(nodes, output);
+    Output out(&sink);
+    writeTreeTo(nodes, out);
 }
 
 std::string renderTree(std::vector<IC::Node*> const& nodes) {
-    Output output(nullptr);
-    writeTreeTo(nodes, output);
-    return std::move(output.text());
+    Output out(nullptr);
+    writeTreeTo(nodes, out);
+    return out.take();
 }
 
 }  // namespace inventory
