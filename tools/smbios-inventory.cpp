@@ -289,9 +289,17 @@ bool readInput(char const* option, std::string const& path, std::string& content
     return true;
 }
 
-// The text of the override file the plug-in is to read: the --dump file, or
-// a --dump-bin file as --dump would have given it. False after saying why.
-bool readDumpContent(Options const& options, std::string& content) {
+// The dump the plug-in is to read: the text of its override file, and for a
+// --from-bin file the image that text is made from.
+struct DumpInput {
+    std::string content;
+    smbiosdump::DumpImage image;
+};
+
+// The --dump file, or a --from-bin file as --dump would have given it. False
+// after saying why.
+bool readDumpContent(Options const& options, DumpInput& input) {
+    std::string& content = input.content;
     if (!options.dumpFile.empty()) {
         return readInput("--dump", options.dumpFile, content);
     }
@@ -299,7 +307,7 @@ bool readDumpContent(Options const& options, std::string& content) {
     if (!readInput("--from-bin", options.binFile, bytes)) {
         return false;
     }
-    smbiosdump::DumpImage image;
+    smbiosdump::DumpImage& image = input.image;
     std::string why;
     if (!smbiosdump::readDumpBin(std::vector<std::uint8_t>(bytes.begin(), bytes.end()), image,
                                  why)) {
@@ -324,17 +332,22 @@ bool setEnvironment(char const* name, std::string const& value) {
 }
 
 // A dump runs in a private data directory whose override file is a copy of
-// it; the real data directory is left alone. The copy is checked with the
-// plug-in's own grammar, so that the host never answers about another
-// table. Returns 0, or the exit status after saying why.
-int prepareDumpRun(Options const& options, std::string const& content,
+// it; the real data directory is left alone. A --dump file is checked with
+// the plug-in's own grammar, so that the host never answers about another
+// table; the text the host writes itself from a --from-bin image always
+// passes, and only whether its table is whole is left to check. Returns 0,
+// or the exit status after saying why.
+int prepareDumpRun(Options const& options, DumpInput const& input,
                    inventory::PrivateDataDir& folder) {
     std::string why;
-    if (!folder.create(content, why)) {
+    if (!folder.create(input.content, why)) {
         complain(why);
         return smbiostool::EXIT_FAILED;
     }
-    inventory::DumpCheck const check = inventory::checkOverrideFile(folder.overrideFile(), content);
+    inventory::DumpCheck const check =
+        options.dumpFile.empty()
+            ? inventory::checkImage(input.image.header, input.image.table)
+            : inventory::checkOverrideFile(folder.overrideFile(), input.content);
     if (!check.refusal.empty()) {
         complain((options.dumpFile.empty() ? "--from-bin: " + options.binFile
                                            : "--dump: " + options.dumpFile) +
@@ -425,18 +438,35 @@ int checkMachineAnswer(inventory::PluginHost const& host) {
     return smbiostool::EXIT_FAILED;
 }
 
-// Writes the inventory to standard output as it is rendered. Returns 0, or
-// 1 after saying why.
+// Writes all of the text to standard output; false when it cannot.
+bool writeOut(char const* data, size_t size) {
+    while (size > 0) {
+        ssize_t const written = write(STDOUT_FILENO, data, size);
+        if (written < 0 && errno == EINTR) {
+            continue;
+        }
+        if (written <= 0) {
+            return false;
+        }
+        data += written;
+        size -= static_cast<size_t>(written);
+    }
+    return true;
+}
+
+// Writes the inventory to standard output as it is rendered, each piece
+// straight to the file descriptor. Returns 0, or 1 after saying why.
 int printInventory(Options const& options, std::vector<IC::Node*> const& nodes) {
-    inventory::TextSink const toStdout = [](char const* data, size_t size) {
-        std::fwrite(data, 1, size, stdout);
+    bool written = std::fflush(stdout) == 0;
+    inventory::TextSink const toStdout = [&written](char const* data, size_t size) {
+        written = written && writeOut(data, size);
     };
     if (options.format == "json") {
         inventory::writeJson(nodes, toStdout);
     } else {
         inventory::writeTree(nodes, toStdout);
     }
-    if (std::fflush(stdout) != 0 || std::ferror(stdout) != 0) {
+    if (!written) {
         complain("cannot write the inventory to standard output");
         return smbiostool::EXIT_FAILED;
     }
@@ -458,8 +488,8 @@ int run(int argc, char** argv) {
     // Read the dump before anything is created, so that an unreadable file
     // is a command-line error.
     bool const onDump = !options.dumpFile.empty() || !options.binFile.empty();
-    std::string dumpContent;
-    if (onDump && !readDumpContent(options, dumpContent)) {
+    DumpInput dump;
+    if (onDump && !readDumpContent(options, dump)) {
         return smbiostool::EXIT_USAGE;
     }
     if ((!options.dataDir.empty() && !setEnvironment("KESTREL_DATA_DIR", options.dataDir)) ||
@@ -467,7 +497,7 @@ int run(int argc, char** argv) {
         return smbiostool::EXIT_FAILED;
     }
     inventory::PrivateDataDir folder;
-    if (onDump && (status = prepareDumpRun(options, dumpContent, folder)) != 0) {
+    if (onDump && (status = prepareDumpRun(options, dump, folder)) != 0) {
         return status;
     }
     inventory::PluginHost host(pluginPath(options.pluginPath));

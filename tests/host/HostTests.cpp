@@ -255,6 +255,27 @@ TEST_F(HostTest, JsonIsTwoSpaceIndentedWithFinalNewline) {
     EXPECT_EQ(run_.out, doc_.dump(2) + "\n");
 }
 
+// Standard output that takes nothing (/dev/full) is an error that the host
+// names, whichever format it writes.
+TEST_F(HostTest, InventoryThatCannotBeWrittenIsAnError) {
+    if (!std::filesystem::exists("/dev/full")) {
+        GTEST_SKIP() << "no /dev/full on this machine";
+    }
+    for (char const* format : {"tree", "json"}) {
+        SCOPED_TRACE(format);
+        std::vector<std::string> args = {"-c", "exec \"$0\" \"$@\" >/dev/full"};
+        for (std::string const& part : smbiostest::commandLine(
+                 hosttest::hostPath(), {"--plugin", fakePlugin(), "--format", format})) {
+            args.push_back(part);
+        }
+        RunResult const run = hosttest::runProgram("/bin/sh", args);
+        EXPECT_EQ(run.exitStatus, 1) << hosttest::describe(run);
+        EXPECT_NE(run.err.find("smbios-inventory: cannot write the inventory to standard output"),
+                  std::string::npos)
+            << hosttest::describe(run);
+    }
+}
+
 TEST_F(HostTest, StdoutHoldsOnlyTheInventoryAndPluginOutputGoesToStderr) {
     ASSERT_NO_FATAL_FAILURE(runJson());
     for (char const* line : {kStdoutLine, kStdoutLineCpp, kOpenStdoutLine}) {

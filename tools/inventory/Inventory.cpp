@@ -94,7 +94,7 @@ public:
     }
 
 private:
-    static constexpr std::size_t kChunk = 64 * 1024;
+    static constexpr std::size_t kChunk = 32 * 1024;
     // The longest decimal integer of 64 bits with its sign.
     static constexpr std::size_t kIntegerRoom = 20;
 

@@ -1,5 +1,6 @@
 #include "inventory/PrivateDataDir.h"
 
+#include <fcntl.h>
 #include <signal.h>
 #include <stdlib.h>
 #include <unistd.h>
@@ -7,7 +8,6 @@
 #include <cerrno>
 #include <cstring>
 #include <filesystem>
-#include <fstream>
 #include <vector>
 
 #include "format/OverrideText.h"
@@ -108,11 +108,28 @@ std::string makeTemporaryFolder(std::string& why) {
 }
 
 bool writeWholeFile(std::string const& path, std::string const& content, std::string& why) {
-    std::ofstream out(path, std::ios::binary | std::ios::trunc);
-    out.write(content.data(), static_cast<std::streamsize>(content.size()));
-    out.close();
-    if (!out) {
-        why = "cannot write " + path;
+    int const fd = open(path.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0666);
+    if (fd < 0) {
+        why = "cannot write " + path + ": " + std::strerror(errno);
+        return false;
+    }
+    char const* data = content.data();
+    size_t left = content.size();
+    while (left > 0) {
+        ssize_t const written = write(fd, data, left);
+        if (written < 0 && errno == EINTR) {
+            continue;
+        }
+        if (written <= 0) {
+            why = "cannot write " + path + ": " + std::strerror(errno);
+            close(fd);
+            return false;
+        }
+        data += written;
+        left -= static_cast<size_t>(written);
+    }
+    if (close(fd) != 0) {
+        why = "cannot write " + path + ": " + std::strerror(errno);
         return false;
     }
     return true;
@@ -121,7 +138,16 @@ bool writeWholeFile(std::string const& path, std::string const& content, std::st
 }  // namespace
 
 PrivateDataDir::~PrivateDataDir() {
-    if (!path_.empty()) {
+    if (path_.empty()) {
+        return;
+    }
+    // What create made, file and folders, is removed by name; only when
+    // something else is left in them is the whole folder walked.
+    std::string const overrideDir = path_ + "/" + smbiosformat::OVERRIDE_FOLDER;
+    if (!overrideFile_.empty()) {
+        unlink(overrideFile_.c_str());
+    }
+    if ((rmdir(overrideDir.c_str()) != 0 && errno != ENOENT) || rmdir(path_.c_str()) != 0) {
         std::error_code ignored;
         std::filesystem::remove_all(path_, ignored);
     }
