@@ -5,6 +5,7 @@
 
 #include <gtest/gtest.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
 #include <ctime>
 #include <filesystem>
@@ -574,6 +575,25 @@ TEST_F(HostTest, DumpRunsOnACopyInAPrivateDataDirThatIsRemovedAfterwards) {
     EXPECT_TRUE(smbiostest::folderEntries(temporary.path()).empty());
     EXPECT_TRUE(smbiostest::folderEntries(realData.path()).empty());
     EXPECT_EQ(smbiostest::fileText(dump), content);
+}
+
+// Without TMPDIR the private data directory is made in memory, in /dev/shm,
+// where making and removing it is quick, and removed afterwards too.
+TEST_F(HostTest, DumpWithoutTmpdirRunsInAFolderInMemory) {
+    struct stat shm;
+    if (stat("/dev/shm", &shm) != 0 || !S_ISDIR(shm.st_mode) || access("/dev/shm", W_OK) != 0) {
+        GTEST_SKIP() << "no writable /dev/shm on this machine";
+    }
+    smbiostest::TempDir input;
+    std::string const dump = input.file("machine.txt");
+    smbiostest::writeFile(dump, "<SHOWSMBIOS>\n<EPHEADER>\n5F534D5F\n</EPHEADER>\n</SHOWSMBIOS>\n");
+    Environment environment;
+    environment.unset.push_back("TMPDIR");
+    ASSERT_NO_FATAL_FAILURE(runJson({"--dump", dump}, environment));
+    std::string const dir = property(kRootNode, kDataDirProperty)["value"].get<std::string>();
+    std::string const prefix = "/dev/shm/smbios-inventory.";
+    EXPECT_EQ(dir.compare(0, prefix.size(), prefix), 0) << dir;
+    EXPECT_FALSE(std::filesystem::exists(dir)) << dir;
 }
 
 TEST_F(HostTest, DumpTemporaryFolderIsRemovedWhenThePluginFails) {
