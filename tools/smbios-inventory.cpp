@@ -278,14 +278,12 @@ int applyLogOptions(Options const& options) {
 
 // Reads a --dump or --from-bin file: a regular file of at most 16 MiB,
 // never waiting on a FIFO or reading a device.
-bool readInput(char const* option, std::string const& path, std::string& content) {
-    std::vector<std::uint8_t> bytes;
+bool readInput(char const* option, std::string const& path, std::vector<std::uint8_t>& bytes) {
     std::string why;
     if (!smbiostool::readInputFile(path, bytes, why)) {
         complain(std::string(option) + ": " + path + ": " + why);
         return false;
     }
-    content.assign(bytes.begin(), bytes.end());
     return true;
 }
 
@@ -299,18 +297,20 @@ struct DumpInput {
 // The --dump file, or a --from-bin file as --dump would have given it. False
 // after saying why.
 bool readDumpContent(Options const& options, DumpInput& input) {
-    std::string& content = input.content;
+    std::vector<std::uint8_t> bytes;
     if (!options.dumpFile.empty()) {
-        return readInput("--dump", options.dumpFile, content);
+        if (!readInput("--dump", options.dumpFile, bytes)) {
+            return false;
+        }
+        input.content.assign(bytes.begin(), bytes.end());
+        return true;
     }
-    std::string bytes;
     if (!readInput("--from-bin", options.binFile, bytes)) {
         return false;
     }
     smbiosdump::DumpImage& image = input.image;
     std::string why;
-    if (!smbiosdump::readDumpBin(std::vector<std::uint8_t>(bytes.begin(), bytes.end()), image,
-                                 why)) {
+    if (!smbiosdump::readDumpBin(bytes, image, why)) {
         complain("--from-bin: " + options.binFile + ": " + why);
         return false;
     }
@@ -319,7 +319,7 @@ bool readDumpContent(Options const& options, DumpInput& input) {
             "the SMBIOS table in " + options.binFile,
             smbiostool::imageCut(image.wholeTableBytes, image.wholeTableStructures, image.table)));
     }
-    content = smbiosdump::formatOverride(image.header, image.table);
+    input.content = smbiosdump::formatOverride(image.header, image.table);
     return true;
 }
 
@@ -500,6 +500,9 @@ int run(int argc, char** argv) {
     if (onDump && (status = prepareDumpRun(options, dump, folder)) != 0) {
         return status;
     }
+    // The file holds the dump from here on; its memory goes back for the
+    // plug-in to use.
+    dump = DumpInput();
     inventory::PluginHost host(pluginPath(options.pluginPath));
     std::vector<IC::Node*> nodes;
     if ((status = loadInventory(host, options, nodes)) != 0 ||
