@@ -1,12 +1,17 @@
 // Speed and memory of the table parser, the dump-file import and the whole
 // tree build, on a synthetic table, the example server and (when the corpus
-// folder is there) the largest real table, a VMware machine's; and the
-// built plug-in's initialize, loaded as the agent loads it, on a realistic
-// 64 KB table and on 10,000 small structures.
+// folder is there) the largest real table, a VMware machine's; the built
+// plug-in's initialize, loaded as the agent loads it, on a realistic 64 KB
+// table and on 10,000 small structures; smbios-inventory's two renderers on
+// the VMware machine's tree; and the whole smbios-inventory process on the
+// VMware machine's dump, beside dmidecode on the same file.
 #include <benchmark/benchmark.h>
 #include <dlfcn.h>
+#include <fcntl.h>
 #include <malloc.h>
+#include <spawn.h>
 #include <sys/stat.h>
+#include <sys/wait.h>
 #include <unistd.h>
 
 #include <cstdio>
@@ -21,6 +26,7 @@
 #include "IC/ManagementInterface.h"
 #include "IC/Number.h"
 #include "QNLog/QNLogger.h"
+#include "inventory/Inventory.h"
 #include "mi/SmBiosMI.h"
 #include "smbios/SmBios.h"
 #include "smbios/SmBiosInitializer.h"
@@ -94,6 +100,12 @@ public:
         IC::TableLists const lists = groups.lists();
         makeRootNode(lists);
         return nodeList.size();
+    }
+
+    std::vector<IC::Node*> nodes() {
+        std::vector<IC::Node*> list;
+        getMap(list);
+        return list;
     }
 };
 
@@ -326,6 +338,115 @@ void BM_Initialize10000InactiveStructures(benchmark::State& state) {
     initializePlugin(state, inactiveTable(10000));
 }
 BENCHMARK(BM_Initialize10000InactiveStructures)->Unit(benchmark::kMillisecond);
+
+// ---- smbios-inventory ------------------------------------------------------------
+
+// One of the host's renderers on the VMware machine's tree, its text handed
+// to a sink that only counts it, as the host hands it to standard output.
+void renderVMwareTree(benchmark::State& state, bool json) {
+    std::vector<unsigned char> const raw = vmwareTable();
+    if (raw.empty()) {
+        state.SkipWithError("no corpus folder (SMBIOS_CORPUS_DIR)");
+        return;
+    }
+    SD::SmBios const parsed(raw);
+    BenchMI mi;
+    mi.build(parsed);
+    std::vector<IC::Node*> const nodes = mi.nodes();
+    size_t bytes = 0;
+    inventory::TextSink const count = [&bytes](char const*, size_t size) { bytes += size; };
+    for (auto _ : state) {
+        bytes = 0;
+        if (json) {
+            inventory::writeJson(nodes, count);
+        } else {
+            inventory::writeTree(nodes, count);
+        }
+    }
+    state.SetBytesProcessed(static_cast<int64_t>(state.iterations()) * static_cast<int64_t>(bytes));
+    state.counters["nodes"] = static_cast<double>(nodes.size());
+    state.counters["text_bytes"] = static_cast<double>(bytes);
+}
+
+void BM_RenderTreeVMware(benchmark::State& state) { renderVMwareTree(state, false); }
+BENCHMARK(BM_RenderTreeVMware)->Unit(benchmark::kMillisecond);
+
+void BM_RenderJsonVMware(benchmark::State& state) { renderVMwareTree(state, true); }
+BENCHMARK(BM_RenderJsonVMware)->Unit(benchmark::kMillisecond);
+
+// The program of that name in PATH, else in /usr/sbin; "" when there is none.
+std::string findProgram(std::string const& name) {
+    char const* path = std::getenv("PATH");
+    std::string folders = std::string(path != nullptr ? path : "") + ":/usr/sbin";
+    size_t start = 0;
+    while (start <= folders.size()) {
+        size_t const end = std::min(folders.find(':', start), folders.size());
+        std::string const candidate = folders.substr(start, end - start) + "/" + name;
+        if (end > start && access(candidate.c_str(), X_OK) == 0) {
+            return candidate;
+        }
+        start = end + 1;
+    }
+    return "";
+}
+
+// Runs the program with its output thrown away and waits for it; its exit
+// status, or -1 when it could not be run or did not exit.
+int runQuietly(std::vector<std::string> const& argv) {
+    std::vector<char*> args;
+    for (std::string const& arg : argv) {
+        args.push_back(const_cast<char*>(arg.c_str()));
+    }
+    args.push_back(nullptr);
+    posix_spawn_file_actions_t actions;
+    posix_spawn_file_actions_init(&actions);
+    posix_spawn_file_actions_addopen(&actions, STDOUT_FILENO, "/dev/null", O_WRONLY, 0);
+    posix_spawn_file_actions_addopen(&actions, STDERR_FILENO, "/dev/null", O_WRONLY, 0);
+    pid_t pid = 0;
+    int const spawned = posix_spawn(&pid, args[0], &actions, nullptr, args.data(), environ);
+    posix_spawn_file_actions_destroy(&actions);
+    int status = 0;
+    if (spawned != 0 || waitpid(pid, &status, 0) != pid || !WIFEXITED(status)) {
+        return -1;
+    }
+    return WEXITSTATUS(status);
+}
+
+// The whole process, start to end, by wall time: what a person waits for.
+void wholeProcess(benchmark::State& state, std::vector<std::string> const& argv) {
+    if (access((corpusDir() + "/VMWare.bin").c_str(), R_OK) != 0) {
+        state.SkipWithError("no corpus folder (SMBIOS_CORPUS_DIR)");
+        return;
+    }
+    if (argv[0].empty() || access(argv[0].c_str(), X_OK) != 0) {
+        state.SkipWithError("the program is not there (dmidecode: apt-get install dmidecode)");
+        return;
+    }
+    if (runQuietly(argv) != 0) {
+        state.SkipWithError("the program failed on the dump");
+        return;
+    }
+    for (auto _ : state) {
+        runQuietly(argv);
+    }
+}
+
+void BM_ProcessDmidecodeVMware(benchmark::State& state) {
+    wholeProcess(state, {findProgram("dmidecode"), "--from-dump", corpusDir() + "/VMWare.bin"});
+}
+BENCHMARK(BM_ProcessDmidecodeVMware)->UseRealTime()->Unit(benchmark::kMillisecond);
+
+void BM_ProcessInventoryTreeVMware(benchmark::State& state) {
+    wholeProcess(
+        state, {programFolder() + "/smbios-inventory", "--from-bin", corpusDir() + "/VMWare.bin"});
+}
+BENCHMARK(BM_ProcessInventoryTreeVMware)->UseRealTime()->Unit(benchmark::kMillisecond);
+
+void BM_ProcessInventoryJsonVMware(benchmark::State& state) {
+    wholeProcess(state, {programFolder() + "/smbios-inventory", "--from-bin",
+                         corpusDir() + "/VMWare.bin", "--format", "json"});
+}
+BENCHMARK(BM_ProcessInventoryJsonVMware)->UseRealTime()->Unit(benchmark::kMillisecond);
 
 }  // namespace
 

@@ -386,31 +386,39 @@ int applyLogOptions(Options const& options) {
 
 // Reads a --dump or --from-bin file: a regular file of at most 16 MiB,
 // never waiting on a FIFO or reading a device.
-bool readInput(char const* option, std::string const& path, std::string& content) {
-    std::vector<std::uint8_t> bytes;
+bool readInput(char const* option, std::string const& path, std::vector<std::uint8_t>& bytes) {
     std::string why;
     if (!smbiostool::readInputFile(path, bytes, why)) {
         complain(std::string(option) + ": " + path + ": " + why);
         return false;
     }
-    content.assign(bytes.begin(), bytes.end());
     return true;
 }
 
-// The text of the override file the plug-in is to read: the --dump file, or
-// a --dump-bin file as --dump would have given it. False after saying why.
-bool readDumpContent(Options const& options, std::string& content) {
+// The dump the plug-in is to read: the text of its override file, and for a
+// --from-bin file the image that text is made from.
+struct DumpInput {
+    std::string content;
+    smbiosdump::DumpImage image;
+};
+
+// The --dump file, or a --from-bin file as --dump would have given it. False
+// after saying why.
+bool readDumpContent(Options const& options, DumpInput& input) {
+    std::vector<std::uint8_t> bytes;
     if (!options.dumpFile.empty()) {
-        return readInput("--dump", options.dumpFile, content);
+        if (!readInput("--dump", options.dumpFile, bytes)) {
+            return false;
+        }
+        input.content.assign(bytes.begin(), bytes.end());
+        return true;
     }
-    std::string bytes;
     if (!readInput("--from-bin", options.binFile, bytes)) {
         return false;
     }
-    smbiosdump::DumpImage image;
+    smbiosdump::DumpImage& image = input.image;
     std::string why;
-    if (!smbiosdump::readDumpBin(std::vector<std::uint8_t>(bytes.begin(), bytes.end()), image,
-                                 why)) {
+    if (!smbiosdump::readDumpBin(bytes, image, why)) {
         complain("--from-bin: " + options.binFile + ": " + why);
         return false;
     }
@@ -419,7 +427,7 @@ bool readDumpContent(Options const& options, std::string& content) {
             "the SMBIOS table in " + options.binFile,
             smbiostool::imageCut(image.wholeTableBytes, image.wholeTableStructures, image.table)));
     }
-    content = smbiosdump::formatOverride(image.header, image.table);
+    input.content = smbiosdump::formatOverride(image.header, image.table);
     return true;
 }
 
@@ -432,17 +440,22 @@ bool setEnvironment(char const* name, std::string const& value) {
 }
 
 // A dump runs in a private data directory whose override file is a copy of
-// it; the real data directory is left alone. The copy is checked with the
-// plug-in's own grammar, so that the host never answers about another
-// table. Returns 0, or the exit status after saying why.
-int prepareDumpRun(Options const& options, std::string const& content,
+// it; the real data directory is left alone. A --dump file is checked with
+// the plug-in's own grammar, so that the host never answers about another
+// table; the text the host writes itself from a --from-bin image always
+// passes, and only whether its table is whole is left to check. Returns 0,
+// or the exit status after saying why.
+int prepareDumpRun(Options const& options, DumpInput const& input,
                    inventory::PrivateDataDir& folder) {
     std::string why;
-    if (!folder.create(content, why)) {
+    if (!folder.create(input.content, why)) {
         complain(why);
         return smbiostool::EXIT_FAILED;
     }
-    inventory::DumpCheck const check = inventory::checkOverrideFile(folder.overrideFile(), content);
+    inventory::DumpCheck const check =
+        options.dumpFile.empty()
+            ? inventory::checkImage(input.image.header, input.image.table)
+            : inventory::checkOverrideFile(folder.overrideFile(), input.content);
     if (!check.refusal.empty()) {
         complain((options.dumpFile.empty() ? "--from-bin: " + options.binFile
                                            : "--dump: " + options.dumpFile) +
@@ -533,7 +546,23 @@ int checkMachineAnswer(inventory::PluginHost const& host) {
     return smbiostool::EXIT_FAILED;
 }
 
-// The inventory in the format asked for.
+// Writes all of the text to standard output; false when it cannot.
+bool writeOut(char const* data, size_t size) {
+    while (size > 0) {
+        ssize_t const written = write(STDOUT_FILENO, data, size);
+        if (written < 0 && errno == EINTR) {
+            continue;
+        }
+        if (written <= 0) {
+            return false;
+        }
+        data += written;
+        size -= static_cast<size_t>(written);
+    }
+    return true;
+}
+
+// The inventory in the format asked for, as one text.
 std::string renderInventory(std::string const& format, std::vector<IC::Node*> const& nodes) {
     if (format == "json") {
         return inventory::renderJson(nodes);
@@ -550,23 +579,35 @@ std::string renderInventory(std::string const& format, std::vector<IC::Node*> co
     return inventory::renderTree(nodes);
 }
 
-// The inventory in the asked format, on standard output or, with --output,
-// all or nothing into the file, so that a collector reading it never sees a
-// part of it.
+// The inventory in the format asked for, on standard output (the tree and
+// the JSON written as they are rendered, each piece straight to the file
+// descriptor) or, with --output, all or nothing into the file, so that a
+// collector reading it never sees a part of it. Returns 0, or 1 after
+// saying why.
 int writeInventory(Options const& options, std::vector<IC::Node*> const& nodes) {
-    std::string const text = renderInventory(options.format, nodes);
     if (!options.outputFile.empty()) {
         std::string why;
-        if (smbiostool::writeFileAtomically(options.outputFile, text, true, why) !=
-            smbiostool::WriteResult::WRITTEN) {
+        if (smbiostool::writeFileAtomically(options.outputFile,
+                                            renderInventory(options.format, nodes), true,
+                                            why) != smbiostool::WriteResult::WRITTEN) {
             complain("--output: " + why);
             return smbiostool::EXIT_FAILED;
         }
         return 0;
     }
-    std::cout << text;
-    std::cout.flush();
-    if (!std::cout) {
+    bool written = std::fflush(stdout) == 0;
+    inventory::TextSink const toStdout = [&written](char const* data, size_t size) {
+        written = written && writeOut(data, size);
+    };
+    if (options.format == "json") {
+        inventory::writeJson(nodes, toStdout);
+    } else if (options.format == "tree") {
+        inventory::writeTree(nodes, toStdout);
+    } else {
+        std::string const text = renderInventory(options.format, nodes);
+        toStdout(text.data(), text.size());
+    }
+    if (!written) {
         complain("cannot write the inventory to standard output");
         return smbiostool::EXIT_FAILED;
     }
@@ -595,8 +636,8 @@ int run(int argc, char** argv) {
     // Read the dump before anything is created, so that an unreadable file
     // is a command-line error.
     bool const onDump = !options.dumpFile.empty() || !options.binFile.empty();
-    std::string dumpContent;
-    if (onDump && !readDumpContent(options, dumpContent)) {
+    DumpInput dump;
+    if (onDump && !readDumpContent(options, dump)) {
         return smbiostool::EXIT_USAGE;
     }
     if ((!options.dataDir.empty() && !setEnvironment("KESTREL_DATA_DIR", options.dataDir)) ||
@@ -604,9 +645,12 @@ int run(int argc, char** argv) {
         return smbiostool::EXIT_FAILED;
     }
     inventory::PrivateDataDir folder;
-    if (onDump && (status = prepareDumpRun(options, dumpContent, folder)) != 0) {
+    if (onDump && (status = prepareDumpRun(options, dump, folder)) != 0) {
         return status;
     }
+    // The file holds the dump from here on; its memory goes back for the
+    // plug-in to use.
+    dump = DumpInput();
     inventory::PluginHost host(pluginPath(options.pluginPath));
     std::vector<IC::Node*> nodes;
     if ((status = loadInventory(host, options, nodes)) != 0 ||

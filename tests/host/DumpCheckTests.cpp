@@ -1,5 +1,6 @@
 // The host's check of a dump file, called directly: which files it refuses,
-// and the warning for a table that is not whole.
+// and the warning for a table that is not whole, from the file or from the
+// entry point and table the host writes into one itself.
 
 #include <gtest/gtest.h>
 
@@ -76,6 +77,41 @@ TEST(DumpCheck, HeaderEndOnTheLastLineWithoutALineEndIsNamed) {
 
 TEST(DumpCheck, MissingHeaderEndNamesTheLastLineEvenWithoutALineEnd) {
     EXPECT_EQ(check("<SHOWSMBIOS>\n<EPHEADER>").refusal, "line 2: no </EPHEADER>");
+}
+
+// The entry point and table of an image give the warning that the override
+// file the host writes from them gives.
+TEST(DumpCheck, ImageGivesTheWarningOfTheFileMadeFromIt) {
+    std::vector<uint8_t> const whole = twoStructures();
+    std::vector<uint8_t> cut = whole;
+    cut.resize(cut.size() - 3);
+    struct Case {
+        std::vector<uint8_t> header;
+        std::vector<uint8_t> table;
+        char const* warning;
+    };
+    Case const cases[] = {
+        {smbiosdump::makeSmEntryPoint(2, 8, static_cast<uint16_t>(whole.size()), 0x20, 2, 16),
+         whole, ""},
+        {smbiosdump::makeSmEntryPoint(2, 8, static_cast<uint16_t>(whole.size()), 0x20, 9, 16),
+         whole, "warning: the entry point announces 9 structures; the table holds 2"},
+        {smbiosdump::makeDmiEntryPoint(0x21, static_cast<uint16_t>(whole.size()), 0x20, 5), whole,
+         "warning: the entry point announces 5 structures; the table holds 2"},
+        {smbiosdump::makeSmEntryPoint(2, 8, static_cast<uint16_t>(cut.size()), 0x20, 2, 16), cut,
+         "warning: the entry point announces 2 structures; the table holds 1 and ends inside the "
+         "next one"},
+        {smbiosdump::makeSmEntryPoint(2, 8, static_cast<uint16_t>(cut.size()), 0x20, 1, 16), cut,
+         "warning: the table ends inside a structure, after 1 whole ones"},
+    };
+    for (Case const& c : cases) {
+        SCOPED_TRACE(c.warning);
+        inventory::DumpCheck const fromImage = inventory::checkImage(c.header, c.table);
+        inventory::DumpCheck const fromFile = check(smbiosdump::formatOverride(c.header, c.table));
+        EXPECT_EQ(fromImage.refusal, "");
+        EXPECT_EQ(fromImage.warning, c.warning);
+        EXPECT_EQ(fromFile.refusal, "");
+        EXPECT_EQ(fromFile.warning, fromImage.warning);
+    }
 }
 
 }  // namespace

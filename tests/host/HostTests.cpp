@@ -5,6 +5,7 @@
 
 #include <gtest/gtest.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
 #include <ctime>
 #include <filesystem>
@@ -179,7 +180,7 @@ TEST_F(HostTest, JsonGivesEveryPropertyKindItsExactValue) {
     EXPECT_EQ(property(kKindsNode, kByteProperty),
               Json::parse(R"({"kind": "byte", "value": 171})"));
     EXPECT_EQ(property(kKindsNode, kBytesProperty),
-              Json::parse(R"({"kind": "bytes", "value": "001FABFF"})"));
+              Json::parse(R"({"kind": "bytes", "value": "001FABFF", "name": "Family"})"));
     EXPECT_EQ(property(kKindsNode, kNumbersProperty), Json::parse(R"({"kind": "numbers", "value": [
                   {"kind": "unsigned", "value": 1},
                   {"kind": "bool", "value": true},
@@ -255,6 +256,27 @@ TEST_F(HostTest, JsonIsTwoSpaceIndentedWithFinalNewline) {
     EXPECT_EQ(run_.out, doc_.dump(2) + "\n");
 }
 
+// Standard output that takes nothing (/dev/full) is an error that the host
+// names, whichever format it writes.
+TEST_F(HostTest, InventoryThatCannotBeWrittenIsAnError) {
+    if (!std::filesystem::exists("/dev/full")) {
+        GTEST_SKIP() << "no /dev/full on this machine";
+    }
+    for (char const* format : {"tree", "json"}) {
+        SCOPED_TRACE(format);
+        std::vector<std::string> args = {"-c", "exec \"$0\" \"$@\" >/dev/full"};
+        for (std::string const& part : smbiostest::commandLine(
+                 hosttest::hostPath(), {"--plugin", fakePlugin(), "--format", format})) {
+            args.push_back(part);
+        }
+        RunResult const run = hosttest::runProgram("/bin/sh", args);
+        EXPECT_EQ(run.exitStatus, 1) << hosttest::describe(run);
+        EXPECT_NE(run.err.find("smbios-inventory: cannot write the inventory to standard output"),
+                  std::string::npos)
+            << hosttest::describe(run);
+    }
+}
+
 TEST_F(HostTest, StdoutHoldsOnlyTheInventoryAndPluginOutputGoesToStderr) {
     ASSERT_NO_FATAL_FAILURE(runJson());
     for (char const* line : {kStdoutLine, kStdoutLineCpp, kOpenStdoutLine}) {
@@ -309,7 +331,7 @@ TEST_F(HostTest, TreeShowsEveryPropertyKindBeneathItsNode) {
         "      11 enum16  60000\n"
         "      12 enum32  70000\n"
         "      13 byte  171\n"
-        "      20 bytes  00 1F AB FF\n"
+        "      20 Family  00 1F AB FF\n"
         "      30 numbers  {1, true, 2.5, 1.2, (none)}\n"
         "      100 strings  {\"alpha\", \"Caf\xC3\xA9\", \"\"}\n"
         "      101 kind  7\n";
@@ -553,6 +575,25 @@ TEST_F(HostTest, DumpRunsOnACopyInAPrivateDataDirThatIsRemovedAfterwards) {
     EXPECT_TRUE(smbiostest::folderEntries(temporary.path()).empty());
     EXPECT_TRUE(smbiostest::folderEntries(realData.path()).empty());
     EXPECT_EQ(smbiostest::fileText(dump), content);
+}
+
+// Without TMPDIR the private data directory is made in memory, in /dev/shm,
+// where making and removing it is quick, and removed afterwards too.
+TEST_F(HostTest, DumpWithoutTmpdirRunsInAFolderInMemory) {
+    struct stat shm;
+    if (stat("/dev/shm", &shm) != 0 || !S_ISDIR(shm.st_mode) || access("/dev/shm", W_OK) != 0) {
+        GTEST_SKIP() << "no writable /dev/shm on this machine";
+    }
+    smbiostest::TempDir input;
+    std::string const dump = input.file("machine.txt");
+    smbiostest::writeFile(dump, "<SHOWSMBIOS>\n<EPHEADER>\n5F534D5F\n</EPHEADER>\n</SHOWSMBIOS>\n");
+    Environment environment;
+    environment.unset.push_back("TMPDIR");
+    ASSERT_NO_FATAL_FAILURE(runJson({"--dump", dump}, environment));
+    std::string const dir = property(kRootNode, kDataDirProperty)["value"].get<std::string>();
+    std::string const prefix = "/dev/shm/smbios-inventory.";
+    EXPECT_EQ(dir.compare(0, prefix.size(), prefix), 0) << dir;
+    EXPECT_FALSE(std::filesystem::exists(dir)) << dir;
 }
 
 TEST_F(HostTest, DumpTemporaryFolderIsRemovedWhenThePluginFails) {

@@ -40,6 +40,12 @@ std::string nameOf(unsigned int type, unsigned int id) {
     return info != nullptr ? std::string(info->name) : "property " + std::to_string(id);
 }
 
+// " KB" and the like: the catalog's unit after a value, "" when it has none.
+std::string unitOf(unsigned int type, unsigned int id) {
+    inventory::PropertyInfo const* info = inventory::findProperty(type, id);
+    return info != nullptr && info->unit[0] != '\0' ? std::string(" ") + info->unit : "";
+}
+
 // A small server: the frame nodes, computer system, chassis, planar, two
 // processors with a cache each, two slots, two memory devices, the BIOS
 // and a raw structure.
@@ -270,7 +276,8 @@ TEST(InventoryDiff, SiblingsThatTieAreNumberedInListOrder) {
     nodeWithId(after, 21)["properties"]["37"] = number(99);
     removeNode(after, 22);
     EXPECT_EQ(diffText(before, after), "~ " + planar() + "/Memory Array #2: " + nameOf(32, 37) +
-                                           ": 21 -> 99\n" + "- " + planar() + "/Memory Array #3\n");
+                                           ": 21" + unitOf(32, 37) + " -> 99" + unitOf(32, 37) +
+                                           "\n" + "- " + planar() + "/Memory Array #3\n");
 }
 
 TEST(InventoryDiff, MemoryDevicesPairByDeviceLocatorAndByBankWhereThoseTie) {

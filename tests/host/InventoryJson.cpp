@@ -1,6 +1,7 @@
 #include "InventoryJson.h"
 
 #include <sstream>
+#include <utility>
 
 namespace hosttest {
 
@@ -51,6 +52,31 @@ std::string maskRunValues(std::string const& text, unsigned int& masked) {
     }
     // The host writes its document this way too.
     return document.dump(2) + "\n";
+}
+
+char const* const kLabelKeys[3] = {"name", "unit", "meaning"};
+
+Json withoutLabels(Json value) {
+    if (!value.is_object()) {
+        return value;
+    }
+    if (value.contains("nodes")) {
+        for (Json& node : value["nodes"]) {
+            node = withoutLabels(std::move(node));
+        }
+    } else if (value.contains("properties")) {
+        value["properties"] = withoutLabels(std::move(value["properties"]));
+    } else if (value.contains("kind")) {
+        for (char const* key : kLabelKeys) {
+            value.erase(key);
+        }
+    } else {
+        // A node's properties, by id.
+        for (auto& item : value.items()) {
+            item.value() = withoutLabels(std::move(item.value()));
+        }
+    }
+    return value;
 }
 
 std::vector<Json> nodesOfType(Json const& document, unsigned int type) {

@@ -30,6 +30,14 @@ std::vector<Json> nodesOfType(Json const& document, unsigned int type);
 // the node does not have it.
 Json propertyOf(Json const& node, unsigned int id);
 
+// The keys the catalog adds to a property object beside "kind" and "value".
+extern char const* const kLabelKeys[3];
+
+// The value with the catalog's keys ("name", "unit", "meaning") taken out of
+// every property object in it: a whole document, a node, a node's
+// properties or one property.
+Json withoutLabels(Json value);
+
 // Where two texts first differ, line by line, with a few lines of each from
 // there: a failure message that a long text would drown.
 std::string firstDifference(std::string const& expected, std::string const& actual);

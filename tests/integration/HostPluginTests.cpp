@@ -62,7 +62,7 @@ TEST(HostWithPlugin, SuperMicroDumpGivesManagementInterfaceAndRootNodes) {
     EXPECT_EQ(mi.at("status"), 1);
     EXPECT_EQ(mi.at("description"), "Corvane SMBIOS Management Interface");
     EXPECT_EQ(mi.at("properties").at("306"),
-              json::parse(R"({"kind": "version", "value": [2, 7]})"));
+              json::parse(R"({"kind": "version", "value": [2, 7], "name": "SMBIOS version"})"));
     EXPECT_FALSE(mi.at("properties").contains("307"));
     json const& root = nodes[1];
     EXPECT_EQ(root.at("type"), 59);
@@ -106,8 +106,9 @@ TEST(HostWithPlugin, NoDumpAndNoPhysicalMemoryLibraryIsNoTableAndLogsTableSizeZe
     EXPECT_EQ(result.out, "");
     EXPECT_NE(result.err.find("smbios table size zero"), std::string::npos) << result.err;
     EXPECT_NE(result.err.find("PMEM: could not load library"), std::string::npos) << result.err;
-    EXPECT_NE(result.err.find("smbios-inventory: no SMBIOS table could be read from this machine\n"),
-              std::string::npos)
+    EXPECT_NE(
+        result.err.find("smbios-inventory: no SMBIOS table could be read from this machine\n"),
+        std::string::npos)
         << result.err;
 }
 

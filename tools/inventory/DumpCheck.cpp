@@ -59,15 +59,10 @@ bool announcedCount(std::vector<unsigned char> const& header, unsigned int& coun
 }
 
 // The warning for a table that is not whole; "" when it is.
-std::string truncation(std::vector<std::string> const& head,
-                       std::vector<std::string> const& tables) {
-    std::vector<unsigned char> header;
-    std::vector<unsigned char> table;
+std::string truncation(std::vector<unsigned char> const& header,
+                       std::vector<unsigned char> const& table) {
     unsigned int announced = 0;
-    // A header or table the plug-in does not decode gives an empty table,
-    // which the inventory shows for itself.
-    if (SD::readHead(header, head) != 0 || !announcedCount(header, announced) ||
-        SD::readTables(table, tables) != 0) {
+    if (!announcedCount(header, announced)) {
         return "";
     }
     smbiosdump::TableStats const stats = smbiosdump::tableStats(table);
@@ -81,6 +76,20 @@ std::string truncation(std::vector<std::string> const& head,
         return "warning: the table ends inside a structure, after " + held + " whole ones";
     }
     return "";
+}
+
+// The same for the file's entry point and table, decoded as the plug-in
+// decodes them.
+std::string truncation(std::vector<std::string> const& head,
+                       std::vector<std::string> const& tables) {
+    std::vector<unsigned char> header;
+    std::vector<unsigned char> table;
+    // A header or table the plug-in does not decode gives an empty table,
+    // which the inventory shows for itself.
+    if (SD::readHead(header, head) != 0 || SD::readTables(table, tables) != 0) {
+        return "";
+    }
+    return truncation(header, table);
 }
 
 }  // namespace
@@ -104,6 +113,13 @@ DumpCheck checkOverrideFile(std::string const& path, std::string const& text) {
         return check;
     }
     check.warning = truncation(head, tables);
+    return check;
+}
+
+DumpCheck checkImage(std::vector<std::uint8_t> const& header,
+                     std::vector<std::uint8_t> const& table) {
+    DumpCheck check;
+    check.warning = truncation(header, table);
     return check;
 }
 

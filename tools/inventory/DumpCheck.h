@@ -5,7 +5,9 @@
 // grammar first and refuses what the plug-in would not take as its table.
 #pragma once
 
+#include <cstdint>
 #include <string>
+#include <vector>
 
 namespace inventory {
 
@@ -24,5 +26,12 @@ struct DumpCheck {
 // Checks the override file at path, whose content is text (for the line
 // numbers of the messages).
 DumpCheck checkOverrideFile(std::string const& path, std::string const& text);
+
+// The same check for the entry point and table that the host itself writes
+// into an override file (from a dmidecode --dump-bin image). Such a file is
+// always one the plug-in takes, so only the warning can be set; it is
+// found from the bytes, without reading the file back.
+DumpCheck checkImage(std::vector<std::uint8_t> const& header,
+                     std::vector<std::uint8_t> const& table);
 
 }  // namespace inventory

@@ -1,21 +1,20 @@
 #include "Inventory.h"
 
+#include <algorithm>
+#include <charconv>
+#include <cmath>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
-#include <map>
-#include <nlohmann/json.hpp>
+#include <iterator>
+#include <limits>
+#include <typeinfo>
 #include <utility>
 
 #include "IC/MutableNode.h"
+#include "inventory/PropertyNames.h"
 
 namespace inventory {
-
-namespace {
-
-using Json = nlohmann::ordered_json;
-
-}  // namespace
 
 NodeFacts readFacts(IC::Node const& node) {
     NodeFacts facts;
@@ -32,14 +31,157 @@ NodeFacts readFacts(IC::Node const& node) {
     return facts;
 }
 
+TreeShape treeShape(std::vector<IC::Node*> const& nodes) {
+    TreeShape shape;
+    shape.list.reserve(nodes.size());
+    for (IC::Node const* node : nodes) {
+        if (node != nullptr) {
+            shape.list.push_back(node);
+        }
+    }
+    // The first node with an id is the one its linked nodes hang under.
+    std::vector<std::pair<unsigned int, std::size_t>> byId;
+    byId.reserve(shape.list.size());
+    for (std::size_t i = 0; i < shape.list.size(); ++i) {
+        byId.emplace_back(shape.list[i]->getNodeId(), i);
+    }
+    std::stable_sort(byId.begin(), byId.end(),
+                     [](auto const& a, auto const& b) { return a.first < b.first; });
+    shape.children.resize(shape.list.size());
+    shape.topLevel.assign(shape.list.size(), false);
+    for (std::size_t i = 0; i < shape.list.size(); ++i) {
+        unsigned int const linked = shape.list[i]->getLinkedId();
+        auto const parent = std::lower_bound(byId.begin(), byId.end(), linked,
+                                             [](std::pair<unsigned int, std::size_t> const& entry,
+                                                unsigned int id) { return entry.first < id; });
+        if (parent == byId.end() || parent->first != linked) {
+            shape.topLevel[i] = true;
+        } else {
+            shape.children[parent->second].push_back(i);
+        }
+    }
+    return shape;
+}
+
 namespace {
 
-char const kHexDigits[] = "0123456789ABCDEF";
+// ---- Output -----------------------------------------------------------------
 
-void appendHexByte(std::string& out, unsigned char byte) {
-    out += kHexDigits[byte >> 4];
-    out += kHexDigits[byte & 0x0F];
+// The text being rendered, written straight into one buffer. With a sink
+// the buffer is handed on whenever a node or a property leaves it past
+// kChunk bytes, so that the whole text is never held; without one it
+// collects everything.
+class Output {
+public:
+    explicit Output(TextSink const* sink) : sink_(sink) {
+        buffer_.resize(sink_ != nullptr ? kChunk + kChunk / 4 : 256);
+    }
+    Output(Output const&) = delete;
+    Output& operator=(Output const&) = delete;
+
+    void put(char c) {
+        *room(1) = c;
+        ++size_;
+    }
+    void put(char const* data, std::size_t size) {
+        std::memcpy(room(size), data, size);
+        size_ += size;
+    }
+    void put(std::string const& chars) { put(chars.data(), chars.size()); }
+    // A string literal, its length known where it is written.
+    template <std::size_t N>
+    void literal(char const (&chars)[N]) {
+        put(chars, N - 1);
+    }
+    // A C string of unknown length.
+    void text(char const* chars) { put(chars, std::strlen(chars)); }
+    void spaces(std::size_t count) {
+        std::memset(room(count), ' ', count);
+        size_ += count;
+    }
+    // A line end and the next line's indentation.
+    void newline(std::size_t indent) {
+        char* const at = room(indent + 1);
+        *at = '\n';
+        std::memset(at + 1, ' ', indent);
+        size_ += indent + 1;
+    }
+    template <typename Integer>
+    void integer(Integer value) {
+        char* const at = room(kIntegerRoom);
+        size_ += static_cast<std::size_t>(std::to_chars(at, at + kIntegerRoom, value).ptr - at);
+    }
+    void hexByte(unsigned char byte) {
+        static char const kHexDigits[] = "0123456789ABCDEF";
+        char* const at = room(2);
+        at[0] = kHexDigits[byte >> 4];
+        at[1] = kHexDigits[byte & 0x0F];
+        size_ += 2;
+    }
+
+    // Hands the text on once there is enough of it.
+    void pass() {
+        if (sink_ != nullptr && size_ >= kChunk) {
+            flush();
+        }
+    }
+
+    void flush() {
+        if (sink_ != nullptr && size_ != 0) {
+            (*sink_)(buffer_.data(), size_);
+            size_ = 0;
+        }
+    }
+
+    // Everything written, when there is no sink.
+    std::string take() {
+        buffer_.resize(size_);
+        size_ = 0;
+        return std::move(buffer_);
+    }
+
+private:
+    static constexpr std::size_t kChunk = 32 * 1024;
+    // The longest decimal integer of 64 bits with its sign.
+    static constexpr std::size_t kIntegerRoom = 20;
+
+    // Room for count more characters at the end of the text.
+    char* room(std::size_t count) {
+        if (buffer_.size() - size_ < count) {
+            buffer_.resize(std::max(2 * buffer_.size(), size_ + count));
+        }
+        return &buffer_[size_];
+    }
+
+    TextSink const* sink_;
+    std::string buffer_;
+    std::size_t size_ = 0;
+};
+
+// ---- Node facts ---------------------------------------------------------------
+
+// The property values of a node without copies where the node keeps them
+// (see visitProperties).
+template <typename Visit>
+void eachProperty(IC::Node const& node, Visit&& visit) {
+    IC::PropertyMap const& stored = node.getProperties();
+    if (typeid(node) == typeid(IC::MutableNode)) {
+        // The framework's own node answers getProperty from this very map.
+        for (auto const& entry : stored) {
+            visit(entry.first, entry.second);
+        }
+        return;
+    }
+    // A class of its own may compute any value when it is read. Such
+    // nodes are few (one computer system), so asking each id costs little.
+    IC::PropertyValue value;
+    for (auto const& entry : stored) {
+        IC::Error const error = node.getProperty(entry.first, value);
+        visit(entry.first, error.getStatus() == 0 ? value : entry.second);
+    }
 }
+
+// ---- Text of values -------------------------------------------------------------
 
 std::string formatDouble(double value) {
     // The shortest text that reads back as the same value, without an
@@ -61,197 +203,125 @@ std::string formatDouble(double value) {
     return shortest.empty() ? std::string(buffer) : shortest;
 }
 
-std::string formatNumber(IC::Number const& number) {
-    switch (number.getKind()) {
-        case IC::Number::BOOL:
-            return number.getBool() ? "true" : "false";
-        case IC::Number::UNSIGNED:
-            return std::to_string(number.getUnsigned());
-        case IC::Number::DOUBLE:
-            return formatDouble(number.getDouble());
-        case IC::Number::VERSION:
-            return std::to_string(number.getVersion().getMajor()) + "." +
-                   std::to_string(number.getVersion().getMinor());
-        case IC::Number::DATETIME:
-            return formatDateTime(number.getDateTime());
-        case IC::Number::NONE:
-            break;
-    }
-    return "(none)";
-}
-
-Json numberJson(IC::Number const& number) {
-    Json value;
-    switch (number.getKind()) {
-        case IC::Number::BOOL:
-            value = number.getBool();
-            break;
-        case IC::Number::UNSIGNED:
-            value = number.getUnsigned();
-            break;
-        case IC::Number::DOUBLE:
-            value = number.getDouble();
-            break;
-        case IC::Number::VERSION:
-            value = Json::array({number.getVersion().getMajor(), number.getVersion().getMinor()});
-            break;
-        case IC::Number::DATETIME:
-            value = number.getDateTime();
-            break;
-        case IC::Number::NONE:
-            break;
-    }
-    Json result;
-    result["kind"] = numberKindName(number);
-    result["value"] = std::move(value);
-    return result;
-}
-
-Json valueJson(IC::PropertyValue const& property) {
-    if (property.getKind() == IC::PropertyValue::NUMBER) {
-        return numberJson(property.getNumber());
-    }
-    Json value;
-    switch (property.getKind()) {
-        case IC::PropertyValue::STRING:
-            value = latin1ToUtf8(property.getString());
-            break;
-        case IC::PropertyValue::ENUM:
-            value = property.getEnum().getValue();
-            break;
-        case IC::PropertyValue::BYTE:
-            value = static_cast<unsigned int>(property.getByte());
-            break;
-        case IC::PropertyValue::BYTES: {
-            std::string hex;
-            for (unsigned char byte : property.getBytes()) {
-                appendHexByte(hex, byte);
-            }
-            value = hex;
-            break;
+// The text on one line: control characters as \xNN, a backslash (and a
+// double quote when the text goes between quotes) behind a backslash,
+// Latin-1 letters in UTF-8.
+void putEscaped(Output& out, std::string const& text, bool quoted) {
+    for (char c : text) {
+        auto const byte = static_cast<unsigned char>(c);
+        if (byte == '\\' || (quoted && byte == '"')) {
+            out.put('\\');
+            out.put(c);
+        } else if (byte < 0x20 || byte == 0x7F || (byte >= 0x80 && byte < 0xA0)) {
+            out.literal("\\x");
+            out.hexByte(byte);
+        } else if (byte >= 0xA0) {
+            out.put(static_cast<char>(0xC0 | (byte >> 6)));
+            out.put(static_cast<char>(0x80 | (byte & 0x3F)));
+        } else {
+            out.put(c);
         }
-        case IC::PropertyValue::NUMBERS:
-            value = Json::array();
-            for (IC::Number const& number : property.getNumbers()) {
-                value.push_back(numberJson(number));
+    }
+}
+
+// escapeText's text with quoted set.
+void putQuoted(Output& out, std::string const& text) {
+    out.put('"');
+    putEscaped(out, text, true);
+    out.put('"');
+}
+
+void putNumber(Output& out, IC::Number const& number) {
+    switch (number.getKind()) {
+        case IC::Number::BOOL:
+            if (number.getBool()) {
+                out.literal("true");
+            } else {
+                out.literal("false");
             }
+            return;
+        case IC::Number::UNSIGNED:
+            out.integer(number.getUnsigned());
+            return;
+        case IC::Number::DOUBLE:
+            out.put(formatDouble(number.getDouble()));
+            return;
+        case IC::Number::VERSION:
+            out.integer(number.getVersion().getMajor());
+            out.put('.');
+            out.integer(number.getVersion().getMinor());
+            return;
+        case IC::Number::DATETIME:
+            out.put(formatDateTime(number.getDateTime()));
+            return;
+        case IC::Number::NONE:
             break;
-        case IC::PropertyValue::STRINGS:
-            value = Json::array();
-            for (std::string const& text : property.getStrings()) {
-                value.push_back(latin1ToUtf8(text));
-            }
-            break;
-        case IC::PropertyValue::KIND:
-            value = static_cast<unsigned int>(property.getKindValue());
-            break;
+    }
+    out.literal("(none)");
+}
+
+// The value as the tree shows it.
+void putValue(Output& out, IC::PropertyValue const& value) {
+    switch (value.getKind()) {
+        case IC::PropertyValue::STRING:
+            putQuoted(out, value.getString());
+            return;
         case IC::PropertyValue::NUMBER:
+            putNumber(out, value.getNumber());
+            return;
+        case IC::PropertyValue::ENUM:
+            out.integer(value.getEnum().getValue());
+            return;
+        case IC::PropertyValue::BYTE:
+            out.integer(static_cast<unsigned int>(value.getByte()));
+            return;
+        case IC::PropertyValue::BYTES: {
+            bool first = true;
+            for (unsigned char byte : value.getBytes()) {
+                if (!first) {
+                    out.put(' ');
+                }
+                first = false;
+                out.hexByte(byte);
+            }
+            return;
+        }
+        case IC::PropertyValue::NUMBERS: {
+            out.put('{');
+            bool first = true;
+            for (IC::Number const& number : value.getNumbers()) {
+                if (!first) {
+                    out.literal(", ");
+                }
+                first = false;
+                putNumber(out, number);
+            }
+            out.put('}');
+            return;
+        }
+        case IC::PropertyValue::STRINGS: {
+            out.put('{');
+            bool first = true;
+            for (std::string const& text : value.getStrings()) {
+                if (!first) {
+                    out.literal(", ");
+                }
+                first = false;
+                putQuoted(out, text);
+            }
+            out.put('}');
+            return;
+        }
+        case IC::PropertyValue::KIND:
+            out.integer(static_cast<unsigned int>(value.getKindValue()));
+            return;
         case IC::PropertyValue::NONE:
             break;
     }
-    Json result;
-    result["kind"] = valueKindName(property);
-    result["value"] = std::move(value);
-    return result;
+    out.literal("(none)");
 }
 
-std::string nodeLine(NodeFacts const& facts, bool topLevel) {
-    std::string line = escapeText(facts.description, false);
-    line += "  [" + nodeTypeLabel(facts.type) + ", index " + std::to_string(facts.index) + ", id " +
-            std::to_string(facts.id) + ", status " + std::to_string(facts.status);
-    if (topLevel && facts.linked != 0) {
-        // Linked to a node that is not in the list.
-        line += ", linked " + std::to_string(facts.linked);
-    }
-    if (!facts.path.empty()) {
-        line += ", path " + escapeText(facts.path, true);
-    }
-    if (!facts.parent.empty()) {
-        line += ", parent " + escapeText(facts.parent, true);
-    }
-    line += "]";
-    return line;
-}
-
-}  // namespace
-
-std::string latin1ToUtf8(std::string const& text) {
-    std::string out;
-    out.reserve(text.size());
-    for (char c : text) {
-        auto byte = static_cast<unsigned char>(c);
-        if (byte < 0x80) {
-            out += c;
-        } else {
-            out += static_cast<char>(0xC0 | (byte >> 6));
-            out += static_cast<char>(0x80 | (byte & 0x3F));
-        }
-    }
-    return out;
-}
-
-std::string escapeText(std::string const& text, bool quoted) {
-    std::string out;
-    if (quoted) {
-        out += '"';
-    }
-    for (char c : text) {
-        auto byte = static_cast<unsigned char>(c);
-        if (byte == '\\' || (quoted && byte == '"')) {
-            out += '\\';
-            out += c;
-        } else if (byte < 0x20 || byte == 0x7F || (byte >= 0x80 && byte < 0xA0)) {
-            out += "\\x";
-            appendHexByte(out, byte);
-        } else if (byte >= 0xA0) {
-            out += latin1ToUtf8(std::string(1, c));
-        } else {
-            out += c;
-        }
-    }
-    if (quoted) {
-        out += '"';
-    }
-    return out;
-}
-
-std::string nodeTypeName(unsigned int type) {
-    static std::map<unsigned int, char const*> const names = {
-        {1, "chassis"},
-        {3, "firmware"},
-        {4, "processor"},
-        {13, "BMC"},
-        {15, "management interface"},
-        {19, "memory device"},
-        {21, "voltage sensor"},
-        {22, "temperature sensor"},
-        {31, "processor cache"},
-        {32, "memory array"},
-        {35, "system event log"},
-        {40, "computer system"},
-        {41, "planar"},
-        {42, "processor core"},
-        {50, "disk controller"},
-        {53, "diagnostics firmware"},
-        {55, "raw SMBIOS table"},
-        {59, "root"},
-        {62, "system slot"},
-        {70, "port connector"},
-    };
-    auto found = names.find(type);
-    return found == names.end() ? std::string() : std::string(found->second);
-}
-
-std::string nodeTypeLabel(unsigned int type) {
-    std::string label = "type " + std::to_string(type);
-    std::string name = nodeTypeName(type);
-    if (!name.empty()) {
-        label += " " + name;
-    }
-    return label;
-}
-
-std::string numberKindName(IC::Number const& number) {
+char const* numberKindText(IC::Number const& number) {
     switch (number.getKind()) {
         case IC::Number::BOOL:
             return "bool";
@@ -269,12 +339,12 @@ std::string numberKindName(IC::Number const& number) {
     return "none";
 }
 
-std::string valueKindName(IC::PropertyValue const& value) {
+char const* valueKindText(IC::PropertyValue const& value) {
     switch (value.getKind()) {
         case IC::PropertyValue::STRING:
             return "string";
         case IC::PropertyValue::NUMBER:
-            return numberKindName(value.getNumber());
+            return numberKindText(value.getNumber());
         case IC::PropertyValue::ENUM:
             switch (value.getEnum().getWidth()) {
                 case 1:
@@ -299,6 +369,589 @@ std::string valueKindName(IC::PropertyValue const& value) {
     }
     return "none";
 }
+
+// The value as a whole number that a unit or a meaning can go with: an
+// enumerated value, a byte or an unsigned number. False for anything else.
+bool wholeNumber(IC::PropertyValue const& value, std::int64_t& number) {
+    switch (value.getKind()) {
+        case IC::PropertyValue::ENUM:
+            number = value.getEnum().getValue();
+            return true;
+        case IC::PropertyValue::BYTE:
+            number = value.getByte();
+            return true;
+        case IC::PropertyValue::NUMBER:
+            if (value.getNumber().getKind() == IC::Number::UNSIGNED) {
+                number = value.getNumber().getUnsigned();
+                return true;
+            }
+            return false;
+        default:
+            return false;
+    }
+}
+
+// ---- JSON ---------------------------------------------------------------------
+// The layout is that of a JSON library's 2-space pretty printing, byte for
+// byte: every member of an object and every element of an array on a line
+// of its own, "key": value, empty objects and arrays as {} and []. The
+// document's depth is fixed, so is the indentation of each part.
+
+std::size_t const kNodeIndent = 4;          // a node's braces
+std::size_t const kNodeKeyIndent = 6;       // its keys
+std::size_t const kPropertyIndent = 8;      // a property's key and braces
+std::size_t const kPropertyKeyIndent = 10;  // "kind", "value", "name", ...
+std::size_t const kElementIndent = 12;      // elements of a value that is an array
+std::size_t const kElementKeyIndent = 14;   // keys of a number in such an array
+
+// A JSON string of UTF-8 text: the quote, the backslash and the control
+// characters escaped, everything else as it is.
+void putJsonUtf8(Output& out, char const* text, std::size_t size) {
+    static char const kLowerHex[] = "0123456789abcdef";
+    out.put('"');
+    for (std::size_t i = 0; i < size; ++i) {
+        auto const byte = static_cast<unsigned char>(text[i]);
+        switch (byte) {
+            case '"':
+                out.literal("\\\"");
+                break;
+            case '\\':
+                out.literal("\\\\");
+                break;
+            case '\b':
+                out.literal("\\b");
+                break;
+            case '\f':
+                out.literal("\\f");
+                break;
+            case '\n':
+                out.literal("\\n");
+                break;
+            case '\r':
+                out.literal("\\r");
+                break;
+            case '\t':
+                out.literal("\\t");
+                break;
+            default:
+                if (byte < 0x20) {
+                    out.literal("\\u00");
+                    out.put(kLowerHex[byte >> 4]);
+                    out.put(kLowerHex[byte & 0x0F]);
+                } else {
+                    out.put(static_cast<char>(byte));
+                }
+                break;
+        }
+    }
+    out.put('"');
+}
+
+void putJsonUtf8(Output& out, char const* text) { putJsonUtf8(out, text, std::strlen(text)); }
+
+// A JSON string of Latin-1 text, turned into UTF-8 on the way.
+void putJsonLatin1(Output& out, std::string const& text) {
+    bool const plain = std::all_of(text.begin(), text.end(), [](char c) {
+        auto const byte = static_cast<unsigned char>(c);
+        return byte >= 0x20 && byte < 0x80 && byte != '"' && byte != '\\';
+    });
+    if (plain) {
+        out.put('"');
+        out.put(text);
+        out.put('"');
+        return;
+    }
+    std::string const utf8 = latin1ToUtf8(text);
+    putJsonUtf8(out, utf8.data(), utf8.size());
+}
+
+// A double as JSON: the shortest digits that read back as the value, in
+// plain notation with ".0" for a whole number when the decimal point falls
+// within 15 digits of the start and no more than 4 zeros after the point,
+// else with an exponent of at least two digits ("1e+20", "1.5e-07");
+// anything not finite is null.
+void putJsonDouble(Output& out, double value) {
+    if (!std::isfinite(value)) {
+        out.literal("null");
+        return;
+    }
+    if (std::signbit(value)) {
+        out.put('-');
+        value = -value;
+    }
+    if (value == 0.0) {
+        out.literal("0.0");
+        return;
+    }
+    char scientific[40];
+    auto const result = std::to_chars(scientific, scientific + sizeof scientific, value,
+                                      std::chars_format::scientific);
+    // d[.ddd]e±XX: the digits, then the exponent of the first one.
+    char digits[24];
+    int count = 0;
+    char const* at = scientific;
+    for (; at != result.ptr && *at != 'e'; ++at) {
+        if (*at != '.') {
+            digits[count++] = *at;
+        }
+    }
+    int exponent = 0;
+    std::from_chars(at + 1 + (at[1] == '+' ? 1 : 0), result.ptr, exponent);
+    int const point = exponent + 1;  // digits before the decimal point
+    int const kMaxDigitsBeforePoint = 15;
+    int const kMinPoint = -4;
+    if (count <= point && point <= kMaxDigitsBeforePoint) {
+        out.put(digits, static_cast<std::size_t>(count));
+        for (int zeros = point - count; zeros > 0; --zeros) {
+            out.put('0');
+        }
+        out.literal(".0");
+    } else if (0 < point && point <= kMaxDigitsBeforePoint) {
+        out.put(digits, static_cast<std::size_t>(point));
+        out.put('.');
+        out.put(digits + point, static_cast<std::size_t>(count - point));
+    } else if (kMinPoint < point && point <= 0) {
+        out.literal("0.");
+        for (int zeros = -point; zeros > 0; --zeros) {
+            out.put('0');
+        }
+        out.put(digits, static_cast<std::size_t>(count));
+    } else {
+        out.put(digits[0]);
+        if (count > 1) {
+            out.put('.');
+            out.put(digits + 1, static_cast<std::size_t>(count - 1));
+        }
+        int const shown = point - 1;
+        out.put('e');
+        out.put(shown < 0 ? '-' : '+');
+        unsigned int const magnitude = static_cast<unsigned int>(shown < 0 ? -shown : shown);
+        if (magnitude < 10) {
+            out.put('0');
+        }
+        out.integer(magnitude);
+    }
+}
+
+// The value of a number as JSON; a version is an array of its two parts,
+// whose brackets go at the given indentation.
+void putJsonNumberValue(Output& out, IC::Number const& number, std::size_t indent) {
+    switch (number.getKind()) {
+        case IC::Number::BOOL:
+            if (number.getBool()) {
+                out.literal("true");
+            } else {
+                out.literal("false");
+            }
+            return;
+        case IC::Number::UNSIGNED:
+            out.integer(number.getUnsigned());
+            return;
+        case IC::Number::DOUBLE:
+            putJsonDouble(out, number.getDouble());
+            return;
+        case IC::Number::VERSION:
+            out.put('[');
+            out.newline(indent + 2);
+            out.integer(number.getVersion().getMajor());
+            out.put(',');
+            out.newline(indent + 2);
+            out.integer(number.getVersion().getMinor());
+            out.newline(indent);
+            out.put(']');
+            return;
+        case IC::Number::DATETIME:
+            out.integer(number.getDateTime());
+            return;
+        case IC::Number::NONE:
+            break;
+    }
+    out.literal("null");
+}
+
+// A number as an element of a value that is an array: {"kind", "value"}.
+void putJsonNumberElement(Output& out, IC::Number const& number) {
+    out.put('{');
+    out.newline(kElementKeyIndent);
+    out.literal("\"kind\": \"");
+    out.text(numberKindText(number));
+    out.literal("\",");
+    out.newline(kElementKeyIndent);
+    out.literal("\"value\": ");
+    putJsonNumberValue(out, number, kElementKeyIndent);
+    out.newline(kElementIndent);
+    out.put('}');
+}
+
+// A value that is an array: "[]", or each element on a line of its own.
+template <typename Element, typename PutElement>
+void putJsonArray(Output& out, std::vector<Element> const& elements, PutElement&& putElement) {
+    if (elements.empty()) {
+        out.literal("[]");
+        return;
+    }
+    out.put('[');
+    bool first = true;
+    for (Element const& element : elements) {
+        if (!first) {
+            out.put(',');
+        }
+        first = false;
+        out.newline(kElementIndent);
+        putElement(element);
+    }
+    out.newline(kPropertyKeyIndent);
+    out.put(']');
+}
+
+// The "value" of a property.
+void putJsonValue(Output& out, IC::PropertyValue const& value) {
+    switch (value.getKind()) {
+        case IC::PropertyValue::STRING:
+            putJsonLatin1(out, value.getString());
+            return;
+        case IC::PropertyValue::NUMBER:
+            putJsonNumberValue(out, value.getNumber(), kPropertyKeyIndent);
+            return;
+        case IC::PropertyValue::ENUM:
+            out.integer(value.getEnum().getValue());
+            return;
+        case IC::PropertyValue::BYTE:
+            out.integer(static_cast<unsigned int>(value.getByte()));
+            return;
+        case IC::PropertyValue::BYTES:
+            out.put('"');
+            for (unsigned char byte : value.getBytes()) {
+                out.hexByte(byte);
+            }
+            out.put('"');
+            return;
+        case IC::PropertyValue::NUMBERS:
+            putJsonArray(out, value.getNumbers(),
+                         [&out](IC::Number const& number) { putJsonNumberElement(out, number); });
+            return;
+        case IC::PropertyValue::STRINGS:
+            putJsonArray(out, value.getStrings(),
+                         [&out](std::string const& text) { putJsonLatin1(out, text); });
+            return;
+        case IC::PropertyValue::KIND:
+            out.integer(static_cast<unsigned int>(value.getKindValue()));
+            return;
+        case IC::PropertyValue::NONE:
+            break;
+    }
+    out.literal("null");
+}
+
+// "key": at a property's member indentation, after the line end of the
+// member before it.
+template <std::size_t N>
+void putJsonMemberKey(Output& out, char const (&key)[N]) {
+    out.put(',');
+    out.newline(kPropertyKeyIndent);
+    out.literal(key);
+}
+
+// One property: its id as the key, then kind, value, and the catalog's
+// name, unit and meaning where it has them.
+void putJsonProperty(Output& out, unsigned int type, unsigned int id,
+                     IC::PropertyValue const& value) {
+    out.put('"');
+    out.integer(id);
+    out.literal("\": {");
+    out.newline(kPropertyKeyIndent);
+    out.literal("\"kind\": \"");
+    out.text(valueKindText(value));
+    out.put('"');
+    putJsonMemberKey(out, "\"value\": ");
+    putJsonValue(out, value);
+    PropertyLabel const label = labelProperty(type, id, value);
+    if (*label.name != '\0') {
+        putJsonMemberKey(out, "\"name\": ");
+        putJsonUtf8(out, label.name);
+    }
+    if (label.unit != nullptr) {
+        putJsonMemberKey(out, "\"unit\": ");
+        putJsonUtf8(out, label.unit);
+    }
+    if (label.meaning != nullptr) {
+        putJsonMemberKey(out, "\"meaning\": ");
+        putJsonUtf8(out, label.meaning);
+    }
+    out.newline(kPropertyIndent);
+    out.put('}');
+}
+
+// "key": at a node's member indentation, on a line of its own.
+template <std::size_t N>
+void putJsonNodeKey(Output& out, char const (&key)[N]) {
+    out.newline(kNodeKeyIndent);
+    out.literal(key);
+}
+
+void putJsonNode(Output& out, IC::Node const& node) {
+    NodeFacts const facts = readFacts(node);
+    out.put('{');
+    putJsonNodeKey(out, "\"id\": ");
+    out.integer(facts.id);
+    out.put(',');
+    putJsonNodeKey(out, "\"linked\": ");
+    out.integer(facts.linked);
+    out.put(',');
+    putJsonNodeKey(out, "\"type\": ");
+    out.integer(facts.type);
+    out.put(',');
+    putJsonNodeKey(out, "\"index\": ");
+    out.integer(facts.index);
+    out.put(',');
+    putJsonNodeKey(out, "\"status\": ");
+    out.integer(facts.status);
+    out.put(',');
+    putJsonNodeKey(out, "\"description\": ");
+    putJsonLatin1(out, facts.description);
+    out.put(',');
+    if (!facts.path.empty()) {
+        putJsonNodeKey(out, "\"path\": ");
+        putJsonLatin1(out, facts.path);
+        out.put(',');
+    }
+    if (!facts.parent.empty()) {
+        putJsonNodeKey(out, "\"parent\": ");
+        putJsonLatin1(out, facts.parent);
+        out.put(',');
+    }
+    putJsonNodeKey(out, "\"properties\": ");
+    // The ids come in ascending numeric order.
+    bool first = true;
+    eachProperty(node, [&](unsigned int id, IC::PropertyValue const& value) {
+        out.put(first ? '{' : ',');
+        first = false;
+        out.newline(kPropertyIndent);
+        putJsonProperty(out, facts.type, id, value);
+        out.pass();
+    });
+    if (first) {
+        out.literal("{}");
+    } else {
+        out.newline(kNodeKeyIndent);
+        out.put('}');
+    }
+    out.newline(kNodeIndent);
+    out.put('}');
+}
+
+void writeJsonTo(std::vector<IC::Node*> const& nodes, Output& out) {
+    out.literal("{\n  \"nodes\": [");
+    bool first = true;
+    for (IC::Node const* node : nodes) {
+        if (node == nullptr) {
+            continue;
+        }
+        if (!first) {
+            out.put(',');
+        }
+        first = false;
+        out.newline(kNodeIndent);
+        putJsonNode(out, *node);
+        out.pass();
+    }
+    if (first) {
+        out.literal("]\n}\n");
+    } else {
+        out.literal("\n  ]\n}\n");
+    }
+    out.flush();
+}
+
+// ---- Tree ---------------------------------------------------------------------
+
+// Node type names by type, ascending.
+struct TypeName {
+    unsigned int type;
+    char const* name;
+};
+TypeName const kNodeTypeNames[] = {
+    {1, "chassis"},
+    {3, "firmware"},
+    {4, "processor"},
+    {13, "BMC"},
+    {15, "management interface"},
+    {19, "memory device"},
+    {21, "voltage sensor"},
+    {22, "temperature sensor"},
+    {31, "processor cache"},
+    {32, "memory array"},
+    {35, "system event log"},
+    {40, "computer system"},
+    {41, "planar"},
+    {42, "processor core"},
+    {50, "disk controller"},
+    {53, "diagnostics firmware"},
+    {55, "raw SMBIOS table"},
+    {59, "root"},
+    {62, "system slot"},
+    {70, "port connector"},
+};
+
+// The name of a node type, or nullptr.
+char const* typeName(unsigned int type) {
+    auto const found = std::lower_bound(
+        std::begin(kNodeTypeNames), std::end(kNodeTypeNames), type,
+        [](TypeName const& entry, unsigned int wanted) { return entry.type < wanted; });
+    return found != std::end(kNodeTypeNames) && found->type == type ? found->name : nullptr;
+}
+
+void putNodeLine(Output& out, NodeFacts const& facts, bool topLevel) {
+    putEscaped(out, facts.description, false);
+    out.literal("  [type ");
+    out.integer(facts.type);
+    if (char const* const name = typeName(facts.type)) {
+        out.put(' ');
+        out.text(name);
+    }
+    out.literal(", index ");
+    out.integer(facts.index);
+    out.literal(", id ");
+    out.integer(facts.id);
+    out.literal(", status ");
+    out.integer(facts.status);
+    if (topLevel && facts.linked != 0) {
+        // Linked to a node that is not in the list.
+        out.literal(", linked ");
+        out.integer(facts.linked);
+    }
+    if (!facts.path.empty()) {
+        out.literal(", path ");
+        putQuoted(out, facts.path);
+    }
+    if (!facts.parent.empty()) {
+        out.literal(", parent ");
+        putQuoted(out, facts.parent);
+    }
+    out.literal("]\n");
+}
+
+// One property line: id, name, value, unit and meaning.
+void putPropertyLine(Output& out, std::size_t indent, unsigned int type, unsigned int id,
+                     IC::PropertyValue const& value) {
+    PropertyLabel const label = labelProperty(type, id, value);
+    out.spaces(indent);
+    out.integer(id);
+    out.put(' ');
+    out.text(*label.name != '\0' ? label.name : valueKindText(value));
+    out.literal("  ");
+    putValue(out, value);
+    if (label.unit != nullptr) {
+        out.put(' ');
+        out.text(label.unit);
+    }
+    if (label.meaning != nullptr) {
+        out.literal(" (");
+        out.text(label.meaning);
+        out.put(')');
+    }
+    out.put('\n');
+}
+
+// One node's line and its property lines beneath it, indented by depth.
+void putTreeNode(Output& out, IC::Node const& node, std::size_t depth) {
+    NodeFacts const facts = readFacts(node);
+    out.spaces(2 * depth);
+    putNodeLine(out, facts, depth == 0);
+    std::size_t const indent = 2 * depth + 2;
+    eachProperty(node, [&](unsigned int id, IC::PropertyValue const& value) {
+        putPropertyLine(out, indent, facts.type, id, value);
+        out.pass();
+    });
+}
+
+// The node at `start` and everything below it that is not printed yet.
+void putSubtree(TreeShape const& shape, std::size_t start, std::vector<bool>& printed,
+                Output& out) {
+    // Depth first with an explicit stack; a node is printed once, which
+    // also ends any cycle of linked ids.
+    std::vector<std::pair<std::size_t, std::size_t>> stack;  // node, depth
+    stack.emplace_back(start, 0);
+    while (!stack.empty()) {
+        auto const [index, depth] = stack.back();
+        stack.pop_back();
+        if (printed[index]) {
+            continue;
+        }
+        printed[index] = true;
+        putTreeNode(out, *shape.list[index], depth);
+        out.pass();
+        auto const& below = shape.children[index];
+        for (auto child = below.rbegin(); child != below.rend(); ++child) {
+            if (!printed[*child]) {
+                stack.emplace_back(*child, depth + 1);
+            }
+        }
+    }
+}
+
+void writeTreeTo(std::vector<IC::Node*> const& nodes, Output& out) {
+    TreeShape const shape = treeShape(nodes);
+    std::vector<bool> printed(shape.list.size(), false);
+    for (std::size_t i = 0; i < shape.list.size(); ++i) {
+        if (shape.topLevel[i]) {
+            putSubtree(shape, i, printed, out);
+        }
+    }
+    // Nodes whose linked ids only lead round in a cycle start trees of
+    // their own.
+    for (std::size_t i = 0; i < shape.list.size(); ++i) {
+        if (!printed[i]) {
+            putSubtree(shape, i, printed, out);
+        }
+    }
+    out.flush();
+}
+
+}  // namespace
+
+std::string latin1ToUtf8(std::string const& text) {
+    std::string out;
+    out.reserve(text.size());
+    for (char c : text) {
+        auto byte = static_cast<unsigned char>(c);
+        if (byte < 0x80) {
+            out += c;
+        } else {
+            out += static_cast<char>(0xC0 | (byte >> 6));
+            out += static_cast<char>(0x80 | (byte & 0x3F));
+        }
+    }
+    return out;
+}
+
+std::string escapeText(std::string const& text, bool quoted) {
+    Output out(nullptr);
+    if (quoted) {
+        putQuoted(out, text);
+    } else {
+        putEscaped(out, text, false);
+    }
+    return out.take();
+}
+
+std::string nodeTypeName(unsigned int type) {
+    char const* const name = typeName(type);
+    return name != nullptr ? std::string(name) : std::string();
+}
+
+std::string nodeTypeLabel(unsigned int type) {
+    std::string label = "type " + std::to_string(type);
+    std::string name = nodeTypeName(type);
+    if (!name.empty()) {
+        label += " " + name;
+    }
+    return label;
+}
+
+std::string numberKindName(IC::Number const& number) { return numberKindText(number); }
+
+std::string valueKindName(IC::PropertyValue const& value) { return valueKindText(value); }
 
 std::string formatDateTime(std::int64_t seconds) {
     // Whole days since 1970-01-01 and the time of that day, then the civil
@@ -330,182 +983,65 @@ std::string formatDateTime(std::int64_t seconds) {
 }
 
 std::string formatValue(IC::PropertyValue const& value) {
-    switch (value.getKind()) {
-        case IC::PropertyValue::STRING:
-            return escapeText(value.getString(), true);
-        case IC::PropertyValue::NUMBER:
-            return formatNumber(value.getNumber());
-        case IC::PropertyValue::ENUM:
-            return std::to_string(value.getEnum().getValue());
-        case IC::PropertyValue::BYTE:
-            return std::to_string(static_cast<unsigned int>(value.getByte()));
-        case IC::PropertyValue::BYTES: {
-            std::string hex;
-            for (unsigned char byte : value.getBytes()) {
-                if (!hex.empty()) {
-                    hex += ' ';
-                }
-                appendHexByte(hex, byte);
-            }
-            return hex;
-        }
-        case IC::PropertyValue::NUMBERS: {
-            std::string list = "{";
-            for (IC::Number const& number : value.getNumbers()) {
-                if (list.size() > 1) {
-                    list += ", ";
-                }
-                list += formatNumber(number);
-            }
-            return list + "}";
-        }
-        case IC::PropertyValue::STRINGS: {
-            std::string list = "{";
-            bool first = true;
-            for (std::string const& text : value.getStrings()) {
-                if (!first) {
-                    list += ", ";
-                }
-                first = false;
-                list += escapeText(text, true);
-            }
-            return list + "}";
-        }
-        case IC::PropertyValue::KIND:
-            return std::to_string(static_cast<unsigned int>(value.getKindValue()));
-        case IC::PropertyValue::NONE:
-            break;
+    Output out(nullptr);
+    putValue(out, value);
+    return out.take();
+}
+
+PropertyLabel labelProperty(unsigned int nodeType, unsigned int id,
+                            IC::PropertyValue const& value) {
+    PropertyLabel label;
+    PropertyInfo const* const info = findProperty(nodeType, id);
+    if (info == nullptr) {
+        return label;
     }
-    return "(none)";
+    label.name = info->name;
+    std::int64_t number = 0;
+    bool const whole = wholeNumber(value, number);
+    bool const scalar = whole || (value.getKind() == IC::PropertyValue::NUMBER &&
+                                  value.getNumber().getKind() == IC::Number::DOUBLE);
+    if (scalar && *info->unit != '\0') {
+        label.unit = info->unit;
+    }
+    if (whole && number >= 0 && number <= std::numeric_limits<std::uint32_t>::max()) {
+        label.meaning = valueMeaning(*info, static_cast<std::uint32_t>(number));
+    }
+    return label;
+}
+
+void visitProperties(IC::Node const& node,
+                     std::function<void(unsigned int, IC::PropertyValue const&)> const& visit) {
+    eachProperty(node, visit);
 }
 
 std::vector<std::pair<unsigned int, IC::PropertyValue>> readProperties(IC::Node const& node) {
     std::vector<std::pair<unsigned int, IC::PropertyValue>> properties;
-    for (auto const& stored : node.getProperties()) {
-        IC::PropertyValue value;
-        IC::Error error = node.getProperty(stored.first, value);
-        // A node that lists an id but does not answer for it keeps the
-        // stored value.
-        properties.emplace_back(stored.first, error.getStatus() == 0 ? value : stored.second);
-    }
+    eachProperty(node, [&](unsigned int id, IC::PropertyValue const& value) {
+        properties.emplace_back(id, value);
+    });
     return properties;
 }
 
+void writeJson(std::vector<IC::Node*> const& nodes, TextSink const& sink) {
+    Output out(&sink);
+    writeJsonTo(nodes, out);
+}
+
 std::string renderJson(std::vector<IC::Node*> const& nodes) {
-    Json list = Json::array();
-    for (IC::Node const* node : nodes) {
-        if (node == nullptr) {
-            continue;
-        }
-        NodeFacts const facts = readFacts(*node);
-        Json entry;
-        entry["id"] = facts.id;
-        entry["linked"] = facts.linked;
-        entry["type"] = facts.type;
-        entry["index"] = facts.index;
-        entry["status"] = facts.status;
-        entry["description"] = latin1ToUtf8(facts.description);
-        if (!facts.path.empty()) {
-            entry["path"] = latin1ToUtf8(facts.path);
-        }
-        if (!facts.parent.empty()) {
-            entry["parent"] = latin1ToUtf8(facts.parent);
-        }
-        // The ids come in ascending numeric order and the ordered object
-        // keeps them in that order.
-        Json properties = Json::object();
-        for (auto const& property : readProperties(*node)) {
-            properties[std::to_string(property.first)] = valueJson(property.second);
-        }
-        entry["properties"] = std::move(properties);
-        list.push_back(std::move(entry));
-    }
-    Json document;
-    document["nodes"] = std::move(list);
-    return document.dump(2) + "\n";
+    Output out(nullptr);
+    writeJsonTo(nodes, out);
+    return out.take();
 }
 
-TreeShape treeShape(std::vector<IC::Node*> const& nodes) {
-    TreeShape shape;
-    for (IC::Node const* node : nodes) {
-        if (node != nullptr) {
-            shape.list.push_back(node);
-        }
-    }
-    // The first node with an id is the one its linked nodes hang under.
-    std::map<unsigned int, size_t> byId;
-    for (size_t i = 0; i < shape.list.size(); ++i) {
-        byId.emplace(shape.list[i]->getNodeId(), i);
-    }
-    shape.children.resize(shape.list.size());
-    shape.topLevel.assign(shape.list.size(), false);
-    for (size_t i = 0; i < shape.list.size(); ++i) {
-        auto parent = byId.find(shape.list[i]->getLinkedId());
-        if (parent == byId.end()) {
-            shape.topLevel[i] = true;
-        } else {
-            shape.children[parent->second].push_back(i);
-        }
-    }
-    return shape;
+void writeTree(std::vector<IC::Node*> const& nodes, TextSink const& sink) {
+    Output out(&sink);
+    writeTreeTo(nodes, out);
 }
-
-namespace {
-
-// One node's line and its property lines beneath it, indented by depth.
-void printNode(IC::Node const& node, size_t depth, std::string& out) {
-    NodeFacts const facts = readFacts(node);
-    std::string const indent(2 * depth, ' ');
-    out += indent + nodeLine(facts, depth == 0) + "\n";
-    for (auto const& property : readProperties(node)) {
-        out += indent + "  " + std::to_string(property.first) + " " +
-               valueKindName(property.second) + "  " + formatValue(property.second) + "\n";
-    }
-}
-
-// The node at `start` and everything below it that is not printed yet.
-void printSubtree(TreeShape const& shape, size_t start, std::vector<bool>& printed,
-                  std::string& out) {
-    // Depth first with an explicit stack; a node is printed once, which
-    // also ends any cycle of linked ids.
-    std::vector<std::pair<size_t, size_t>> stack;  // node, depth
-    stack.emplace_back(start, 0);
-    while (!stack.empty()) {
-        auto const [index, depth] = stack.back();
-        stack.pop_back();
-        if (printed[index]) {
-            continue;
-        }
-        printed[index] = true;
-        printNode(*shape.list[index], depth, out);
-        auto const& below = shape.children[index];
-        for (auto child = below.rbegin(); child != below.rend(); ++child) {
-            if (!printed[*child]) {
-                stack.emplace_back(*child, depth + 1);
-            }
-        }
-    }
-}
-
-}  // namespace
 
 std::string renderTree(std::vector<IC::Node*> const& nodes) {
-    TreeShape const shape = treeShape(nodes);
-    std::string out;
-    std::vector<bool> printed(shape.list.size(), false);
-    for (size_t i = 0; i < shape.list.size(); ++i) {
-        if (shape.topLevel[i]) {
-            printSubtree(shape, i, printed, out);
-        }
-    }
-    // Nodes whose linked ids only lead round in a cycle start trees of
-    // their own.
-    for (size_t i = 0; i < shape.list.size(); ++i) {
-        if (!printed[i]) {
-            printSubtree(shape, i, printed, out);
-        }
-    }
-    return out;
+    Output out(nullptr);
+    writeTreeTo(nodes, out);
+    return out.take();
 }
 
 }  // namespace inventory

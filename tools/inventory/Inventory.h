@@ -1,11 +1,13 @@
 // Rendering of the inventory tree that a management interface builds: the
 // JSON document and the indented text tree that smbios-inventory prints.
-// Every property value is read through the node's getProperty, because some
-// nodes compute values when they are read.
+// Both are written as a stream, node after node, straight from each node's
+// properties; every property carries its name, unit and the meaning of its
+// value from the catalog (PropertyNames.h) where the catalog knows them.
 #pragma once
 
 #include <cstddef>
 #include <cstdint>
+#include <functional>
 #include <string>
 #include <vector>
 
@@ -72,19 +74,46 @@ std::string numberKindName(IC::Number const& number);
 // Seconds since the epoch as "YYYY-MM-DD HH:MM:SS" (UTC).
 std::string formatDateTime(std::int64_t seconds);
 
-// The value as the tree shows it after its kind name.
+// The value as the tree shows it after the property's name.
 std::string formatValue(IC::PropertyValue const& value);
 
-// The properties of a node, ids ascending, each value read through the
-// node's getProperty.
+// What the catalog says about one property value: its name ("" when the
+// catalog does not know the property), its unit and the meaning of the
+// value (nullptr when there is none, or when the value is not a number that
+// a unit or a meaning applies to).
+struct PropertyLabel {
+    char const* name = "";
+    char const* unit = nullptr;
+    char const* meaning = nullptr;
+};
+PropertyLabel labelProperty(unsigned int nodeType, unsigned int id, IC::PropertyValue const& value);
+
+// Calls visit(id, value) for every property of the node, ids ascending.
+// The values are read where they are kept, without a copy: an ordinary
+// node's from its stored properties; a node of a class of its own (one that
+// may compute values when they are read, as the computer system does for
+// its time) answers through getProperty for each id it lists, and a stored
+// value stands where it does not answer.
+void visitProperties(IC::Node const& node,
+                     std::function<void(unsigned int, IC::PropertyValue const&)> const& visit);
+
+// The properties of a node, ids ascending, as visitProperties gives them,
+// copied.
 std::vector<std::pair<unsigned int, IC::PropertyValue>> readProperties(IC::Node const& node);
 
-// The whole node list as one JSON document, 2-space indentation, with a final
-// newline.
+// Receives rendered text in pieces, in order.
+using TextSink = std::function<void(char const* data, std::size_t size)>;
+
+// The whole node list as one JSON document, 2-space indentation, with a
+// final newline. Each property is an object of "kind" and "value", then
+// "name", "unit" and "meaning" where the catalog gives them.
+void writeJson(std::vector<IC::Node*> const& nodes, TextSink const& sink);
 std::string renderJson(std::vector<IC::Node*> const& nodes);
 
 // The node list as an indented tree by linked id, one line a node and one
-// line a property beneath it.
+// line a property beneath it: id, name (the value's kind when the catalog
+// has no name), value, unit and meaning.
+void writeTree(std::vector<IC::Node*> const& nodes, TextSink const& sink);
 std::string renderTree(std::vector<IC::Node*> const& nodes);
 
 }  // namespace inventory

@@ -16,10 +16,11 @@ public:
     PrivateDataDir& operator=(PrivateDataDir const&) = delete;
     ~PrivateDataDir();
 
-    // Makes the folder under $TMPDIR (or /tmp) and writes content as its
-    // override file, with the end signals held meanwhile; from then on an
-    // end signal removes the folder before it ends the process. Returns
-    // false and sets why when it cannot.
+    // Makes the folder under $TMPDIR, or when that is not set in memory
+    // (/dev/shm) and else under /tmp, and writes content as its override
+    // file, with the end signals held meanwhile; from then on an end signal
+    // removes the folder before it ends the process. Returns false and sets
+    // why when it cannot.
     bool create(std::string const& content, std::string& why);
 
     // The folder, with a trailing slash, as the data directory is named.
@@ -27,6 +28,12 @@ public:
     std::string const& overrideFile() const { return overrideFile_; }
 
 private:
+    // The folder and its file in base; false and why when they cannot be
+    // made (what was made stays for removeFolder).
+    bool createIn(std::string const& base, std::string const& content, std::string& why);
+    // Removes what createIn made.
+    void removeFolder();
+
     std::string path_;
     std::string overrideFile_;
 };
