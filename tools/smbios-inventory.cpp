@@ -48,15 +48,18 @@ namespace {
 char const kProgram[] = "smbios-inventory";
 char const kPluginName[] = "libsmbiosmi.so";
 
-// The SMBIOS probe location codes by name, for --sensors.
+// The SMBIOS probe location codes by name, for --sensors: the low five bits
+// of a probe's Location and Status byte.
 struct NamedLocation {
     char const* name;
     unsigned int code;
 };
 NamedLocation const kLocations[] = {
-    {"motherboard", 2},   {"processor", 3},        {"disk", 4},          {"peripheral-bay", 5},
-    {"memory-module", 7}, {"processor-module", 8}, {"power-unit", 9},    {"add-in-card", 10},
-    {"front-panel", 11},  {"back-panel", 12},      {"power-system", 13}, {"drive-back-plane", 14},
+    {"other", 1},       {"unknown", 2},        {"processor", 3},
+    {"disk", 4},        {"peripheral-bay", 5}, {"system-management-module", 6},
+    {"motherboard", 7}, {"memory-module", 8},  {"processor-module", 9},
+    {"power-unit", 10}, {"add-in-card", 11},   {"front-panel", 12},
+    {"back-panel", 13}, {"power-system", 14},  {"drive-back-plane", 15},
 };
 unsigned int const kLastLocation = 31;
 

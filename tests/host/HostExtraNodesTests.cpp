@@ -4,6 +4,7 @@
 // the override file made from the same image.
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cstdint>
 #include <filesystem>
 #include <string>
@@ -13,6 +14,7 @@
 #include "HostRunner.h"
 #include "InventoryJson.h"
 #include "PluginRead.h"
+#include "TableBuilder.h"
 #include "TestSupport.h"
 
 namespace {
@@ -323,3 +325,47 @@ TEST_F(HostExtraNodes, FromBinGivesTheSameJsonAsDumpOfItsOverrideFileForEveryCor
 }
 
 }  // namespace
+
+// Each name --sensors takes stands for the SMBIOS location code of the same
+// name (the low five bits of a probe's Location and Status byte): a table
+// with one voltage probe at every code from 1 to 15, each named after its
+// code, gives each location name the one probe of its code.
+TEST_F(HostExtraNodes, SensorLocationNamesAreTheSmbiosLocationCodes) {
+    smbiostest::TableBuilder table;
+    for (uint8_t code = 1; code <= 15; ++code) {
+        table.add(smbiostest::Structure(26, code)
+                      .str("probe " + std::to_string(code))
+                      .byte(static_cast<uint8_t>((3 << 5) | code))  // status OK
+                      .word(1500)
+                      .word(900)
+                      .word(10)
+                      .word(50)
+                      .word(100)
+                      .dword(0)
+                      .word(1200));
+    }
+    table.endOfTable(0x100);
+    std::vector<uint8_t> const bytes = table.build();
+    std::vector<uint8_t> file(0x20, 0);
+    std::vector<uint8_t> const entry =
+        smbiostest::sm3EntryPoint(3, 2, 0, static_cast<uint32_t>(bytes.size()), 0x20);
+    std::copy(entry.begin(), entry.end(), file.begin());
+    file.insert(file.end(), bytes.begin(), bytes.end());
+    smbiostest::TempDir scratch;
+    std::string const bin = scratch.file("probes.bin");
+    smbiostest::writeFile(bin, file);
+    std::pair<char const*, unsigned int> const names[] = {
+        {"other", 1},       {"unknown", 2},        {"processor", 3},
+        {"disk", 4},        {"peripheral-bay", 5}, {"system-management-module", 6},
+        {"motherboard", 7}, {"memory-module", 8},  {"processor-module", 9},
+        {"power-unit", 10}, {"add-in-card", 11},   {"front-panel", 12},
+        {"back-panel", 13}, {"power-system", 14},  {"drive-back-plane", 15},
+    };
+    for (auto const& name : names) {
+        SCOPED_TRACE(name.first);
+        ASSERT_NO_FATAL_FAILURE(runJson({"--from-bin", bin, "--sensors", name.first}));
+        std::vector<Json> const sensors = hosttest::nodesOfType(doc_, kVoltageType);
+        ASSERT_EQ(sensors.size(), 1u);
+        EXPECT_EQ(sensors[0]["description"], "probe " + std::to_string(name.second));
+    }
+}
