@@ -426,18 +426,8 @@ std::string renderHtml(std::vector<IC::Node*> const& nodes) {
 
     TreeShape const shape = treeShape(nodes);
     std::vector<bool> written(shape.list.size(), false);
-    for (std::size_t i = 0; i < shape.list.size(); ++i) {
-        if (shape.topLevel[i]) {
-            writeSubtree(shape, i, written, out);
-        }
-    }
-    // Nodes whose linked ids only lead round in a cycle start trees of
-    // their own.
-    for (std::size_t i = 0; i < shape.list.size(); ++i) {
-        if (!written[i]) {
-            writeSubtree(shape, i, written, out);
-        }
-    }
+    writeTrees(shape, written,
+               [&](std::size_t start) { writeSubtree(shape, start, written, out); });
     out += "</div>\n</section>\n<script>";
     out += kScript;
     out += "</script>\n</body>\n</html>\n";

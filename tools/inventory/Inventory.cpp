@@ -183,26 +183,6 @@ void eachProperty(IC::Node const& node, Visit&& visit) {
 
 // ---- Text of values -------------------------------------------------------------
 
-std::string formatDouble(double value) {
-    // The shortest text that reads back as the same value, without an
-    // exponent when one of up to 17 digits does (40 rather than 4e+01).
-    std::string shortest;
-    char buffer[64];
-    for (int precision = 1; precision <= 17; ++precision) {
-        std::snprintf(buffer, sizeof buffer, "%.*g", precision, value);
-        if (std::strtod(buffer, nullptr) != value) {
-            continue;
-        }
-        if (std::strchr(buffer, 'e') == nullptr) {
-            return buffer;
-        }
-        if (shortest.empty()) {
-            shortest = buffer;
-        }
-    }
-    return shortest.empty() ? std::string(buffer) : shortest;
-}
-
 // The text on one line: control characters as \xNN, a backslash (and a
 // double quote when the text goes between quotes) behind a backslash,
 // Latin-1 letters in UTF-8.
@@ -411,37 +391,21 @@ void putJsonUtf8(Output& out, char const* text, std::size_t size) {
     out.put('"');
     for (std::size_t i = 0; i < size; ++i) {
         auto const byte = static_cast<unsigned char>(text[i]);
-        switch (byte) {
-            case '"':
-                out.literal("\\\"");
-                break;
-            case '\\':
-                out.literal("\\\\");
-                break;
-            case '\b':
-                out.literal("\\b");
-                break;
-            case '\f':
-                out.literal("\\f");
-                break;
-            case '\n':
-                out.literal("\\n");
-                break;
-            case '\r':
-                out.literal("\\r");
-                break;
-            case '\t':
-                out.literal("\\t");
-                break;
-            default:
-                if (byte < 0x20) {
-                    out.literal("\\u00");
-                    out.put(kLowerHex[byte >> 4]);
-                    out.put(kLowerHex[byte & 0x0F]);
-                } else {
-                    out.put(static_cast<char>(byte));
-                }
-                break;
+        if (byte >= 0x20 && byte != '"' && byte != '\\') {
+            out.put(static_cast<char>(byte));
+            continue;
+        }
+        // The two-character escapes JSON has, else \u00XX.
+        static char const kEscaped[] = "\"\\\b\f\n\r\t";
+        static char const kLetters[] = "\"\\bfnrt";
+        char const* const known = byte != 0 ? std::strchr(kEscaped, byte) : nullptr;
+        out.put('\\');
+        if (known != nullptr) {
+            out.put(kLetters[known - kEscaped]);
+        } else {
+            out.literal("u00");
+            out.put(kLowerHex[byte >> 4]);
+            out.put(kLowerHex[byte & 0x0F]);
         }
     }
     out.put('"');
@@ -893,22 +857,31 @@ void putSubtree(TreeShape const& shape, std::size_t start, std::vector<bool>& pr
 void writeTreeTo(std::vector<IC::Node*> const& nodes, Output& out) {
     TreeShape const shape = treeShape(nodes);
     std::vector<bool> printed(shape.list.size(), false);
-    for (std::size_t i = 0; i < shape.list.size(); ++i) {
-        if (shape.topLevel[i]) {
-            putSubtree(shape, i, printed, out);
-        }
-    }
-    // Nodes whose linked ids only lead round in a cycle start trees of
-    // their own.
-    for (std::size_t i = 0; i < shape.list.size(); ++i) {
-        if (!printed[i]) {
-            putSubtree(shape, i, printed, out);
-        }
-    }
+    writeTrees(shape, printed, [&](std::size_t start) { putSubtree(shape, start, printed, out); });
     out.flush();
 }
 
 }  // namespace
+
+std::string formatDouble(double value) {
+    // The shortest text that reads back as the same value, without an
+    // exponent when one of up to 17 digits does (40 rather than 4e+01).
+    std::string shortest;
+    char buffer[64];
+    for (int precision = 1; precision <= 17; ++precision) {
+        std::snprintf(buffer, sizeof buffer, "%.*g", precision, value);
+        if (std::strtod(buffer, nullptr) != value) {
+            continue;
+        }
+        if (std::strchr(buffer, 'e') == nullptr) {
+            return buffer;
+        }
+        if (shortest.empty()) {
+            shortest = buffer;
+        }
+    }
+    return shortest.empty() ? std::string(buffer) : shortest;
+}
 
 std::string latin1ToUtf8(std::string const& text) {
     std::string out;

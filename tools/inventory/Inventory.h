@@ -45,6 +45,29 @@ struct TreeShape {
 // the first node of the list whose id is its linked id.
 TreeShape treeShape(std::vector<IC::Node*> const& nodes);
 
+// Writes the whole shape, tree by tree: writeSubtree(start) for each node
+// that starts a tree, then for each node still not written (nodes whose
+// linked ids only lead round in a cycle start trees of their own), in list
+// order. writeSubtree marks in written what it wrote.
+template <typename WriteSubtree>
+void writeTrees(TreeShape const& shape, std::vector<bool>& written, WriteSubtree writeSubtree) {
+    for (std::size_t i = 0; i < shape.list.size(); ++i) {
+        if (shape.topLevel[i]) {
+            writeSubtree(i);
+        }
+    }
+    for (std::size_t i = 0; i < shape.list.size(); ++i) {
+        if (!written[i]) {
+            writeSubtree(i);
+        }
+    }
+}
+
+// The shortest text that reads back as the same double, without an
+// exponent when one of up to 17 digits does (40 rather than 4e+01), as the
+// tree writes it.
+std::string formatDouble(double value);
+
 // Treats every byte of the text as a Latin-1 character and returns the text
 // as UTF-8 (bytes below 0x80 stay as they are).
 std::string latin1ToUtf8(std::string const& text);

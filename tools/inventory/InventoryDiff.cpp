@@ -162,27 +162,6 @@ std::string showText(std::string const& utf8, bool quoted) {
     return quoted ? out + "\"" : out;
 }
 
-// The shortest text that reads back as the same double, without an
-// exponent when one of up to 17 digits does (40 rather than 4e+01), as the
-// tree writes it.
-std::string showDouble(double value) {
-    std::string shortest;
-    char buffer[64];
-    for (int precision = 1; precision <= 17; ++precision) {
-        std::snprintf(buffer, sizeof buffer, "%.*g", precision, value);
-        if (std::strtod(buffer, nullptr) != value) {
-            continue;
-        }
-        if (std::strchr(buffer, 'e') == nullptr) {
-            return buffer;
-        }
-        if (shortest.empty()) {
-            shortest = buffer;
-        }
-    }
-    return shortest.empty() ? std::string(buffer) : shortest;
-}
-
 // Upper-case hex of two digits a byte, as the document holds bytes, with a
 // blank between the bytes as the tree shows them.
 std::string spacedHex(std::string const& hex) {
@@ -225,7 +204,7 @@ std::string showValue(std::string const& kind, DiffJson const& value) {
         return showText(value.get<std::string>(), true);
     }
     if (kind == "double" && value.is_number()) {
-        return showDouble(value.get<double>());
+        return formatDouble(value.get<double>());
     }
     if (kind == "version" && value.is_array() && value.size() == 2 && value[0].is_number() &&
         value[1].is_number()) {
