@@ -2,6 +2,7 @@
 
 #include <string>
 
+#include "format/EntryPoint.h"
 #include "smbios/Logging.h"
 #include "smbios/SmBiosInitializer.h"
 
@@ -108,33 +109,31 @@ unsigned char SmBios::Table::getByte(unsigned char off) const {
     return data_[off];
 }
 
-unsigned short SmBios::Table::getWord(unsigned char off) const {
-    if (off + 2u > length_ || off + 2u > data_.size()) {
+namespace {
+
+// Throws std::out_of_range unless the `width` bytes at off lie inside both
+// the formatted area (length) and the bytes held.
+void checkField(unsigned char off, unsigned int width, unsigned int length, std::size_t held) {
+    if (off + width > length || off + width > held) {
         throw std::out_of_range("");
     }
-    return static_cast<unsigned short>(data_[off] | (data_[off + 1] << 8));
+}
+
+}  // namespace
+
+unsigned short SmBios::Table::getWord(unsigned char off) const {
+    checkField(off, 2, length_, data_.size());
+    return smbiosformat::getWord(data_, off);
 }
 
 std::uint32_t SmBios::Table::getDWord(unsigned char off) const {
-    if (off + 4u > length_ || off + 4u > data_.size()) {
-        throw std::out_of_range("");
-    }
-    std::uint32_t value = 0;
-    for (unsigned int i = 4; i-- > 0;) {
-        value = (value << 8) | data_[off + i];
-    }
-    return value;
+    checkField(off, 4, length_, data_.size());
+    return smbiosformat::getDword(data_, off);
 }
 
 std::uint64_t SmBios::Table::getQWord(unsigned char off) const {
-    if (off + 8u > length_ || off + 8u > data_.size()) {
-        throw std::out_of_range("");
-    }
-    std::uint64_t value = 0;
-    for (unsigned int i = 8; i-- > 0;) {
-        value = (value << 8) | data_[off + i];
-    }
-    return value;
+    checkField(off, 8, length_, data_.size());
+    return smbiosformat::getQword(data_, off);
 }
 
 unsigned char SmBios::Table::getByteUnprot(unsigned int off) const {

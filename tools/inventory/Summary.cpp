@@ -309,6 +309,16 @@ std::string formatKb(std::uint64_t kb) {
     return std::to_string(kb) + " KB";
 }
 
+// The list, or one empty entry in its place: the summary shows the lines of
+// a missing system, chassis or BIOS with "unknown" values.
+template <typename Facts>
+std::vector<Facts> orOneUnknown(std::vector<Facts> list) {
+    if (list.empty()) {
+        list.emplace_back();
+    }
+    return list;
+}
+
 std::vector<std::pair<std::string, std::string>> summaryLines(SummaryFacts const& facts) {
     std::vector<std::pair<std::string, std::string>> lines;
     std::string version = kUnknown;
@@ -320,28 +330,17 @@ std::vector<std::pair<std::string, std::string>> summaryLines(SummaryFacts const
     }
     lines.emplace_back("SMBIOS version", version);
 
-    std::vector<SystemFacts> systems = facts.systems;
-    if (systems.empty()) {
-        systems.emplace_back();
-    }
-    for (SystemFacts const& system : systems) {
+    for (SystemFacts const& system : orOneUnknown(facts.systems)) {
         lines.emplace_back("Manufacturer", orUnknown(system.manufacturer));
         lines.emplace_back("Product", orUnknown(system.product));
         lines.emplace_back("Serial number", orUnknown(system.serialNumber));
         lines.emplace_back("UUID", orUnknown(system.uuid));
     }
-    if (facts.chassisTypes.empty()) {
-        lines.emplace_back("Chassis type", kUnknown);
-    }
-    for (std::string const& chassis : facts.chassisTypes) {
+    for (std::string const& chassis : orOneUnknown(facts.chassisTypes)) {
         lines.emplace_back("Chassis type", orUnknown(chassis));
     }
 
-    std::vector<BiosFacts> bios = facts.bios;
-    if (bios.empty()) {
-        bios.emplace_back();
-    }
-    for (BiosFacts const& image : bios) {
+    for (BiosFacts const& image : orOneUnknown(facts.bios)) {
         lines.emplace_back("BIOS vendor", orUnknown(image.vendor));
         lines.emplace_back("BIOS version", orUnknown(image.version));
         lines.emplace_back("BIOS date", orUnknown(image.date));
