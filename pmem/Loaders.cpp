@@ -146,6 +146,22 @@ bool presentSm3(std::vector<unsigned char> const& entryPoint,
     return true;
 }
 
+// Presents a 2.x entry point whose 32-bit table address stands at
+// addressOffset: as it is when its table can be served at the address it
+// states (false), otherwise with out.address written in its place (true:
+// the caller sets the checksums again).
+bool movesTable(std::vector<unsigned char> const& entryPoint,
+                std::vector<unsigned char> const& table, size_t addressOffset, Presentation& out) {
+    out.entryPoint = entryPoint;
+    uint32_t const stated = smbiosformat::getDword(entryPoint, addressOffset);
+    if (canServeAt(stated, table.size(), kLastAddress, entryPoint.size())) {
+        out.address = static_cast<unsigned long>(stated);
+        return false;
+    }
+    smbiosformat::putDword(out.entryPoint, addressOffset, static_cast<uint32_t>(out.address));
+    return true;
+}
+
 // "_SM_": 0x05 length, 0x15 intermediate checksum over 0x10-0x1E, 0x18 the
 // 32-bit table address. The kernel copies 30 to 32 bytes. Presented as it
 // is, amended when its table must move. False when it is short.
@@ -154,12 +170,7 @@ bool presentSm(std::vector<unsigned char> const& entryPoint,
     if (entryPoint.size() < 0x1E) {
         return false;
     }
-    out.entryPoint = entryPoint;
-    uint32_t const stated = smbiosformat::getDword(entryPoint, 0x18);
-    if (canServeAt(stated, table.size(), kLastAddress, entryPoint.size())) {
-        out.address = static_cast<unsigned long>(stated);
-    } else {
-        smbiosformat::putDword(out.entryPoint, 0x18, static_cast<uint32_t>(out.address));
+    if (movesTable(entryPoint, table, 0x18, out)) {
         setChecksum(out.entryPoint, 0x15, 0x10, 0x1F);
         setChecksum(out.entryPoint, 0x04, 0, out.entryPoint[5]);
     }
@@ -173,12 +184,7 @@ bool presentDmi(std::vector<unsigned char> const& entryPoint,
     if (entryPoint.size() < smbiosformat::DMI_ENTRY_POINT_SIZE) {
         return false;
     }
-    out.entryPoint = entryPoint;
-    uint32_t const stated = smbiosformat::getDword(entryPoint, 0x08);
-    if (canServeAt(stated, table.size(), kLastAddress, entryPoint.size())) {
-        out.address = static_cast<unsigned long>(stated);
-    } else {
-        smbiosformat::putDword(out.entryPoint, 0x08, static_cast<uint32_t>(out.address));
+    if (movesTable(entryPoint, table, 0x08, out)) {
         setChecksum(out.entryPoint, 0x05, 0, smbiosformat::DMI_ENTRY_POINT_SIZE);
     }
     return true;

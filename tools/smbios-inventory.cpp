@@ -274,13 +274,19 @@ void addOptions(CLI::App& app, Options& options) {
                    "Append log messages to this file instead of standard error")
         ->type_name("FILE")
         ->check(logFileValidator());
-    app.add_option("--log-level", options.logLevel, "Log threshold: a decimal number or \"off\"")
-        ->type_name("N")
-        ->check(levelValidator());
-    app.add_option("--trace-level", options.traceLevel,
-                   "Trace threshold: a decimal number or \"off\"")
-        ->type_name("N")
-        ->check(levelValidator());
+    struct Threshold {
+        char const* option;
+        std::string* value;
+        char const* help;
+    };
+    for (Threshold const& threshold :
+         {Threshold{"--log-level", &options.logLevel, "Log threshold: a decimal number or \"off\""},
+          Threshold{"--trace-level", &options.traceLevel,
+                    "Trace threshold: a decimal number or \"off\""}}) {
+        app.add_option(threshold.option, *threshold.value, threshold.help)
+            ->type_name("N")
+            ->check(levelValidator());
+    }
     app.add_option("--sensors", options.sensorLocations,
                    "Also make the temperature and voltage sensor nodes of the probes at this "
                    "location (repeatable): a code from 0 to 31 or one of " +

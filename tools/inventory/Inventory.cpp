@@ -240,6 +240,19 @@ void putNumber(Output& out, IC::Number const& number) {
     out.literal("(none)");
 }
 
+// Each item put by putItem, separator between two.
+template <typename Items, typename PutItem, std::size_t N>
+void putEach(Output& out, Items const& items, char const (&separator)[N], PutItem putItem) {
+    bool first = true;
+    for (auto const& item : items) {
+        if (!first) {
+            out.literal(separator);
+        }
+        first = false;
+        putItem(item);
+    }
+}
+
 // The value as the tree shows it.
 void putValue(Output& out, IC::PropertyValue const& value) {
     switch (value.getKind()) {
@@ -255,43 +268,21 @@ void putValue(Output& out, IC::PropertyValue const& value) {
         case IC::PropertyValue::BYTE:
             out.integer(static_cast<unsigned int>(value.getByte()));
             return;
-        case IC::PropertyValue::BYTES: {
-            bool first = true;
-            for (unsigned char byte : value.getBytes()) {
-                if (!first) {
-                    out.put(' ');
-                }
-                first = false;
-                out.hexByte(byte);
-            }
+        case IC::PropertyValue::BYTES:
+            putEach(out, value.getBytes(), " ", [&out](unsigned char byte) { out.hexByte(byte); });
             return;
-        }
-        case IC::PropertyValue::NUMBERS: {
+        case IC::PropertyValue::NUMBERS:
             out.put('{');
-            bool first = true;
-            for (IC::Number const& number : value.getNumbers()) {
-                if (!first) {
-                    out.literal(", ");
-                }
-                first = false;
-                putNumber(out, number);
-            }
+            putEach(out, value.getNumbers(), ", ",
+                    [&out](IC::Number const& number) { putNumber(out, number); });
             out.put('}');
             return;
-        }
-        case IC::PropertyValue::STRINGS: {
+        case IC::PropertyValue::STRINGS:
             out.put('{');
-            bool first = true;
-            for (std::string const& text : value.getStrings()) {
-                if (!first) {
-                    out.literal(", ");
-                }
-                first = false;
-                putQuoted(out, text);
-            }
+            putEach(out, value.getStrings(), ", ",
+                    [&out](std::string const& text) { putQuoted(out, text); });
             out.put('}');
             return;
-        }
         case IC::PropertyValue::KIND:
             out.integer(static_cast<unsigned int>(value.getKindValue()));
             return;
