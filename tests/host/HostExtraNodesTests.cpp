@@ -345,15 +345,9 @@ TEST_F(HostExtraNodes, SensorLocationNamesAreTheSmbiosLocationCodes) {
                       .word(1200));
     }
     table.endOfTable(0x100);
-    std::vector<uint8_t> const bytes = table.build();
-    std::vector<uint8_t> file(0x20, 0);
-    std::vector<uint8_t> const entry =
-        smbiostest::sm3EntryPoint(3, 2, 0, static_cast<uint32_t>(bytes.size()), 0x20);
-    std::copy(entry.begin(), entry.end(), file.begin());
-    file.insert(file.end(), bytes.begin(), bytes.end());
     smbiostest::TempDir scratch;
     std::string const bin = scratch.file("probes.bin");
-    smbiostest::writeFile(bin, file);
+    smbiostest::writeFile(bin, smbiostest::sm3DumpBin(table.build()));
     std::pair<char const*, unsigned int> const names[] = {
         {"other", 1},       {"unknown", 2},        {"processor", 3},
         {"disk", 4},        {"peripheral-bay", 5}, {"system-management-module", 6},

@@ -236,28 +236,13 @@ TEST(HostOnThisMachine, PluginLogIsWrittenOnlyWhenAsked) {
         << "the log never changes the inventory";
 }
 
-namespace {
-
-// A dmidecode --dump-bin image of a 3.x table: the "_SM3_" entry point at 0
-// naming the table at 0x20.
-std::vector<uint8_t> dumpBin3(std::vector<uint8_t> const& table) {
-    std::vector<uint8_t> file(0x20 + table.size(), 0);
-    std::vector<uint8_t> const ep =
-        smbiostest::sm3EntryPoint(3, 2, 0, static_cast<uint32_t>(table.size()), 0x20);
-    std::copy(ep.begin(), ep.end(), file.begin());
-    std::copy(table.begin(), table.end(), file.begin() + 0x20);
-    return file;
-}
-
-}  // namespace
-
 // --from-bin of a large 3.x table takes the structures of its first 65535
 // bytes and names the file in the warning.
 TEST(HostOnThisMachine, FromBinOfALargeTableIsReadUpTo65535BytesWithOneWarning) {
     Machine machine;
     LargeTable const large(1100);
     std::string const bin = machine.scratch().file("large.bin");
-    smbiostest::writeFile(bin, dumpBin3(large.bytes));
+    smbiostest::writeFile(bin, smbiostest::sm3DumpBin(large.bytes));
     hosttest::RunResult const run =
         hosttest::runHost({"--from-bin", bin, "--format", "json"}, machine.env());
     ASSERT_EQ(run.exitStatus, 0) << hosttest::describe(run);
@@ -269,7 +254,7 @@ TEST(DumpOnThisMachine, FromBinOfALargeTableIsCapturedUpTo65535BytesWithOneWarni
     Machine machine;
     LargeTable const large(1100);
     std::string const bin = machine.scratch().file("large.bin");
-    smbiostest::writeFile(bin, dumpBin3(large.bytes));
+    smbiostest::writeFile(bin, smbiostest::sm3DumpBin(large.bytes));
     std::string const out = machine.scratch().file("smbios.txt");
     hosttest::RunResult const run =
         hosttest::runProgram(dumpToolPath(), {"--from-bin", bin, "-o", out}, machine.env());

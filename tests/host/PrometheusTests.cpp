@@ -311,17 +311,6 @@ std::vector<uint8_t> randomTable(std::mt19937& random) {
     return table.build();
 }
 
-// A dmidecode --dump-bin image of a 3.2 table: the entry point at 0 naming
-// the table at 0x20.
-std::vector<uint8_t> dumpBin(std::vector<uint8_t> const& table) {
-    std::vector<uint8_t> file(0x20 + table.size(), 0);
-    std::vector<uint8_t> const entry =
-        smbiostest::sm3EntryPoint(3, 2, 0, static_cast<uint32_t>(table.size()), 0x20);
-    std::copy(entry.begin(), entry.end(), file.begin());
-    std::copy(table.begin(), table.end(), file.begin() + 0x20);
-    return file;
-}
-
 }  // namespace
 
 TEST(PrometheusHost, RandomTablesPassPromtool) {
@@ -332,7 +321,7 @@ TEST(PrometheusHost, RandomTablesPassPromtool) {
     std::mt19937 random(20261125);
     for (int round = 0; round < 12; ++round) {
         std::string const bin = scratch.file("random" + std::to_string(round) + ".bin");
-        smbiostest::writeFile(bin, dumpBin(randomTable(random)));
+        smbiostest::writeFile(bin, smbiostest::sm3DumpBin(randomTable(random)));
         hosttest::RunResult const run =
             hosttest::runHost({"--from-bin", bin, "--format", "prometheus"});
         ASSERT_EQ(run.exitStatus, 0) << "round " << round << ": " << hosttest::describe(run);

@@ -262,6 +262,15 @@ std::vector<uint8_t> sm3EntryPoint(uint8_t major, uint8_t minor, uint8_t docrev,
     return ep;
 }
 
+std::vector<uint8_t> sm3DumpBin(std::vector<uint8_t> const& table) {
+    std::vector<uint8_t> file(0x20, 0);
+    std::vector<uint8_t> const entry =
+        sm3EntryPoint(3, 2, 0, static_cast<uint32_t>(table.size()), 0x20);
+    std::copy(entry.begin(), entry.end(), file.begin());
+    file.insert(file.end(), table.begin(), table.end());
+    return file;
+}
+
 std::vector<uint8_t> largeServerTable(unsigned devices) {
     TableBuilder table;
     table.add(Structure(0, 0x0000).str("Corvane").str("CVE2.10").word(0xE800).str("01/15/2026"));

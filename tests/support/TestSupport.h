@@ -105,6 +105,10 @@ void writeOverrideDir(std::string const& dataDir, std::vector<uint8_t> const& he
 std::vector<uint8_t> sm3EntryPoint(uint8_t major, uint8_t minor, uint8_t docrev, uint32_t maxSize,
                                    uint64_t address);
 
+// A dmidecode --dump-bin image of an SMBIOS 3.2 table: the "_SM3_" entry
+// point at 0 naming the table, which follows at 0x20.
+std::vector<uint8_t> sm3DumpBin(std::vector<uint8_t> const& table);
+
 // The table of a large server: BIOS, system, baseboard, chassis, one
 // memory array, then `devices` memory devices of 16 GB (type 17, all of one
 // length: locator "DIMM_<nnnn>", bank "NODE <nn>", maker, serial "SN<nnnnnnnn>",
