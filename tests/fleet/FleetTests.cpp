@@ -20,8 +20,10 @@
 #include <algorithm>
 #include <cctype>
 #include <chrono>
+#include <cstdio>
 #include <fstream>
 #include <functional>
+#include <iostream>
 #include <iterator>
 #include <map>
 #include <memory>
@@ -385,6 +387,18 @@ std::set<std::string> processorModels(dmitext::Decoding const& decoding) {
     return models;
 }
 
+// "name=value" pairs, each after a blank, for the test's account of its
+// answers.
+std::string shown(std::map<std::string, double> const& values) {
+    std::string text;
+    for (auto const& value : values) {
+        char number[32];
+        std::snprintf(number, sizeof number, "%.17g", value.second);
+        text += " " + value.first + "=" + number;
+    }
+    return text;
+}
+
 // A copy of a dump whose BIOS version text `from` reads `to` (as long).
 std::string alteredDump(std::string const& dump, std::string const& from, std::string const& to,
                         std::string const& path) {
@@ -441,6 +455,7 @@ TEST_F(Fleet, PrometheusAnswersFleetQuestionsFromTheMachinesInventories) {
         versions[sample.labels[firmwareVersion]] = sample.value;
     }
     EXPECT_EQ(versions, expectedVersions);
+    std::cout << "machines per BIOS version:" << shown(versions) << "\n";
     EXPECT_EQ(versions["6.00"], 2) << "both VMware machines";
 
     // The total memory of each machine.
@@ -448,7 +463,10 @@ TEST_F(Fleet, PrometheusAnswersFleetQuestionsFromTheMachinesInventories) {
     for (auto const& machine : fleet) {
         expectedMemory[machine.first] = memoryBytes(decodings_[machine.first]);
     }
-    EXPECT_EQ(byMachine("sum by (machine) (smbios_memory_device_size_bytes)"), expectedMemory);
+    std::map<std::string, double> const memory =
+        byMachine("sum by (machine) (smbios_memory_device_size_bytes)");
+    EXPECT_EQ(memory, expectedMemory);
+    std::cout << "memory per machine (bytes):" << shown(memory) << "\n";
     EXPECT_EQ(expectedMemory["server"], 48.0 * 1024 * 1024 * 1024);
 
     // The machines with a given processor model.
@@ -465,6 +483,11 @@ TEST_F(Fleet, PrometheusAnswersFleetQuestionsFromTheMachinesInventories) {
         machines.insert(found.first);
     }
     EXPECT_EQ(machines, expectedMachines);
+    std::cout << "machines with " << model << ":";
+    for (std::string const& machine : machines) {
+        std::cout << " " << machine;
+    }
+    std::cout << "\n";
     // The laptop has the VMware host's processor.
     EXPECT_EQ(machines, (std::set<std::string>{"laptop", "vm-a", "vm-b"}));
 
@@ -481,6 +504,7 @@ TEST_F(Fleet, PrometheusAnswersFleetQuestionsFromTheMachinesInventories) {
         << logs();
     std::map<std::string, double> const changes = byMachine(changed);
     EXPECT_EQ(changes.size(), 1u);
+    std::cout << "fingerprint changed:" << shown(changes) << "\n";
     EXPECT_EQ(changes.count("vm-b"), 1u);
     std::map<std::string, double> const after = byMachine("smbios_inventory_fingerprint");
     EXPECT_NE(after.at("vm-b"), before.at("vm-b"));
