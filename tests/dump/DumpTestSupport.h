@@ -24,12 +24,9 @@ std::string toolPath();
 hosttest::RunResult runDump(std::vector<std::string> const& args,
                             hosttest::Environment const& environment = hosttest::Environment());
 
-// Runs `work` on a thread of its own. Should it still run after 10 s, it is
-// taken to wait on the FIFO `fifo`: the FIFO is then opened from both sides
-// and closed again, every 100 ms until the work ends, which releases a
-// reader waiting for a writer and a writer waiting for a reader. Returns
-// whether that was needed, so that a test fails instead of hanging.
-bool waitedOnFifo(std::string const& fifo, std::function<void()> const& work);
+// Runs `work` on a thread of its own and releases it should it wait on a
+// FIFO (see smbiostest::waitedOnFifo).
+using smbiostest::waitedOnFifo;
 
 // Makes a FIFO; false when it cannot be made.
 bool makeFifo(std::string const& path);

@@ -1,14 +1,18 @@
 #include "TestSupport.h"
 
 #include <dirent.h>
+#include <fcntl.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
 #include <algorithm>
 #include <cerrno>
+#include <chrono>
 #include <cstdlib>
 #include <cstring>
 #include <filesystem>
 #include <fstream>
+#include <future>
 #include <iterator>
 #include <regex>
 #include <sstream>
@@ -184,6 +188,24 @@ std::vector<std::string> commandLine(std::string const& program,
     line.push_back(program);
     line.insert(line.end(), args.begin(), args.end());
     return line;
+}
+
+bool waitedOnFifo(std::string const& fifo, std::function<void()> const& work) {
+    std::future<void> working = std::async(std::launch::async, work);
+    bool waited = false;
+    std::chrono::milliseconds patience(10000);
+    while (working.wait_for(patience) != std::future_status::ready) {
+        waited = true;
+        patience = std::chrono::milliseconds(100);
+        for (int side : {O_RDONLY, O_WRONLY}) {
+            int const fd = ::open(fifo.c_str(), side | O_NONBLOCK | O_CLOEXEC);
+            if (fd >= 0) {
+                ::close(fd);
+            }
+        }
+    }
+    working.get();
+    return waited;
 }
 
 std::vector<std::string> corpusNames() {

@@ -5,6 +5,7 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <functional>
 #include <string>
 #include <vector>
 
@@ -94,6 +95,13 @@ std::vector<std::string> folderEntries(std::string const& folder);
 // on a kernel that cannot run it), that program first.
 std::vector<std::string> commandLine(std::string const& program,
                                      std::vector<std::string> const& args);
+
+// Runs `work` on a thread of its own. Should it still run after 10 s, it is
+// taken to wait on the FIFO `fifo`: the FIFO is then opened from both sides
+// and closed again, every 100 ms until the work ends, which releases a
+// reader waiting for a writer and a writer waiting for a reader. Returns
+// whether that was needed, so that a test fails instead of hanging.
+bool waitedOnFifo(std::string const& fifo, std::function<void()> const& work);
 
 // Writes dataDir/SmBiosOverride/smbios.txt (creating the folder) with the
 // override text of the entry point and table. dataDir may end with '/'.
