@@ -217,20 +217,12 @@ TEST(ChassisBuilder, FullStructureGivesOneChassisNodeWithEveryProperty) {
     EXPECT_TRUE(hasString(node, 36, "Chassis Maker"));
     EXPECT_TRUE(hasString(node, 45, "7947"));
     EXPECT_TRUE(buildertest::hasBool(node, 10, true));
-    EXPECT_TRUE(hasString(node, 108, "Rack Mount Chassis"));
-    EXPECT_TRUE(hasString(node, 39, "RS-7400 [7947AC1]"));
-    EXPECT_TRUE(hasEnum(node, 11, 4, 17));
-    EXPECT_TRUE(hasEnum(node, 213, 4, 3));
-    EXPECT_TRUE(hasString(node, 307, "CV-1"));
-    EXPECT_TRUE(hasString(node, 50, "CH-0001"));
-    EXPECT_TRUE(hasString(node, 2, "AT-9"));
-    EXPECT_TRUE(hasEnum(node, 4, 1, 3));
-    EXPECT_TRUE(hasEnum(node, 46, 1, 4));
-    EXPECT_TRUE(hasEnum(node, 60, 1, 5));
-    EXPECT_TRUE(hasEnum(node, 49, 1, 2));
-    EXPECT_TRUE(hasBytes(node, 43, {0x04, 0x03, 0x02, 0x01}));
-    EXPECT_TRUE(hasUnsigned(node, 21, 2));
-    EXPECT_TRUE(hasUnsigned(node, 42, 1));
+    expectProperties(
+        node, {stringProp(108, "Rack Mount Chassis"), stringProp(39, "RS-7400 [7947AC1]"),
+               enumProp(11, 4, 17), enumProp(213, 4, 3), stringProp(307, "CV-1"),
+               stringProp(50, "CH-0001"), stringProp(2, "AT-9"), enumProp(4, 1, 3),
+               enumProp(46, 1, 4), enumProp(60, 1, 5), enumProp(49, 1, 2),
+               bytesProp(43, {0x04, 0x03, 0x02, 0x01}), unsignedProp(21, 2), unsignedProp(42, 1)});
 
     // The planar (no baseboard structure: a bare one) hangs under it.
     EXPECT_EQ(node->getNodeId(), run.planarParent()) << log.dump();
@@ -327,9 +319,9 @@ TEST(ChassisType, EveryChassisTypeMapsAsTheTableSays) {
         IC::Node const* node = nodes[1];
         Expected const expected = expectedFor(type);
         EXPECT_EQ(1u, node->getIndex());
-        EXPECT_TRUE(hasEnum(node, 11, 4, expected.packageType));
-        EXPECT_TRUE(hasEnum(node, 213, 4, expected.enclosure));
-        EXPECT_TRUE(hasString(node, 108, expected.name));
+        expectProperties(
+            node, {enumProp(11, 4, expected.packageType), enumProp(213, 4, expected.enclosure),
+                   stringProp(108, expected.name)});
         EXPECT_TRUE(buildertest::hasBool(node, 10, false));
         EXPECT_EQ(expected.mainChassis ? node->getNodeId() : nodes[0]->getNodeId(),
                   run.planarParent());
@@ -349,9 +341,8 @@ TEST(ChassisType, RackMountChassisGetsPackageType17AndItsName) {
     ChassisRun run(systemAndChassis({ofType(DESKTOP), ofType(RACK_MOUNT)}));
     std::vector<IC::Node*> const nodes = run.chassisNodes();
     ASSERT_EQ(2u, nodes.size());
-    EXPECT_TRUE(hasEnum(nodes[1], 11, 4, 17));
-    EXPECT_TRUE(hasEnum(nodes[1], 213, 4, 3));
-    EXPECT_TRUE(hasString(nodes[1], 108, "Rack Mount Chassis"));
+    expectProperties(nodes[1], {enumProp(11, 4, 17), enumProp(213, 4, 3),
+                                stringProp(108, "Rack Mount Chassis")});
     // A main chassis: it takes the planar.
     EXPECT_EQ(nodes[1]->getNodeId(), run.planarParent());
 }
@@ -360,9 +351,8 @@ TEST(ChassisType, BladeGetsPackageType17AndEnclosureKind16) {
     ChassisRun run(systemAndChassis({ofType(DESKTOP), ofType(BLADE)}));
     std::vector<IC::Node*> const nodes = run.chassisNodes();
     ASSERT_EQ(2u, nodes.size());
-    EXPECT_TRUE(hasEnum(nodes[1], 11, 4, 0x11));
-    EXPECT_TRUE(hasEnum(nodes[1], 213, 4, 16));
-    EXPECT_TRUE(hasString(nodes[1], 108, "Blade Chassis"));
+    expectProperties(
+        nodes[1], {enumProp(11, 4, 0x11), enumProp(213, 4, 16), stringProp(108, "Blade Chassis")});
     EXPECT_EQ(nodes[1]->getNodeId(), run.planarParent());
 }
 
@@ -370,9 +360,8 @@ TEST(ChassisType, BladeEnclosureGetsPackageType0x1CAndEnclosureKind17AndIsNotMai
     ChassisRun run(systemAndChassis({ofType(DESKTOP), ofType(BLADE_ENCLOSURE)}));
     std::vector<IC::Node*> const nodes = run.chassisNodes();
     ASSERT_EQ(2u, nodes.size());
-    EXPECT_TRUE(hasEnum(nodes[1], 11, 4, 0x1C));
-    EXPECT_TRUE(hasEnum(nodes[1], 213, 4, 17));
-    EXPECT_TRUE(hasString(nodes[1], 108, "Blade Enclosure Chassis"));
+    expectProperties(nodes[1], {enumProp(11, 4, 0x1C), enumProp(213, 4, 17),
+                                stringProp(108, "Blade Enclosure Chassis")});
     // Not a main chassis: the planar stays with the first chassis.
     EXPECT_EQ(nodes[0]->getNodeId(), run.planarParent());
 }
@@ -415,10 +404,8 @@ TEST(ChassisFallback, NoSystemInformationStructureFallsBackToTheMissingTableSent
 
     std::vector<IC::Node*> const nodes = run.chassisNodes();
     ASSERT_EQ(1u, nodes.size());
-    EXPECT_TRUE(hasString(nodes[0], 36, NO_SYSTEM));
-    EXPECT_TRUE(hasString(nodes[0], 39, NO_SYSTEM));
-    EXPECT_TRUE(hasString(nodes[0], 50, NO_SYSTEM));
-    EXPECT_TRUE(lacksProperty(nodes[0], 45));
+    expectProperties(nodes[0], {stringProp(36, NO_SYSTEM), stringProp(39, NO_SYSTEM),
+                                stringProp(50, NO_SYSTEM), noProp(45)});
     EXPECT_EQ(2u, log.count("makeChassisNodes Smbios required system information table does "
                             "not exist"))
         << log.dump();
@@ -429,9 +416,8 @@ TEST(ChassisFallback, NoSystemInformationStructureKeepsTheChassisOwnTexts) {
     ChassisRun run(tableOf({chassis(0x0300, ofType(TOWER))}));
     std::vector<IC::Node*> const nodes = run.chassisNodes();
     ASSERT_EQ(1u, nodes.size());
-    EXPECT_TRUE(hasString(nodes[0], 36, "Chassis Maker"));
-    EXPECT_TRUE(hasString(nodes[0], 39, NO_SYSTEM));
-    EXPECT_TRUE(hasString(nodes[0], 50, "CH-0001"));
+    expectProperties(nodes[0], {stringProp(36, "Chassis Maker"), stringProp(39, NO_SYSTEM),
+                                stringProp(50, "CH-0001")});
 }
 
 TEST(ChassisFallback, ManufacturerFallsBackOnEmptyBlankAndLowerCaseNoneOnly) {
@@ -483,9 +469,8 @@ TEST(ChassisFallback, SystemTextsComeFromTheFirstSystemInformationStructure) {
     ChassisRun run(table);
     std::vector<IC::Node*> const nodes = run.chassisNodes();
     ASSERT_EQ(1u, nodes.size());
-    EXPECT_TRUE(hasString(nodes[0], 39, "First [1111AB1]"));
-    EXPECT_TRUE(hasString(nodes[0], 45, "1111"));
-    EXPECT_TRUE(hasString(nodes[0], 50, "SYS-1"));
+    expectProperties(nodes[0], {stringProp(39, "First [1111AB1]"), stringProp(45, "1111"),
+                                stringProp(50, "SYS-1")});
 }
 
 TEST(ChassisFallback, ProductWithoutPartNumberSetsNoProperty45) {

@@ -56,12 +56,9 @@ TEST(ConnectorBuilder, ConnectorNodeFieldByField) {
     EXPECT_TRUE(hasString(node, 108, "Compute ITE 1"));
     EXPECT_TRUE(hasEnum(node, 128, 1, 0x10));
 
-    EXPECT_EQ(2u, setup.mi.nodeList.size());
-    EXPECT_EQ(4u, setup.mi.nextNodeId);
-    EXPECT_EQ((std::vector<std::string>{"makeConnectorNodes entry", "Table 8 length = 9",
-                                        "makeConnectorNodes exit"}),
-              loggedBy(CONNECTOR_LOGGER))
-        << log.dump();
+    EXPECT_TRUE(holdsNodes(setup.mi, 2, 4));
+    EXPECT_TRUE(loggedExactly(CONNECTOR_LOGGER, {"makeConnectorNodes entry", "Table 8 length = 9",
+                                                 "makeConnectorNodes exit"}));
 }
 
 TEST(ConnectorBuilder, DesignatorBeginningWithComputeITEAndANumberBecomesANode) {
@@ -98,8 +95,7 @@ TEST(ConnectorBuilder, DesignatorWithoutComputeITEMakesNoNode) {
                  connector(0x0802, "ComputeITE 1", 0x09)}));
 
     EXPECT_TRUE(setup.run().empty());
-    EXPECT_EQ(1u, setup.mi.nodeList.size());
-    EXPECT_EQ(3u, setup.mi.nextNodeId);
+    EXPECT_TRUE(holdsNodes(setup.mi, 1, 3));
     // Every structure is looked at, each with its own line.
     EXPECT_EQ(3u, frametest::loggedLevels("Table 8 length = 9").size()) << log.dump();
 }
@@ -134,10 +130,8 @@ TEST(ConnectorBuilder, TwoQualifyingConnectorsKeepTheirGroupPositions) {
     std::vector<IC::Node*> const nodes = setup.run();
 
     ASSERT_EQ(2u, nodes.size());
-    EXPECT_EQ(3u, nodes[0]->getNodeId());
-    EXPECT_EQ(0u, nodes[0]->getIndex());
-    EXPECT_EQ(4u, nodes[1]->getNodeId());
-    EXPECT_EQ(2u, nodes[1]->getIndex());
+    EXPECT_TRUE(hasIdAndIndex(nodes[0], 3, 0));
+    EXPECT_TRUE(hasIdAndIndex(nodes[1], 4, 2));
     EXPECT_TRUE(hasEnum(nodes[1], 128, 1, 0x0D));
 }
 
@@ -158,11 +152,8 @@ TEST(ConnectorBuilder, EmptyConnectorGroupMakesNoNodesAndLogsOnlyEntryAndExit) {
 
     smbiostest::LogCapture log;
     EXPECT_TRUE(setup.run().empty());
-    EXPECT_EQ(1u, setup.mi.nodeList.size());
-    EXPECT_EQ(3u, setup.mi.nextNodeId);
-    EXPECT_EQ((std::vector<std::string>{"makeConnectorNodes entry", "makeConnectorNodes exit"}),
-              frametest::loggedTexts())
-        << log.dump();
+    EXPECT_TRUE(holdsNodes(setup.mi, 1, 3));
+    EXPECT_TRUE(loggedOnly({"makeConnectorNodes entry", "makeConnectorNodes exit"}));
 }
 
 TEST(ConnectorBuilder, FailureInOneConnectorIsLoggedAndTheNextStillGetsANode) {
@@ -179,8 +170,7 @@ TEST(ConnectorBuilder, FailureInOneConnectorIsLoggedAndTheNextStillGetsANode) {
 
     EXPECT_TRUE(loggedOutOfRangeAt("Table 8 index =0")) << log.dump();
     ASSERT_EQ(1u, nodes.size());
-    EXPECT_EQ(3u, nodes[0]->getNodeId());
-    EXPECT_EQ(1u, nodes[0]->getIndex());
+    EXPECT_TRUE(hasIdAndIndex(nodes[0], 3, 1));
     EXPECT_TRUE(hasString(nodes[0], 108, "Compute ITE 2"));
     std::vector<std::string> const texts = loggedBy(CONNECTOR_LOGGER);
     ASSERT_FALSE(texts.empty());

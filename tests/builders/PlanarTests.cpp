@@ -183,14 +183,10 @@ TEST(PlanarBuilder, FullStructureGivesOnePlanarNodeWithEveryProperty) {
 
     // The version string is not read.
     EXPECT_EQ((std::vector<unsigned int>{2, 31, 36, 39, 44, 50, 128, 172}), propertyIds(node));
-    EXPECT_TRUE(hasString(node, 36, "Board Maker"));
-    EXPECT_TRUE(hasString(node, 39, "MB-100"));
-    EXPECT_TRUE(hasString(node, 172, "MB-100"));
-    EXPECT_TRUE(hasString(node, 50, "BRD-1"));
-    EXPECT_TRUE(hasString(node, 2, "BA-1"));
-    EXPECT_TRUE(hasEnum(node, 44, 1, 0x09));
-    EXPECT_TRUE(hasString(node, 31, "Slot A"));
-    EXPECT_TRUE(hasUnsigned(node, 128, 0x0A));
+    expectProperties(
+        node, {stringProp(36, "Board Maker"), stringProp(39, "MB-100"), stringProp(172, "MB-100"),
+               stringProp(50, "BRD-1"), stringProp(2, "BA-1"), enumProp(44, 1, 0x09),
+               stringProp(31, "Slot A"), unsignedProp(128, 0x0A)});
 
     // The product and the location also go to the parent.
     EXPECT_EQ((std::vector<unsigned int>{31, 172}), propertyIds(run.parent));
@@ -448,8 +444,7 @@ TEST(PlanarBuilder, ParentNotFoundBuildsNothing) {
     smbiostest::LogCapture log;
     PlanarRun run(tableOf({systemInformation(0x0100), baseboard(0x0200)}), 99);
 
-    EXPECT_EQ(1u, run.mi.nodeList.size());
-    EXPECT_EQ(3u, run.mi.nextNodeId);
+    EXPECT_TRUE(holdsNodes(run.mi, 1, 3));
     EXPECT_TRUE(propertyIds(run.parent).empty());
     EXPECT_EQ(2u, log.count("makePlanarNodes Exit: failed to find parent node for nodeid 99"))
         << log.dump();

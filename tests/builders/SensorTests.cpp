@@ -88,10 +88,8 @@ TEST(TemperatureSensorNodes, ProbeAtTheLocationSetsEveryField) {
     EXPECT_TRUE(hasUnsignedList(node, 125, SENSOR_STATUSES));
     EXPECT_TRUE(hasUnsigned(node, 31, 3));
     // The OEM-defined bytes reversed.
-    EXPECT_TRUE(hasBytes(node, 43, {0x44, 0x33, 0x22, 0x11}));
-    EXPECT_TRUE(hasDouble(node, 14, 40.0));
-    EXPECT_TRUE(hasDouble(node, 23, 80.0));
-    EXPECT_TRUE(hasDouble(node, 33, 10.0));
+    expectProperties(node, {bytesProp(43, {0x44, 0x33, 0x22, 0x11}), doubleProp(14, 40.0),
+                            doubleProp(23, 80.0), doubleProp(33, 10.0)});
     EXPECT_EQ(node, setup.built.lists.storage[TEMPERATURE][0].node);
     EXPECT_EQ(2u, mi.nodeList.size());
     EXPECT_TRUE(childrenOf(mi, 3).empty());
@@ -118,11 +116,9 @@ TEST(TemperatureSensorNodes, OnlyProbesAtTheLocationMakeNodesAndIndexesCountSkip
 
     std::vector<IC::Node*> const nodes = nodesOfType(mi, 22);
     ASSERT_EQ(2u, nodes.size());
-    EXPECT_EQ(3u, nodes[0]->getNodeId());
-    EXPECT_EQ(0u, nodes[0]->getIndex());
+    EXPECT_TRUE(hasIdAndIndex(nodes[0], 3, 0));
     EXPECT_EQ("first", nodes[0]->getDescription());
-    EXPECT_EQ(4u, nodes[1]->getNodeId());
-    EXPECT_EQ(2u, nodes[1]->getIndex());
+    EXPECT_TRUE(hasIdAndIndex(nodes[1], 4, 2));
     EXPECT_EQ("third", nodes[1]->getDescription());
     EXPECT_EQ(nullptr, setup.built.lists.storage[TEMPERATURE][1].node);
     // Every structure is logged, the skipped one too.
@@ -315,12 +311,9 @@ TEST(VoltageSensorNodes, ProbeAtTheLocationSetsEveryFieldInVolts) {
     EXPECT_TRUE(isNode(node, 3u, 2u, 21, 0u, 21u, "12V Rail"));
     EXPECT_EQ(std::vector<unsigned int>{1}, node->getMIIds());
     EXPECT_EQ((Ids{14, 23, 31, 33, 43, 125}), propertyIds(node));
-    EXPECT_TRUE(hasUnsignedList(node, 125, SENSOR_STATUSES));
-    EXPECT_TRUE(hasUnsigned(node, 31, 4));
-    EXPECT_TRUE(hasBytes(node, 43, {0xD0, 0xC0, 0xB0, 0xA0}));
-    EXPECT_TRUE(hasDouble(node, 14, 12.0));
-    EXPECT_TRUE(hasDouble(node, 23, 12.6));
-    EXPECT_TRUE(hasDouble(node, 33, 11.4));
+    expectProperties(node, {unsignedListProp(125, SENSOR_STATUSES), unsignedProp(31, 4),
+                            bytesProp(43, {0xD0, 0xC0, 0xB0, 0xA0}), doubleProp(14, 12.0),
+                            doubleProp(23, 12.6), doubleProp(33, 11.4)});
     EXPECT_EQ(node, setup.built.lists.storage[VOLTAGE][0].node);
     EXPECT_EQ(2u, mi.nodeList.size());
 
@@ -341,9 +334,7 @@ TEST(VoltageSensorNodes, Nominal12000Is12VoltsAndMaximum0x8000IsNotSet) {
 
     std::vector<IC::Node*> const nodes = nodesOfType(mi, 21);
     ASSERT_EQ(1u, nodes.size());
-    EXPECT_TRUE(hasDouble(nodes[0], 14, 12.0));
-    EXPECT_TRUE(lacksProperty(nodes[0], 23));
-    EXPECT_TRUE(lacksProperty(nodes[0], 33));
+    expectProperties(nodes[0], {doubleProp(14, 12.0), noProp(23), noProp(33)});
 }
 
 TEST(VoltageSensorNodes, NominalUnknownOnlyAt0x800) {

@@ -76,16 +76,12 @@ TEST(SlotBuilder, SlotNodeFieldByField) {
     EXPECT_TRUE(isNode(node, 3u, run.planar->getNodeId(), 62, 0u, 1u, "System Slot"));
     EXPECT_EQ(run.mi.miIdList, node->getMIIds());
     EXPECT_EQ((std::vector<unsigned int>{108, 128, 270}), propertyIds(node));
-    EXPECT_TRUE(hasString(node, 108, "PCIE1"));
-    EXPECT_TRUE(hasEnum(node, 128, 4, 21));
-    EXPECT_TRUE(hasUnsigned(node, 270, 0x0102));
+    expectProperties(node,
+                     {stringProp(108, "PCIE1"), enumProp(128, 4, 21), unsignedProp(270, 0x0102)});
 
-    EXPECT_EQ(2u, run.mi.nodeList.size());
-    EXPECT_EQ(4u, run.mi.nextNodeId);
-    EXPECT_EQ((std::vector<std::string>{"makeSlotNodes entry", "Table 9 length = 13",
-                                        "makeSlotNodes exit"}),
-              loggedBy(SLOT_LOGGER))
-        << log.dump();
+    EXPECT_TRUE(holdsNodes(run.mi, 2, 4));
+    EXPECT_TRUE(loggedExactly(
+        SLOT_LOGGER, {"makeSlotNodes entry", "Table 9 length = 13", "makeSlotNodes exit"}));
 }
 
 TEST(SlotBuilder, SlotTypesA8AndB4Give21_06Gives16_12Gives17) {
@@ -124,12 +120,9 @@ TEST(SlotBuilder, EmptySlotGroupMakesNoNodesAndLogsOnlyEntryAndExit) {
     smbiostest::LogCapture log;
     mi.makeSlotNodes(lists.get(), planar->getNodeId());
 
-    EXPECT_EQ(1u, mi.nodeList.size());
-    EXPECT_EQ(3u, mi.nextNodeId);
+    EXPECT_TRUE(holdsNodes(mi, 1, 3));
     EXPECT_TRUE(nodesOfType(mi, SLOT_NODE).empty());
-    EXPECT_EQ((std::vector<std::string>{"makeSlotNodes entry", "makeSlotNodes exit"}),
-              frametest::loggedTexts())
-        << log.dump();
+    EXPECT_TRUE(loggedOnly({"makeSlotNodes entry", "makeSlotNodes exit"}));
 }
 
 TEST(SlotBuilder, TwoSlotsGetIndexesZeroAndOneInGroupOrder) {
@@ -138,16 +131,12 @@ TEST(SlotBuilder, TwoSlotsGetIndexesZeroAndOneInGroupOrder) {
                          slot(0x0901, "SLOT B", 0xAA, 0x0002)}));
 
     ASSERT_EQ(2u, run.nodes.size());
-    EXPECT_EQ(3u, run.nodes[0]->getNodeId());
-    EXPECT_EQ(0u, run.nodes[0]->getIndex());
-    EXPECT_TRUE(hasString(run.nodes[0], 108, "SLOT A"));
-    EXPECT_TRUE(hasEnum(run.nodes[0], 128, 4, 19));
-    EXPECT_TRUE(hasUnsigned(run.nodes[0], 270, 1));
-    EXPECT_EQ(4u, run.nodes[1]->getNodeId());
-    EXPECT_EQ(1u, run.nodes[1]->getIndex());
-    EXPECT_TRUE(hasString(run.nodes[1], 108, "SLOT B"));
-    EXPECT_TRUE(hasEnum(run.nodes[1], 128, 4, 23));
-    EXPECT_TRUE(hasUnsigned(run.nodes[1], 270, 2));
+    EXPECT_TRUE(hasIdAndIndex(run.nodes[0], 3, 0));
+    expectProperties(run.nodes[0],
+                     {stringProp(108, "SLOT A"), enumProp(128, 4, 19), unsignedProp(270, 1)});
+    EXPECT_TRUE(hasIdAndIndex(run.nodes[1], 4, 1));
+    expectProperties(run.nodes[1],
+                     {stringProp(108, "SLOT B"), enumProp(128, 4, 23), unsignedProp(270, 2)});
     for (IC::Node const* node : run.nodes) {
         EXPECT_EQ(run.planar->getNodeId(), node->getLinkedId());
     }
@@ -202,9 +191,7 @@ TEST(SlotBuilder, ShortSlotWithoutSlotTypeGivesOtherAndSlotIdZero) {
     EXPECT_EQ(1u, node->getStatus());
     EXPECT_EQ("System Slot", node->getDescription());
     EXPECT_EQ((std::vector<unsigned int>{108, 128, 270}), propertyIds(node));
-    EXPECT_TRUE(hasString(node, 108, "STUB"));
-    EXPECT_TRUE(hasEnum(node, 128, 4, 1));
-    EXPECT_TRUE(hasUnsigned(node, 270, 0));
+    expectProperties(node, {stringProp(108, "STUB"), enumProp(128, 4, 1), unsignedProp(270, 0)});
     EXPECT_TRUE(log.contains("getNumber8 offset=5 length=5")) << log.dump();
     EXPECT_TRUE(log.contains("getNumber16 offset=9 length=5")) << log.dump();
 }
@@ -230,11 +217,9 @@ TEST(SlotBuilder, FailureInOneSlotIsLoggedAndTheNextSlotStillGetsANode) {
     EXPECT_EQ(0u, run.nodes[0]->getIndex());
     EXPECT_TRUE(hasString(run.nodes[0], 108, "CUT"));
     EXPECT_TRUE(lacksProperty(run.nodes[0], 270));
-    EXPECT_EQ(4u, run.nodes[1]->getNodeId());
-    EXPECT_EQ(1u, run.nodes[1]->getIndex());
-    EXPECT_TRUE(hasString(run.nodes[1], 108, "WHOLE"));
-    EXPECT_TRUE(hasEnum(run.nodes[1], 128, 4, 22));
-    EXPECT_TRUE(hasUnsigned(run.nodes[1], 270, 5));
+    EXPECT_TRUE(hasIdAndIndex(run.nodes[1], 4, 1));
+    expectProperties(run.nodes[1],
+                     {stringProp(108, "WHOLE"), enumProp(128, 4, 22), unsignedProp(270, 5)});
     std::vector<std::string> const texts = loggedBy(SLOT_LOGGER);
     ASSERT_FALSE(texts.empty());
     EXPECT_EQ("makeSlotNodes exit", texts.back());
