@@ -13,6 +13,7 @@
 #include <cstdint>
 #include <functional>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "FrameFixture.h"
@@ -299,6 +300,14 @@ inline TableBuilder tableOf(std::vector<Structure> const& structures) {
     return table;
 }
 
+// The structures as a table ended by an End-of-Table structure (handle
+// 0xFEFF).
+inline TableBuilder endedTableOf(std::vector<Structure> const& structures) {
+    TableBuilder table = tableOf(structures);
+    table.endOfTable(0xFEFF);
+    return table;
+}
+
 // A parsed table with its structure lists, and a plug-in with a parent node
 // (id 2, a planar unless told otherwise; the next id is 3) for a builder to
 // hang its nodes under.
@@ -448,6 +457,27 @@ inline Structure oemStrings(uint16_t handle, std::vector<std::string> const& str
     for (std::string const& text : strings) {
         structure.addString(text);
     }
+    return structure;
+}
+
+// A group association (type 14) with its items, each (type, handle).
+inline Structure group(uint16_t handle, std::string const& name,
+                       std::vector<std::pair<uint8_t, uint16_t>> const& items) {
+    Structure structure(14, handle);
+    structure.str(name);
+    for (auto const& item : items) {
+        structure.byte(item.first).word(item.second);
+    }
+    return structure;
+}
+
+// A baseboard (type 2) of length 0x0C: every field up to the location,
+// then the low byte of the chassis handle, whose word straddles the end of
+// the formatted area.
+inline Structure straddlingBaseboard(uint16_t handle) {
+    Structure structure(2, handle);
+    structure.str("Board Maker").str("MB-100").str("BV-1").str("BRD-1").str("BA-1");
+    structure.byte(0x09).str("Slot A").byte(0x00);
     return structure;
 }
 

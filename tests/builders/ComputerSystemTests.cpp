@@ -81,15 +81,13 @@ Structure baseboard(uint16_t handle) {
         .byte(0);
 }
 
-// A group association (type 14) with its items, each (type, handle).
-Structure group(uint16_t handle, std::string const& name,
-                std::vector<std::pair<uint8_t, uint16_t>> const& items) {
-    Structure structure(14, handle);
-    structure.str(name);
-    for (auto const& item : items) {
-        structure.byte(item.first).word(item.second);
-    }
-    return structure;
+// Two System Information structures, "First [1111AB1]" (0x0100) and
+// "Second [2222AB2]" (0x0101), then the other structures.
+std::vector<Structure> twoSystemsAnd(std::vector<Structure> const& others) {
+    std::vector<Structure> structures = {systemInformation(0x0100, "First [1111AB1]"),
+                                         systemInformation(0x0101, "Second [2222AB2]")};
+    structures.insert(structures.end(), others.begin(), others.end());
+    return structures;
 }
 
 // Sets the process's time zone while the object lives, then restores it.
@@ -131,13 +129,6 @@ struct ComputerRun {
     TestMI mi;
     IC::MutableNode* root = nullptr;
 };
-
-// The structures as a table ended by an End-of-Table structure.
-TableBuilder endedTableOf(std::vector<Structure> const& structures) {
-    TableBuilder table = tableOf(structures);
-    table.endOfTable(0xFEFF);
-    return table;
-}
 
 // The builder run over a table that the process also acquires, at the given
 // SMBIOS version, from its override file; the log is captured from the run
@@ -301,11 +292,7 @@ TEST(ComputerSystemBuilder, FullStructureGivesOneComputerSystemNodeWithEveryProp
 
 TEST(ComputerSystemBuilder, NoSystemInformationStructureMakesNoNodeAndNothingBelowIt) {
     smbiostest::LogCapture log;
-    TableBuilder table;
-    table.add(chassis(0x0300, 0x17));
-    table.add(baseboard(0x0200));
-    table.endOfTable(0xFEFF);
-    ComputerRun run(table);
+    ComputerRun run(endedTableOf({chassis(0x0300, 0x17), baseboard(0x0200)}));
 
     ASSERT_EQ(1u, run.mi.nodeList.size());
     EXPECT_EQ(run.root, run.mi.nodeList[0]);
@@ -323,10 +310,7 @@ TEST(ComputerSystemBuilder, NoSystemInformationStructureMakesNoNodeAndNothingBel
 TEST(ComputerSystemBuilder,
      TwoSystemStructuresWithoutBaseboardGetIndexesZeroAndOneEachWithItsOwnChassis) {
     REQUIRE_FRESH_TABLE();
-    AcquiredComputerRun const acquired(
-        endedTableOf({systemInformation(0x0100, "First [1111AB1]"),
-                      systemInformation(0x0101, "Second [2222AB2]"), chassis(0x0300, 0x17)}),
-        2, 4);
+    AcquiredComputerRun const acquired(endedTableOf(twoSystemsAnd({chassis(0x0300, 0x17)})), 2, 4);
     ComputerRun const& run = acquired.run;
     LogCapture const& log = acquired.log;
     std::vector<IC::Node*> const& computers = acquired.computers;
@@ -359,10 +343,8 @@ TEST(ComputerSystemBuilder,
 
 TEST(ComputerSystemBuilder, WithBaseboardOnlyTheFirstOfTwoSystemStructuresGetsANode) {
     REQUIRE_FRESH_TABLE();
-    AcquiredComputerRun const acquired(endedTableOf({systemInformation(0x0100, "First [1111AB1]"),
-                                                     systemInformation(0x0101, "Second [2222AB2]"),
-                                                     chassis(0x0300, 0x17), baseboard(0x0200)}),
-                                       2, 4);
+    AcquiredComputerRun const acquired(
+        endedTableOf(twoSystemsAnd({chassis(0x0300, 0x17), baseboard(0x0200)})), 2, 4);
     ComputerRun const& run = acquired.run;
     LogCapture const& log = acquired.log;
 
@@ -438,10 +420,9 @@ TEST(ComputerSystemBuilder, StructureEndingRightAfterTheUuidGetsTheUuidButNoWake
 TEST(ComputerSystemBuilder, Smbios24TableSetsTheUuidAsFormatted) {
     REQUIRE_FRESH_TABLE();
     AcquiredComputerRun const acquired(endedTableOf({systemInformation(0x0100)}), 2, 4);
-    LogCapture const& log = acquired.log;
     ASSERT_EQ(1u, acquired.computers.size());
     EXPECT_TRUE(hasString(acquired.computers[0], 64, UUID_AS_FORMATTED));
-    EXPECT_EQ(0u, log.count("Entering if condition UUID = ")) << log.dump();
+    EXPECT_EQ(0u, acquired.log.count("Entering if condition UUID = ")) << acquired.log.dump();
     EXPECT_EQ(2u, acquired.run.mi.getSmBiosMajorVersion());
     EXPECT_EQ(4u, acquired.run.mi.getSmBiosMinorVersion());
 }
@@ -449,11 +430,12 @@ TEST(ComputerSystemBuilder, Smbios24TableSetsTheUuidAsFormatted) {
 TEST(ComputerSystemBuilder, Smbios26TableSetsTheUuidWithItsFirstThreeFieldsByteReversed) {
     REQUIRE_FRESH_TABLE();
     AcquiredComputerRun const acquired(endedTableOf({systemInformation(0x0100)}), 2, 6);
-    LogCapture const& log = acquired.log;
     ASSERT_EQ(1u, acquired.computers.size());
     EXPECT_TRUE(hasString(acquired.computers[0], 64, UUID_REORDERED));
-    EXPECT_EQ(2u, log.count("Entering if condition UUID = " + UUID_AS_FORMATTED)) << log.dump();
-    EXPECT_EQ(2u, log.count("Exiting if condition UUID = " + UUID_REORDERED)) << log.dump();
+    EXPECT_EQ(2u, acquired.log.count("Entering if condition UUID = " + UUID_AS_FORMATTED))
+        << acquired.log.dump();
+    EXPECT_EQ(2u, acquired.log.count("Exiting if condition UUID = " + UUID_REORDERED))
+        << acquired.log.dump();
 }
 
 TEST(ComputerSystemBuilder, ProductWithoutPartNumberAndEmptyTextsAreStillSet) {

@@ -41,6 +41,16 @@ struct ConnectorRun : PlanarSetup {
     }
 };
 
+// One connector of the internal designator and port type makes one node
+// with the designator (108) and the port type (128).
+void expectOneConnector(std::string const& designator, uint8_t portType) {
+    ConnectorRun setup(tableOf({connector(0x0800, designator, portType)}));
+    std::vector<IC::Node*> const nodes = setup.run();
+    ASSERT_EQ(1u, nodes.size());
+    EXPECT_TRUE(hasString(nodes[0], 108, designator));
+    EXPECT_TRUE(hasEnum(nodes[0], 128, 1, portType));
+}
+
 }  // namespace
 
 TEST(ConnectorBuilder, ConnectorNodeFieldByField) {
@@ -62,21 +72,11 @@ TEST(ConnectorBuilder, ConnectorNodeFieldByField) {
 }
 
 TEST(ConnectorBuilder, DesignatorBeginningWithComputeITEAndANumberBecomesANode) {
-    ConnectorRun setup(tableOf({connector(0x0800, "Compute ITE 12", 0x09)}));
-    std::vector<IC::Node*> const nodes = setup.run();
-
-    ASSERT_EQ(1u, nodes.size());
-    EXPECT_TRUE(hasString(nodes[0], 108, "Compute ITE 12"));
-    EXPECT_TRUE(hasEnum(nodes[0], 128, 1, 0x09));
+    expectOneConnector("Compute ITE 12", 0x09);
 }
 
 TEST(ConnectorBuilder, DesignatorWithWordsBeforeComputeITEBecomesANodeWithTheWholeText) {
-    ConnectorRun setup(tableOf({connector(0x0800, "Rear Panel Compute ITE 3 (LAN)", 0x1F)}));
-    std::vector<IC::Node*> const nodes = setup.run();
-
-    ASSERT_EQ(1u, nodes.size());
-    EXPECT_TRUE(hasString(nodes[0], 108, "Rear Panel Compute ITE 3 (LAN)"));
-    EXPECT_TRUE(hasEnum(nodes[0], 128, 1, 0x1F));
+    expectOneConnector("Rear Panel Compute ITE 3 (LAN)", 0x1F);
 }
 
 TEST(ConnectorBuilder, LowerCaseComputeIteMakesNoNode) {

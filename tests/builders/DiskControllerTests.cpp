@@ -50,6 +50,16 @@ IC::Node* ideNodeOf(DiskRun& setup) {
     return nodes.size() == 1 ? nodes[0] : nullptr;
 }
 
+// The run makes one node, of id `id` and status `status`, and the next
+// node id is `nextId`.
+void expectOneNode(DiskRun& setup, unsigned int id, unsigned int status, unsigned int nextId) {
+    std::vector<IC::Node*> const nodes = setup.run();
+    ASSERT_EQ(1u, nodes.size());
+    EXPECT_EQ(id, nodes[0]->getNodeId());
+    EXPECT_EQ(status, nodes[0]->getStatus());
+    EXPECT_EQ(nextId, setup.mi.nextNodeId);
+}
+
 }  // namespace
 
 TEST(DiskControllerBuilder, EnabledIdeStringMakesAnEnabledNodeFieldByField) {
@@ -142,12 +152,8 @@ TEST(DiskControllerBuilder, IdeStringOnlyInTheSecondStructureGetsTheSecondReserv
 
 TEST(DiskControllerBuilder, BothIdeStringsInOneStructureOnlyTheFirstFoundMakesANode) {
     DiskRun setup(tableOf({oemStrings(0x0B00, {"Corvane", DISABLED, ENABLED})}));
-    std::vector<IC::Node*> const nodes = setup.run();
 
-    ASSERT_EQ(1u, nodes.size());
-    EXPECT_EQ(3u, nodes[0]->getNodeId());
-    EXPECT_EQ(16u, nodes[0]->getStatus());
-    EXPECT_EQ(4u, setup.mi.nextNodeId);
+    expectOneNode(setup, 3, 16, 4);
 }
 
 TEST(DiskControllerBuilder, NoOemStringsStructureMakesNoNodeAndUsesNoId) {
@@ -207,12 +213,8 @@ TEST(DiskControllerBuilder, CountBeyondTheStringsReadsMissingStringsAsEmpty) {
     table.add(Structure(11, 0x0B00).byte(4).addString(DISABLED));
     table.add(Structure(11, 0x0B01).byte(4).addString("Corvane"));
     DiskRun setup(table);
-    std::vector<IC::Node*> const nodes = setup.run();
 
-    ASSERT_EQ(1u, nodes.size());
-    EXPECT_EQ(3u, nodes[0]->getNodeId());
-    EXPECT_EQ(16u, nodes[0]->getStatus());
-    EXPECT_EQ(5u, setup.mi.nextNodeId);
+    expectOneNode(setup, 3, 16, 5);
 }
 
 TEST(DiskControllerBuilder, IndexIsAlwaysOne) {
