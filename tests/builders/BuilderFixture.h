@@ -213,9 +213,6 @@ inline PropertyCheck versionProp(unsigned int id, unsigned int major, unsigned i
 inline PropertyCheck unsignedListProp(unsigned int id, std::vector<unsigned int> const& value) {
     return {id, [id, value](IC::Node const* node) { return hasUnsignedList(node, id, value); }};
 }
-inline PropertyCheck stringsProp(unsigned int id, std::vector<std::string> const& value) {
-    return {id, [id, value](IC::Node const* node) { return hasStrings(node, id, value); }};
-}
 inline PropertyCheck noProp(unsigned int id) {
     return {id, [id](IC::Node const* node) { return lacksProperty(node, id); }};
 }
