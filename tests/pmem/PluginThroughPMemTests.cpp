@@ -152,14 +152,6 @@ std::map<std::string, std::vector<uint8_t>> corpusImagesStartingWith(std::string
     return images;
 }
 
-#define REQUIRE_CORPUS()                                                            \
-    do {                                                                            \
-        if (smbiostest::corpusDir().empty()) {                                      \
-            GTEST_SKIP() << "no SMBIOS corpus folder (SMBIOS_CORPUS_DIR); no real " \
-                            "machine's dump to serve";                              \
-        }                                                                           \
-    } while (0)
-
 }  // namespace
 
 // A 2.x dump served as an image at 0: dmidecode's --dump-bin layout puts the
@@ -170,7 +162,7 @@ std::map<std::string, std::vector<uint8_t>> corpusImagesStartingWith(std::string
 // byte (0x1E of the dump), which for some machines differs from the "_SM_"
 // version (a BCD byte of 0 gives 0.0).
 TEST(PluginThroughPMemCorpus, Sm2DumpsServedAsAnImageAtZeroGiveTheOverrideFilesStructures) {
-    REQUIRE_CORPUS();
+    SMBIOS_SKIP_WITHOUT_CORPUS("to serve");
     smbiostest::TempDir work;
     std::map<std::string, std::vector<uint8_t>> const images = corpusImagesStartingWith("_SM_");
     for (auto const& [name, bin] : images) {
@@ -196,7 +188,7 @@ TEST(PluginThroughPMemCorpus, Sm2DumpsServedAsAnImageAtZeroGiveTheOverrideFilesS
 // point's maximum size. The plug-in sees the equivalent "_SM_" entry point
 // and gets the dump's structures and the version dmidecode printed.
 TEST(PluginThroughPMemCorpus, Sm3DumpsServedThroughSysfsGiveTheirStructuresAndVersion) {
-    REQUIRE_CORPUS();
+    SMBIOS_SKIP_WITHOUT_CORPUS("to serve");
     smbiostest::TempDir work;
     std::map<std::string, std::vector<uint8_t>> const images = corpusImagesStartingWith("_SM3_");
     for (auto const& [name, bin] : images) {

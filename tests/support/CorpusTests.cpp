@@ -56,20 +56,10 @@ uint8_t sum(std::vector<uint8_t> const& bytes, size_t begin, size_t end) {
     return total;
 }
 
-#define REQUIRE_CORPUS()                                                                    \
-    do {                                                                                    \
-        if (smbiostest::corpusDir().empty()) {                                              \
-            GTEST_SKIP() << "SMBIOS_CORPUS_DIR is unset or not a folder; no real dumps to " \
-                            "read";                                                         \
-        }                                                                                   \
-        ASSERT_FALSE(smbiostest::corpusNames().empty())                                     \
-            << "no .bin dumps in " << smbiostest::corpusDir();                              \
-    } while (0)
-
 }  // namespace
 
 TEST(CorpusDumps, Sm2DumpsMatchDmidecodeStructureCountAndSize) {
-    REQUIRE_CORPUS();
+    SMBIOS_REQUIRE_CORPUS("to read");
     int checked = 0;
     for (std::string const& name : smbiostest::corpusNames()) {
         SCOPED_TRACE(name);
@@ -94,7 +84,7 @@ TEST(CorpusDumps, Sm2DumpsMatchDmidecodeStructureCountAndSize) {
 }
 
 TEST(CorpusDumps, Sm3DumpsConvertWithDmidecodeStructureCount) {
-    REQUIRE_CORPUS();
+    SMBIOS_REQUIRE_CORPUS("to read");
     int checked = 0;
     for (std::string const& name : smbiostest::corpusNames()) {
         SCOPED_TRACE(name);
@@ -127,7 +117,7 @@ TEST(CorpusDumps, Sm3DumpsConvertWithDmidecodeStructureCount) {
 }
 
 TEST(CorpusDumps, EveryDumpSurvivesOverrideRoundTrip) {
-    REQUIRE_CORPUS();
+    SMBIOS_REQUIRE_CORPUS("to read");
     for (std::string const& name : smbiostest::corpusNames()) {
         SCOPED_TRACE(name);
         smbiosdump::DumpImage image;

@@ -86,6 +86,23 @@ std::vector<std::string> corpusNames();
 // false when the file has no such line.
 bool dmidecodeVersion(std::string const& name, unsigned int& major, unsigned int& minor);
 
+// In a test: skips it when there is no corpus folder, saying that there are
+// no real dumps for `purpose` ("to read"). The second also fails it when the
+// folder holds no dump.
+#define SMBIOS_SKIP_WITHOUT_CORPUS(purpose)                                              \
+    do {                                                                                 \
+        if (smbiostest::corpusDir().empty()) {                                           \
+            GTEST_SKIP() << "SMBIOS_CORPUS_DIR is unset or not a folder; no real dumps " \
+                         << purpose;                                                     \
+        }                                                                                \
+    } while (0)
+#define SMBIOS_REQUIRE_CORPUS(purpose)                         \
+    do {                                                       \
+        SMBIOS_SKIP_WITHOUT_CORPUS(purpose);                   \
+        ASSERT_FALSE(smbiostest::corpusNames().empty())        \
+            << "no .bin dumps in " << smbiostest::corpusDir(); \
+    } while (0)
+
 // The names in a folder (without "." and ".."), sorted; empty when it cannot
 // be read.
 std::vector<std::string> folderEntries(std::string const& folder);
