@@ -151,6 +151,19 @@ std::string PMemTest::file(std::string const& name, std::vector<uint8_t> const& 
     return path;
 }
 
+void PMemTest::serveImage(std::vector<uint8_t> const& entryPoint,
+                          std::vector<uint8_t> const& table) {
+    env("PMEM_IMAGE", imageItem(file("bios.bin", biosArea(entryPoint, kAnchor)), kBiosArea) + "," +
+                          imageItem(file("table.bin", table), kTableAddress));
+}
+
+std::vector<uint8_t> PMemTest::serveSampleImage() {
+    std::vector<uint8_t> const table = sampleTable();
+    std::vector<uint8_t> const ep = smEntryPoint(table, 2, 7, kTableAddress);
+    serveImage(ep, table);
+    return ep;
+}
+
 std::string PMemTest::sysfsFolder(std::vector<uint8_t> const* entryPoint,
                                   std::vector<uint8_t> const* table) {
     std::string const folder = work_.file("sysfs");

@@ -112,6 +112,12 @@ protected:
     // A folder holding smbios_entry_point and DMI (each only when given).
     std::string sysfsFolder(std::vector<uint8_t> const* entryPoint,
                             std::vector<uint8_t> const* table);
+    // The memory image (PMEM_IMAGE) of a machine: the BIOS area with
+    // `entryPoint` at kAnchor, and `table` at kTableAddress.
+    void serveImage(std::vector<uint8_t> const& entryPoint, std::vector<uint8_t> const& table);
+    // serveImage of the sample table under a 2.7 "_SM_" entry point; the
+    // entry point.
+    std::vector<uint8_t> serveSampleImage();
     PMemLibrary& load();
 
     smbiostest::TempDir work_;
