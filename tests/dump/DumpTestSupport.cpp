@@ -63,23 +63,6 @@ std::string inventoryWithoutClock(std::string const& json, unsigned& masked) {
     return document.dump(2);
 }
 
-uint8_t byteSum(Bytes const& bytes, size_t begin, size_t end) {
-    uint8_t sum = 0;
-    for (size_t i = begin; i < end && i < bytes.size(); ++i) {
-        sum = static_cast<uint8_t>(sum + bytes[i]);
-    }
-    return sum;
-}
-
-uint16_t word(Bytes const& bytes, size_t offset) {
-    return static_cast<uint16_t>(bytes.at(offset) | (bytes.at(offset + 1) << 8));
-}
-
-uint32_t dword(Bytes const& bytes, size_t offset) {
-    return static_cast<uint32_t>(word(bytes, offset)) |
-           (static_cast<uint32_t>(word(bytes, offset + 2)) << 16);
-}
-
 Bytes sampleTable() {
     return smbiostest::TableBuilder()
         .add(smbiostest::Structure(0, 0x0000).str("Corvane").str("1.02").byte(0x0F))

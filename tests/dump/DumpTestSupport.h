@@ -60,11 +60,10 @@ std::string readText(std::string const& path);
 // `masked` counts the values removed. "" when the text is not JSON.
 std::string inventoryWithoutClock(std::string const& json, unsigned& masked);
 
-// The 8-bit sum of bytes[begin, end).
-uint8_t byteSum(Bytes const& bytes, size_t begin, size_t end);
-
-uint16_t word(Bytes const& bytes, size_t offset);
-uint32_t dword(Bytes const& bytes, size_t offset);
+// The 8-bit sum of bytes[begin, end); the little-endian word and double word.
+using smbiostest::byteSum;
+using smbiostest::dword;
+using smbiostest::word;
 
 // A small table of three structures (BIOS, system, end of table).
 Bytes sampleTable();

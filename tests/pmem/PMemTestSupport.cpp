@@ -220,23 +220,6 @@ std::vector<uint8_t> smEntryPoint(std::vector<uint8_t> const& table, uint8_t maj
                                         stats.count, stats.maxSize);
 }
 
-uint8_t byteSum(std::vector<uint8_t> const& bytes, size_t begin, size_t end) {
-    uint8_t sum = 0;
-    for (size_t i = begin; i < end && i < bytes.size(); ++i) {
-        sum = static_cast<uint8_t>(sum + bytes[i]);
-    }
-    return sum;
-}
-
-uint16_t word(std::vector<uint8_t> const& bytes, size_t at) {
-    return static_cast<uint16_t>(bytes.at(at) | (bytes.at(at + 1) << 8));
-}
-
-uint32_t dword(std::vector<uint8_t> const& bytes, size_t at) {
-    return static_cast<uint32_t>(word(bytes, at)) |
-           (static_cast<uint32_t>(word(bytes, at + 2)) << 16);
-}
-
 void putDword(std::vector<uint8_t>& bytes, size_t at, uint32_t value) {
     for (size_t i = 0; i < 4; ++i) {
         bytes.at(at + i) = static_cast<uint8_t>((value >> (8 * i)) & 0xFF);

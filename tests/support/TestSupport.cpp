@@ -231,6 +231,23 @@ std::vector<std::string> corpusNames() {
     return names;
 }
 
+uint8_t byteSum(std::vector<uint8_t> const& bytes, size_t begin, size_t end) {
+    uint8_t sum = 0;
+    for (size_t i = begin; i < end && i < bytes.size(); ++i) {
+        sum = static_cast<uint8_t>(sum + bytes[i]);
+    }
+    return sum;
+}
+
+uint16_t word(std::vector<uint8_t> const& bytes, size_t at) {
+    return static_cast<uint16_t>(bytes.at(at) | (bytes.at(at + 1) << 8));
+}
+
+uint32_t dword(std::vector<uint8_t> const& bytes, size_t at) {
+    return static_cast<uint32_t>(word(bytes, at)) |
+           (static_cast<uint32_t>(word(bytes, at + 2)) << 16);
+}
+
 void writeOverrideDir(std::string const& dataDir, std::vector<uint8_t> const& header,
                       std::vector<uint8_t> const& table) {
     std::string const dir = withoutTrailingSlash(dataDir) + "/SmBiosOverride";
