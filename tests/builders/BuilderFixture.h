@@ -23,11 +23,13 @@
 namespace buildertest {
 
 using frametest::firstLogged;
+using frametest::group;
 using frametest::hasNodeType;
 using frametest::hasStrings;
 using frametest::hasUnsigned;
 using frametest::hasUnsignedList;
 using frametest::hasVersion;
+using frametest::isNode;
 using frametest::lacksProperty;
 using frametest::loggedLevels;
 using frametest::loggedTexts;
@@ -36,6 +38,7 @@ using frametest::readNumberOfKind;
 using frametest::readOfKind;
 using frametest::readProperty;
 using frametest::StructureLists;
+using frametest::tableOf;
 using frametest::TestMI;
 using smbiostest::LogCapture;
 using smbiostest::Structure;
@@ -101,29 +104,6 @@ inline ::testing::AssertionResult hasBytes(IC::Node const* node, unsigned int id
                                              << ", expected " << IC::PropertyValue(expected, true);
     }
     return read;
-}
-
-// Node id, linked id, type, index, status and description in one check.
-inline ::testing::AssertionResult isNode(IC::Node const* node, unsigned int id,
-                                         unsigned int linkedId, unsigned int type,
-                                         unsigned int index, unsigned int status,
-                                         std::string const& description) {
-    if (node == nullptr) {
-        return ::testing::AssertionFailure() << "no node";
-    }
-    ::testing::AssertionResult typed = hasNodeType(node, type);
-    if (!typed) {
-        return typed;
-    }
-    if (node->getNodeId() != id || node->getLinkedId() != linkedId || node->getIndex() != index ||
-        node->getStatus() != status || node->getDescription() != description) {
-        return ::testing::AssertionFailure()
-               << "node {id " << node->getNodeId() << ", linked " << node->getLinkedId()
-               << ", index " << node->getIndex() << ", status " << node->getStatus() << ", \""
-               << node->getDescription() << "\"}, expected {id " << id << ", linked " << linkedId
-               << ", index " << index << ", status " << status << ", \"" << description << "\"}";
-    }
-    return ::testing::AssertionSuccess();
 }
 
 // The text that names an input value in failure messages: numbers as
@@ -288,15 +268,6 @@ struct ParsedTable {
     StructureLists lists;
 };
 
-// A table of the structures, in order.
-inline TableBuilder tableOf(std::vector<Structure> const& structures) {
-    TableBuilder table;
-    for (Structure const& structure : structures) {
-        table.add(structure);
-    }
-    return table;
-}
-
 // The structures as a table ended by an End-of-Table structure (handle
 // 0xFEFF).
 inline TableBuilder endedTableOf(std::vector<Structure> const& structures) {
@@ -453,17 +424,6 @@ inline Structure oemStrings(uint16_t handle, std::vector<std::string> const& str
     structure.byte(static_cast<uint8_t>(strings.size()));
     for (std::string const& text : strings) {
         structure.addString(text);
-    }
-    return structure;
-}
-
-// A group association (type 14) with its items, each (type, handle).
-inline Structure group(uint16_t handle, std::string const& name,
-                       std::vector<std::pair<uint8_t, uint16_t>> const& items) {
-    Structure structure(14, handle);
-    structure.str(name);
-    for (auto const& item : items) {
-        structure.byte(item.first).word(item.second);
     }
     return structure;
 }

@@ -88,13 +88,8 @@ TEST(ProcessorCacheNodes, MatchingCacheFieldByField) {
     EXPECT_EQ(4u, run.mi.nextNodeId);
     IC::Node const* node = run.nodes[0];
     EXPECT_EQ(node, run.mi.nodeList[1]);
-    EXPECT_TRUE(hasNodeType(node, 31));
-    EXPECT_EQ(3u, node->getNodeId());
-    EXPECT_EQ(2u, node->getLinkedId());
-    // The index is the structure's position among the cache structures.
-    EXPECT_EQ(1u, node->getIndex());
-    EXPECT_EQ(1u, node->getStatus());
-    EXPECT_EQ("Processor Cache", node->getDescription());
+    // Index 1: the structure's position among the cache structures.
+    EXPECT_TRUE(isNode(node, 3, 2, 31, 1, 1, "Processor Cache"));
     EXPECT_EQ(run.mi.miIdList, node->getMIIds());
     EXPECT_EQ((std::vector<unsigned int>{5, 9, 30, 37, 53, 57, 69, 72, 73, 112, 125, 173}),
               propertyIds(node));

@@ -4,6 +4,7 @@
 // IC::SMBIOS_MI_SLOT::slotMap.
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cstdint>
 #include <map>
 #include <string>
@@ -20,16 +21,36 @@ namespace {
 char const* const SLOT_LOGGER = "Quillon.IC.MI.SmBiosMI.SmBiosMISlot";
 unsigned int const SLOT_NODE = 62;
 
-// The SMBIOS slot types the agent knows and its slot type for each; every
-// other SMBIOS slot type is reported as 1 (other).
-std::vector<std::pair<unsigned int, unsigned int>> const EXPECTED_SLOT_MAP = {
-    {0x01, 1},  {0x02, 0},  {0x03, 1},  {0x04, 1},  {0x05, 1},  {0x06, 16}, {0x07, 1},
-    {0x08, 1},  {0x09, 1},  {0x0A, 7},  {0x0B, 7},  {0x0C, 7},  {0x0D, 1},  {0x0E, 16},
-    {0x0F, 1},  {0x10, 1},  {0x11, 1},  {0x12, 17}, {0x13, 1},  {0xA0, 1},  {0xA1, 1},
-    {0xA2, 1},  {0xA3, 1},  {0xA4, 1},  {0xA5, 18}, {0xA6, 19}, {0xA7, 20}, {0xA8, 21},
-    {0xA9, 22}, {0xAA, 23}, {0xAB, 18}, {0xAC, 19}, {0xAD, 20}, {0xAE, 21}, {0xAF, 22},
-    {0xB0, 23}, {0xB1, 18}, {0xB2, 19}, {0xB3, 20}, {0xB4, 21}, {0xB5, 22}, {0xB6, 23},
-};
+// The SMBIOS slot types the agent knows, by the agent's slot type they
+// get, as (SMBIOS slot type, agent slot type) pairs in the order of the
+// SMBIOS slot types; every other SMBIOS slot type is reported as 1 (other).
+std::vector<std::pair<unsigned int, unsigned int>> expectedSlotMap() {
+    std::map<unsigned int, std::vector<unsigned int>> const byAgentType = {
+        {0, {0x02}},
+        {1,
+         {0x01, 0x03, 0x04, 0x05, 0x07, 0x08, 0x09, 0x0D, 0x0F, 0x10, 0x11, 0x13, 0xA0, 0xA1, 0xA2,
+          0xA3, 0xA4}},
+        {7, {0x0A, 0x0B, 0x0C}},
+        {16, {0x06, 0x0E}},
+        {17, {0x12}},
+        {18, {0xA5, 0xAB, 0xB1}},
+        {19, {0xA6, 0xAC, 0xB2}},
+        {20, {0xA7, 0xAD, 0xB3}},
+        {21, {0xA8, 0xAE, 0xB4}},
+        {22, {0xA9, 0xAF, 0xB5}},
+        {23, {0xAA, 0xB0, 0xB6}},
+    };
+    std::vector<std::pair<unsigned int, unsigned int>> pairs;
+    for (auto const& agentType : byAgentType) {
+        for (unsigned int smbiosType : agentType.second) {
+            pairs.emplace_back(smbiosType, agentType.first);
+        }
+    }
+    std::sort(pairs.begin(), pairs.end());
+    return pairs;
+}
+
+std::vector<std::pair<unsigned int, unsigned int>> const EXPECTED_SLOT_MAP = expectedSlotMap();
 
 // A System Slots structure of SMBIOS 2.1 (length 0x0D): designation (0x04),
 // slot type (0x05), data bus width, current usage, slot length, slot id

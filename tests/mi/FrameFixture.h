@@ -10,6 +10,7 @@
 #include <cstdint>
 #include <sstream>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "DumpFormat.h"
@@ -68,6 +69,26 @@ inline SD::SmBios parse(smbiostest::TableBuilder const& builder) {
     return SD::SmBios(builder.build());
 }
 
+// A table of the structures, in order.
+inline smbiostest::TableBuilder tableOf(std::vector<smbiostest::Structure> const& structures) {
+    smbiostest::TableBuilder table;
+    for (smbiostest::Structure const& structure : structures) {
+        table.add(structure);
+    }
+    return table;
+}
+
+// A group association (type 14) with its items, each (type, handle).
+inline smbiostest::Structure group(uint16_t handle, std::string const& name,
+                                   std::vector<std::pair<uint8_t, uint16_t>> const& items) {
+    smbiostest::Structure structure(14, handle);
+    structure.str(name);
+    for (auto const& item : items) {
+        structure.byte(item.first).word(item.second);
+    }
+    return structure;
+}
+
 inline IC::MutableNode const* asMutable(IC::Node const* node) {
     return dynamic_cast<IC::MutableNode const*>(node);
 }
@@ -81,6 +102,29 @@ inline ::testing::AssertionResult hasNodeType(IC::Node const* node, unsigned int
     if (mutableNode->getNodeType() != type) {
         return ::testing::AssertionFailure()
                << "node type " << mutableNode->getNodeType() << ", expected " << type;
+    }
+    return ::testing::AssertionSuccess();
+}
+
+// Node id, linked id, type, index, status and description in one check.
+inline ::testing::AssertionResult isNode(IC::Node const* node, unsigned int id,
+                                         unsigned int linkedId, unsigned int type,
+                                         unsigned int index, unsigned int status,
+                                         std::string const& description) {
+    if (node == nullptr) {
+        return ::testing::AssertionFailure() << "no node";
+    }
+    ::testing::AssertionResult typed = hasNodeType(node, type);
+    if (!typed) {
+        return typed;
+    }
+    if (node->getNodeId() != id || node->getLinkedId() != linkedId || node->getIndex() != index ||
+        node->getStatus() != status || node->getDescription() != description) {
+        return ::testing::AssertionFailure()
+               << "node {id " << node->getNodeId() << ", linked " << node->getLinkedId()
+               << ", index " << node->getIndex() << ", status " << node->getStatus() << ", \""
+               << node->getDescription() << "\"}, expected {id " << id << ", linked " << linkedId
+               << ", index " << index << ", status " << status << ", \"" << description << "\"}";
     }
     return ::testing::AssertionSuccess();
 }
@@ -260,6 +304,20 @@ inline ::testing::AssertionResult hasVersion(IC::Node const* node, unsigned int 
         return ::testing::AssertionFailure()
                << "property " << id << " is version " << version.getMajor() << "."
                << version.getMinor() << ", expected " << major << "." << minor;
+    }
+    return ::testing::AssertionSuccess();
+}
+
+// Each text is in `times` captured messages (LogCapture::count: the log and
+// the trace output each count).
+inline ::testing::AssertionResult loggedTimes(smbiostest::LogCapture const& log, size_t times,
+                                              std::vector<std::string> const& texts) {
+    for (std::string const& text : texts) {
+        if (log.count(text) != times) {
+            return ::testing::AssertionFailure() << "\"" << text << "\" is in " << log.count(text)
+                                                 << " messages, expected " << times << "\n"
+                                                 << log.dump();
+        }
     }
     return ::testing::AssertionSuccess();
 }
