@@ -4,14 +4,12 @@
 // runs in a process of its own, because the table is acquired once per
 // process.
 #include <dlfcn.h>
-#include <fcntl.h>
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
 #include <algorithm>
-#include <chrono>
-#include <future>
+#include <memory>
 #include <string>
 #include <thread>
 #include <vector>
@@ -139,25 +137,9 @@ std::vector<unsigned int> typesOf(SD::SmBios const& smbios) {
     return types;
 }
 
-// Acquires the table on a thread of its own. When the acquisition has not
-// ended within 10 s it is taken to wait on the FIFO `fifo` for a writer: one
-// opens the FIFO and goes at once (again every 100 ms until the acquisition
-// ends), which releases the reader, and `waited` is set, so that the test
-// fails instead of hanging.
-SD::SmBios acquireReleasingFifo(std::string const& fifo, bool& waited) {
-    std::future<SD::SmBios> acquiring = std::async(std::launch::async, [] { return SD::SmBios(); });
-    waited = false;
-    std::chrono::milliseconds patience(10000);
-    while (acquiring.wait_for(patience) != std::future_status::ready) {
-        waited = true;
-        patience = std::chrono::milliseconds(100);
-        int const writer = open(fifo.c_str(), O_WRONLY | O_NONBLOCK | O_CLOEXEC);
-        if (writer >= 0) {
-            close(writer);
-        }
-    }
-    return acquiring.get();
-}
+// The types of the sample table in handle order, the end-of-table structure
+// at its handle's place.
+std::vector<unsigned int> const kSampleTypes = {0, 1, 4, 127, 17};
 
 // Each test starts with no acquisition made in its process, an empty data
 // directory (no override file) and the code directory it names.
@@ -172,9 +154,102 @@ protected:
         codeDir_.reset(new ScopedEnv("KESTREL_CODE_DIR", dir));
     }
 
+    // The stand-in library's fake memory, loaded (and emptied) on first use;
+    // the code directory then names the library's folder.
+    FakePMem& memory() {
+        if (!fake_) {
+            fake_.reset(new FakePMem(kFakeFull));
+            useCodeDir(kFakeFull);
+        }
+        return *fake_;
+    }
+    // Fake memory holding `region` at `address` and `table` at kTableAddress.
+    FakePMem& machineWith(unsigned long address, std::vector<uint8_t> const& region,
+                          std::vector<uint8_t> const& table) {
+        FakePMem& fake = memory();
+        fake.map(address, region);
+        fake.map(kTableAddress, table);
+        return fake;
+    }
+    // A machine whose BIOS area holds `entry` at kSmAnchor, the sample table
+    // at kTableAddress.
+    FakePMem& biosMachine(std::vector<uint8_t> const& entry) {
+        return machineWith(0xF0000, biosAreaWith(entry, kSmAnchor), table_);
+    }
+    // A machine whose BIOS area holds a valid 2.<minor> "_SM_" entry point
+    // of the sample table.
+    FakePMem& smMachine(uint8_t minor) { return biosMachine(smEntryPoint(table_, 2, minor)); }
+    // The legacy "_DMI_" entry point of the sample table (5 structures at
+    // `address`), BCD revision `bcd`.
+    std::vector<uint8_t> legacyEntry(uint8_t bcd, uint32_t address) const {
+        return smbiosdump::makeDmiEntryPoint(bcd, static_cast<uint16_t>(table_.size()), address, 5);
+    }
+
+    // The override file of the sample table with `entry` as its header.
+    void writeOverride(std::vector<uint8_t> const& entry) {
+        smbiostest::writeOverrideDir(dataDir_.path(), entry, table_);
+    }
+    // An override file of the text `text`.
+    void writeOverrideText(std::string const& text) {
+        writeOverride(smEntryPoint(table_, 2, 7));
+        smbiostest::writeFile(overridePath(), text);
+    }
+    std::string overridePath() const { return dataDir_.path() + "/SmBiosOverride/smbios.txt"; }
+
+    // Starts capturing the log, then acquires the table.
+    SD::SmBios acquire() {
+        captureLog();
+        return SD::SmBios();
+    }
+    void captureLog() { log_.reset(new LogCapture); }
+    void expectLogged(std::string const& line) const {
+        EXPECT_TRUE(log_->contains(line)) << log_->dump();
+    }
+    void expectNotLogged(std::string const& line) const {
+        EXPECT_FALSE(log_->contains(line)) << log_->dump();
+    }
+    // An acquisition that came out empty, with `line` in its log.
+    void expectEmpty(SD::SmBios const& smbios, std::string const& line) const {
+        EXPECT_TRUE(smbios.getTables().empty());
+        expectLogged(line);
+    }
+    // An override file with `entry` as its header that is rejected with
+    // `line` in the log.
+    void expectOverrideRejected(std::vector<uint8_t> const& entry, std::string const& line) {
+        writeOverride(entry);
+        expectEmpty(acquire(), line);
+    }
+    void expectAllLogged(std::vector<std::string> const& lines) const {
+        for (std::string const& line : lines) {
+            expectLogged(line);
+        }
+    }
+    // An override file that gives no table leaves the acquisition to
+    // memory, which holds a 2.<minor> table.
+    static void expectMemoryTable(SD::SmBios const& smbios, FakePMem const& fake, int minor) {
+        EXPECT_EQ(smbios.getMinorVersion(), minor);
+        EXPECT_EQ(smbios.getTables().size(), 5u);
+        EXPECT_EQ(fake.opens(), 1);
+    }
+    // The sample table acquired through a legacy entry point of BCD revision
+    // 0x24, with `lines` in the log.
+    void expectLegacyTable(SD::SmBios const& smbios, std::vector<std::string> const& lines) const {
+        expectVersion(smbios, 2, 4, 0);
+        EXPECT_EQ(smbios.getTables().size(), 5u);
+        expectAllLogged(lines);
+    }
+    static void expectVersion(SD::SmBios const& smbios, int major, int minor, int revision) {
+        EXPECT_EQ(smbios.getMajorVersion(), major);
+        EXPECT_EQ(smbios.getMinorVersion(), minor);
+        EXPECT_EQ(smbios.getRevision(), revision);
+    }
+
+    std::vector<uint8_t> const table_ = sampleTable();
     TempDir dataDir_;
     ScopedEnv dataEnv_{"KESTREL_DATA_DIR", dataDir_.path() + "/"};
     std::unique_ptr<ScopedEnv> codeDir_;
+    std::unique_ptr<FakePMem> fake_;
+    std::unique_ptr<LogCapture> log_;
 };
 
 }  // namespace
@@ -182,30 +257,21 @@ protected:
 TEST_F(Acquisition, NoOverrideAndNoLibraryGivesEmptyTableAndLogsLibraryMessage) {
     TempDir emptyCodeDir;
     useCodeDir(emptyCodeDir.path() + "/");
-    LogCapture log;
-    SD::SmBios smbios;
-    EXPECT_TRUE(smbios.getTables().empty());
+    std::string const library = emptyCodeDir.path() + "/libpmem.so";
+    SD::SmBios const smbios = acquire();
+    expectEmpty(smbios, "Constructor Exception=PMEM: could not load library '" + library + "'.");
     EXPECT_EQ(smbios.getMajorVersion(), 0);
     EXPECT_EQ(smbios.getMinorVersion(), 0);
-    std::string const expected = "Constructor Exception=PMEM: could not load library '" +
-                                 emptyCodeDir.path() + "/libpmem.so'.";
-    EXPECT_TRUE(log.contains(expected)) << log.dump();
-    EXPECT_TRUE(log.contains(" Type=")) << log.dump();
-    EXPECT_TRUE(log.contains("Constructor could not load library '" + emptyCodeDir.path() +
-                             "/libpmem.so' - exception return"))
-        << log.dump();
-    EXPECT_TRUE(log.contains("importSmBios() file not found, using machine SMBios")) << log.dump();
+    expectLogged(" Type=");
+    expectLogged("Constructor could not load library '" + library + "' - exception return");
+    expectLogged("importSmBios() file not found, using machine SMBios");
 }
 
 TEST_F(Acquisition, BrokenLibraryFileIsReportedAsNotLoadable) {
     TempDir codeDir;
     smbiostest::writeFile(codeDir.file("libpmem.so"), "this is not a shared library\n");
     useCodeDir(codeDir.path() + "/");
-    LogCapture log;
-    SD::SmBios smbios;
-    EXPECT_TRUE(smbios.getTables().empty());
-    EXPECT_TRUE(log.contains("PMEM: could not load library '" + codeDir.path() + "/libpmem.so'."))
-        << log.dump();
+    expectEmpty(acquire(), "PMEM: could not load library '" + codeDir.path() + "/libpmem.so'.");
 }
 
 TEST_F(Acquisition, LibraryThatDoesNotInitializeIsUnloadedAndReported) {
@@ -215,15 +281,9 @@ TEST_F(Acquisition, LibraryThatDoesNotInitializeIsUnloadedAndReported) {
         << "the library is loaded before the test";
     ScopedEnv const notInitialized("FAKE_PMEM_INITIALIZED", "0");
     useCodeDir(kFakeFull);
-    LogCapture log;
-    SD::SmBios smbios;
-    EXPECT_TRUE(smbios.getTables().empty());
-    EXPECT_TRUE(log.contains("Constructor Exception=PMEM: library '" + kFakeFull +
-                             "libpmem.so' did not initialize."))
-        << log.dump();
-    EXPECT_TRUE(log.contains("Constructor library '" + kFakeFull +
-                             "libpmem.so' did not initialize - exception return"))
-        << log.dump();
+    expectEmpty(acquire(),
+                "Constructor Exception=PMEM: library '" + library + "' did not initialize.");
+    expectLogged("Constructor library '" + library + "' did not initialize - exception return");
     void* const still = dlopen(library.c_str(), RTLD_NOW | RTLD_NOLOAD);
     EXPECT_EQ(still, nullptr) << "the library stayed loaded";
     if (still != nullptr) {
@@ -233,13 +293,8 @@ TEST_F(Acquisition, LibraryThatDoesNotInitializeIsUnloadedAndReported) {
 
 TEST_F(Acquisition, LibraryLackingPMemSearchCannotExportAllSymbols) {
     useCodeDir(kFakeNoSearch);
-    LogCapture log;
-    SD::SmBios smbios;
-    EXPECT_TRUE(smbios.getTables().empty());
-    EXPECT_TRUE(log.contains("Constructor Exception=PMEM: could not export all symbols."))
-        << log.dump();
-    EXPECT_TRUE(log.contains("Constructor could not export all symbols - exception return"))
-        << log.dump();
+    expectEmpty(acquire(), "Constructor Exception=PMEM: could not export all symbols.");
+    expectLogged("Constructor could not export all symbols - exception return");
 }
 
 TEST_F(Acquisition, PMemConstructionErrorsAreRuntimeErrorsWithTheLibraryMessage) {
@@ -255,9 +310,7 @@ TEST_F(Acquisition, PMemConstructionErrorsAreRuntimeErrorsWithTheLibraryMessage)
 }
 
 TEST_F(Acquisition, PMemReadPassesTheLibraryResultThroughUnchanged) {
-    FakePMem fake(kFakeFull);
-    fake.map(0x1000, {1, 2, 3, 4});
-    useCodeDir(kFakeFull);
+    memory().map(0x1000, {1, 2, 3, 4});
     SD::PMem pmem;
     ASSERT_TRUE(pmem.open());
     unsigned char buffer[4] = {};
@@ -265,9 +318,9 @@ TEST_F(Acquisition, PMemReadPassesTheLibraryResultThroughUnchanged) {
     EXPECT_EQ(buffer[3], 4);
     EXPECT_EQ(pmem.read(buffer, 0x2000, 4), -1);
     // Not mapped to a failure value of its own: the library's code arrives.
-    fake.setReadFailure(-7);
+    memory().setReadFailure(-7);
     EXPECT_EQ(pmem.read(buffer, 0x2000, 4), -7);
-    fake.setReadFailure(3);
+    memory().setReadFailure(3);
     EXPECT_EQ(pmem.read(buffer, 0x2000, 4), 3);
     EXPECT_EQ(pmem.search("\x03\x04", 0x1000, 0x1010, 1), 0x1002ul);
     EXPECT_EQ(pmem.search("\x09", 0x1000, 0x1010, 1), 0ul);
@@ -275,36 +328,24 @@ TEST_F(Acquisition, PMemReadPassesTheLibraryResultThroughUnchanged) {
 }
 
 TEST_F(Acquisition, SmEntryPointInBiosAreaGivesVersionAndSortedTables) {
-    std::vector<uint8_t> const table = sampleTable();
-    FakePMem fake(kFakeFull);
-    fake.map(0xF0000, biosAreaWith(smEntryPoint(table, 2, 7), kSmAnchor));
-    fake.map(kTableAddress, table);
-    useCodeDir(kFakeFull);
-    LogCapture log;
-    SD::SmBios smbios;
-    EXPECT_EQ(smbios.getMajorVersion(), 2);
-    EXPECT_EQ(smbios.getMinorVersion(), 7);
-    EXPECT_EQ(smbios.getRevision(), 0);
+    FakePMem const& fake = smMachine(7);
+    SD::SmBios const smbios = acquire();
+    expectVersion(smbios, 2, 7, 0);
     ASSERT_EQ(smbios.getTables().size(), 5u);
     std::vector<unsigned int> handles;
     for (SD::SmBios::Table const& t : smbios.getTables()) {
         handles.push_back(t.getHandle());
     }
     EXPECT_EQ(handles, (std::vector<unsigned int>{0x0000, 0x0100, 0x0100, 0x0180, 0x0200}));
-    EXPECT_TRUE(log.contains("Constructor found _SM_ header at " + std::to_string(kSmAnchor)))
-        << log.dump();
-    EXPECT_TRUE(log.contains("Constructor success")) << log.dump();
+    expectLogged("Constructor found _SM_ header at " + std::to_string(kSmAnchor));
+    expectLogged("Constructor success");
     EXPECT_EQ(fake.opens(), 1);
     EXPECT_EQ(fake.closes(), 1);
 }
 
 TEST_F(Acquisition, DuplicateHandlesAreBothKept) {
-    std::vector<uint8_t> const table = sampleTable();
-    FakePMem fake(kFakeFull);
-    fake.map(0xF0000, biosAreaWith(smEntryPoint(table, 2, 7), kSmAnchor));
-    fake.map(kTableAddress, table);
-    useCodeDir(kFakeFull);
-    SD::SmBios smbios;
+    smMachine(7);
+    SD::SmBios const smbios;
     std::vector<unsigned int> typesAt0100;
     for (SD::SmBios::Table const& t : smbios.getTables()) {
         if (t.getHandle() == 0x0100) {
@@ -316,12 +357,8 @@ TEST_F(Acquisition, DuplicateHandlesAreBothKept) {
 }
 
 TEST_F(Acquisition, EndOfTableStructureStandsAtItsHandlesPlace) {
-    std::vector<uint8_t> const table = sampleTable();
-    FakePMem fake(kFakeFull);
-    fake.map(0xF0000, biosAreaWith(smEntryPoint(table, 2, 7), kSmAnchor));
-    fake.map(kTableAddress, table);
-    useCodeDir(kFakeFull);
-    SD::SmBios smbios;
+    smMachine(7);
+    SD::SmBios const smbios;
     ASSERT_EQ(smbios.getTables().size(), 5u);
     EXPECT_EQ(smbios.getTables()[3].getType(), 127);
     EXPECT_EQ(smbios.getTables()[4].getType(), 17);
@@ -337,11 +374,9 @@ TEST_F(Acquisition, TableReadOfLengthLGivesTheParserTwoMoreZeroBytes) {
     std::vector<uint8_t> memoryBytes = table;
     memoryBytes.push_back(0xEE);  // what follows the table in memory is not read
     memoryBytes.push_back(0xEE);
-    FakePMem fake(kFakeFull);
-    fake.map(0xF0000, biosAreaWith(smEntryPoint(table, 2, 7), kSmAnchor));
-    fake.map(kTableAddress, memoryBytes);
+    FakePMem& fake =
+        machineWith(0xF0000, biosAreaWith(smEntryPoint(table, 2, 7), kSmAnchor), memoryBytes);
     fake.peekAfterReadAt(kTableAddress);
-    useCodeDir(kFakeFull);
     SD::SmBios smbios;
     // What the acquisition hands the parser: L bytes read from memory into a
     // buffer of L + 2 whose last two bytes are zero (the sanitizer build
@@ -364,60 +399,36 @@ TEST_F(Acquisition, TableReadOfLengthLGivesTheParserTwoMoreZeroBytes) {
 }
 
 TEST_F(Acquisition, SmEntryPointWithLengthZeroPassesTheChecksum) {
-    std::vector<uint8_t> const table = sampleTable();
-    std::vector<uint8_t> entry = smEntryPoint(table, 2, 5);
+    std::vector<uint8_t> entry = smEntryPoint(table_, 2, 5);
     entry[5] = 0;      // entry-point length 0: nothing is summed
     entry[4] ^= 0x5A;  // and the checksum byte no longer matches
-    FakePMem fake(kFakeFull);
-    fake.map(0xF0000, biosAreaWith(entry, kSmAnchor));
-    fake.map(kTableAddress, table);
-    useCodeDir(kFakeFull);
-    LogCapture log;
-    SD::SmBios smbios;
+    biosMachine(entry);
+    SD::SmBios const smbios = acquire();
     EXPECT_EQ(smbios.getTables().size(), 5u);
     EXPECT_EQ(smbios.getMinorVersion(), 5);
-    EXPECT_FALSE(log.contains("Constructor checksum 1 failed")) << log.dump();
+    expectNotLogged("Constructor checksum 1 failed");
 }
 
 TEST_F(Acquisition, SmEntryPointWithBadChecksumLeavesTableEmpty) {
-    std::vector<uint8_t> const table = sampleTable();
-    std::vector<uint8_t> entry = smEntryPoint(table, 2, 7);
+    std::vector<uint8_t> entry = smEntryPoint(table_, 2, 7);
     entry[4] ^= 0x01;
-    FakePMem fake(kFakeFull);
-    fake.map(0xF0000, biosAreaWith(entry, kSmAnchor));
-    fake.map(kTableAddress, table);
-    useCodeDir(kFakeFull);
-    LogCapture log;
-    SD::SmBios smbios;
-    EXPECT_TRUE(smbios.getTables().empty());
+    FakePMem const& fake = biosMachine(entry);
+    SD::SmBios const smbios = acquire();
+    expectEmpty(smbios, "Constructor checksum 1 failed");
     EXPECT_EQ(smbios.getMajorVersion(), 0);
-    EXPECT_TRUE(log.contains("Constructor checksum 1 failed")) << log.dump();
     EXPECT_EQ(fake.closes(), 1);
 }
 
 TEST_F(Acquisition, OnlyLegacyDmiEntryPointGivesBcdVersion) {
-    std::vector<uint8_t> const table = sampleTable();
-    FakePMem fake(kFakeFull);
-    fake.map(0x9FC00, smbiosdump::makeDmiEntryPoint(0x24, static_cast<uint16_t>(table.size()),
-                                                    kTableAddress, 5));
-    fake.map(kTableAddress, table);
-    useCodeDir(kFakeFull);
-    LogCapture log;
-    SD::SmBios smbios;
-    EXPECT_EQ(smbios.getMajorVersion(), 2);
-    EXPECT_EQ(smbios.getMinorVersion(), 4);
-    EXPECT_EQ(smbios.getRevision(), 0);
-    EXPECT_EQ(smbios.getTables().size(), 5u);
-    EXPECT_TRUE(log.contains("Constructo found _DMI_ header at 9fc00")) << log.dump();
-    EXPECT_TRUE(log.contains("Constructor success")) << log.dump();
+    machineWith(0x9FC00, legacyEntry(0x24, kTableAddress), table_);
+    expectLegacyTable(acquire(), {"Constructo found _DMI_ header at 9fc00", "Constructor success"});
 }
 
 TEST_F(Acquisition, SmAnchorBelowBiosAreaIsFoundThroughItsLegacyPart) {
     // The "_SM_" anchor at 0xE0000 is outside the first search; the legacy
     // search finds the "_DMI_" part 16 bytes into it and uses its fields:
     // its BCD revision (2.6) wins over the 2.x header's 2.7.
-    std::vector<uint8_t> const table = sampleTable();
-    std::vector<uint8_t> entry = smEntryPoint(table, 2, 7);
+    std::vector<uint8_t> entry = smEntryPoint(table_, 2, 7);
     entry[0x1E] = 0x26;
     unsigned int sum = 0;
     for (size_t i = 0x10; i < 0x1F; ++i) {
@@ -426,115 +437,68 @@ TEST_F(Acquisition, SmAnchorBelowBiosAreaIsFoundThroughItsLegacyPart) {
         }
     }
     entry[0x15] = static_cast<uint8_t>(0x100 - (sum & 0xFF));
-    FakePMem fake(kFakeFull);
-    fake.map(0xE0000, entry);
-    fake.map(kTableAddress, table);
-    useCodeDir(kFakeFull);
-    LogCapture log;
-    SD::SmBios smbios;
-    EXPECT_FALSE(log.contains("Constructor found _SM_ header at")) << log.dump();
-    EXPECT_TRUE(log.contains("Constructo found _DMI_ header at e0010")) << log.dump();
+    machineWith(0xE0000, entry, table_);
+    SD::SmBios const smbios = acquire();
+    expectNotLogged("Constructor found _SM_ header at");
+    expectLogged("Constructo found _DMI_ header at e0010");
     EXPECT_EQ(smbios.getMajorVersion(), 2);
     EXPECT_EQ(smbios.getMinorVersion(), 6);
     EXPECT_EQ(smbios.getTables().size(), 5u);
 }
 
 TEST_F(Acquisition, LegacyEntryPointWithBadChecksumLeavesTableEmpty) {
-    std::vector<uint8_t> const table = sampleTable();
-    std::vector<uint8_t> entry =
-        smbiosdump::makeDmiEntryPoint(0x24, static_cast<uint16_t>(table.size()), kTableAddress, 5);
+    std::vector<uint8_t> entry = legacyEntry(0x24, kTableAddress);
     entry[14] = 0x25;
-    FakePMem fake(kFakeFull);
-    fake.map(0x9FC00, entry);
-    fake.map(kTableAddress, table);
-    useCodeDir(kFakeFull);
-    LogCapture log;
-    SD::SmBios smbios;
-    EXPECT_TRUE(smbios.getTables().empty());
-    EXPECT_TRUE(log.contains("Constructor checksum 2 failed")) << log.dump();
+    machineWith(0x9FC00, entry, table_);
+    expectEmpty(acquire(), "Constructor checksum 2 failed");
 }
 
 TEST_F(Acquisition, NoAnchorInMemoryIsASignatureFailure) {
-    FakePMem fake(kFakeFull);
-    fake.map(0xF0000, std::vector<uint8_t>(0x10000, 0x00));
-    useCodeDir(kFakeFull);
-    LogCapture log;
-    SD::SmBios smbios;
-    EXPECT_TRUE(smbios.getTables().empty());
-    EXPECT_TRUE(log.contains("Constructor _SM_ or _DMI_ signature failed")) << log.dump();
-    EXPECT_EQ(fake.closes(), 1);
+    memory().map(0xF0000, std::vector<uint8_t>(0x10000, 0x00));
+    expectEmpty(acquire(), "Constructor _SM_ or _DMI_ signature failed");
+    EXPECT_EQ(memory().closes(), 1);
 }
 
 TEST_F(Acquisition, OpenFailureLeavesTableEmpty) {
-    FakePMem fake(kFakeFull);
-    fake.setOpenResult(0);
-    useCodeDir(kFakeFull);
-    LogCapture log;
-    SD::SmBios smbios;
-    EXPECT_TRUE(smbios.getTables().empty());
-    EXPECT_TRUE(log.contains("Constructor pmem.open failed")) << log.dump();
+    memory().setOpenResult(0);
+    expectEmpty(acquire(), "Constructor pmem.open failed");
 }
 
+// Each read the acquisition makes fails on its own: the entry point (read
+// 1), the legacy entry point (read 2) and the table (read 3).
+
 TEST_F(Acquisition, EntryPointReadFailureIsRead1) {
-    std::vector<uint8_t> const table = sampleTable();
-    FakePMem fake(kFakeFull);
-    fake.map(0xF0000, biosAreaWith(smEntryPoint(table, 2, 7), kSmAnchor));
-    fake.map(kTableAddress, table);
-    fake.failRead(1);
-    useCodeDir(kFakeFull);
-    LogCapture log;
-    SD::SmBios smbios;
-    EXPECT_TRUE(smbios.getTables().empty());
-    EXPECT_TRUE(log.contains("Constructor pmem.read 1 failed")) << log.dump();
-    EXPECT_EQ(fake.closes(), 1);
+    smMachine(7).failRead(1);
+    expectEmpty(acquire(), "Constructor pmem.read 1 failed");
+    EXPECT_EQ(memory().closes(), 1);
 }
 
 TEST_F(Acquisition, LegacyEntryPointReadFailureIsRead2) {
-    std::vector<uint8_t> const table = sampleTable();
-    FakePMem fake(kFakeFull);
-    fake.map(0x9FC00, smbiosdump::makeDmiEntryPoint(0x24, static_cast<uint16_t>(table.size()),
-                                                    kTableAddress, 5));
-    fake.map(kTableAddress, table);
-    fake.failRead(1);
-    useCodeDir(kFakeFull);
-    LogCapture log;
-    SD::SmBios smbios;
-    EXPECT_TRUE(smbios.getTables().empty());
-    EXPECT_TRUE(log.contains("Constructor pmem.read 2 failed")) << log.dump();
+    machineWith(0x9FC00, legacyEntry(0x24, kTableAddress), table_).failRead(1);
+    expectEmpty(acquire(), "Constructor pmem.read 2 failed");
 }
 
 TEST_F(Acquisition, TableReadFailureIsRead3) {
-    std::vector<uint8_t> const table = sampleTable();
-    FakePMem fake(kFakeFull);
-    fake.map(0xF0000, biosAreaWith(smEntryPoint(table, 2, 7), kSmAnchor));
     // The table is not mapped: reading it fails.
-    useCodeDir(kFakeFull);
-    LogCapture log;
-    SD::SmBios smbios;
-    EXPECT_TRUE(smbios.getTables().empty());
+    memory().map(0xF0000, biosAreaWith(smEntryPoint(table_, 2, 7), kSmAnchor));
+    SD::SmBios const smbios = acquire();
+    expectEmpty(smbios, "Constructor pmem.read 3 failed");
     EXPECT_EQ(smbios.getMajorVersion(), 0);
-    EXPECT_TRUE(log.contains("Constructor pmem.read 3 failed")) << log.dump();
-    EXPECT_EQ(fake.closes(), 1);
+    EXPECT_EQ(memory().closes(), 1);
 }
 
 TEST_F(Acquisition, FailedAcquisitionIsNotRetried) {
-    FakePMem fake(kFakeFull);
-    fake.setOpenResult(0);
-    useCodeDir(kFakeFull);
-    SD::SmBios first;
-    SD::SmBios second;
+    memory().setOpenResult(0);
+    SD::SmBios const first;
+    SD::SmBios const second;
     EXPECT_TRUE(second.getTables().empty());
-    EXPECT_EQ(fake.opens(), 1);
+    EXPECT_EQ(memory().opens(), 1);
 }
 
 TEST_F(Acquisition, LaterTablesAreCopiesOfTheFirstAcquisition) {
-    std::vector<uint8_t> const table = sampleTable();
-    FakePMem fake(kFakeFull);
-    fake.map(0xF0000, biosAreaWith(smEntryPoint(table, 2, 7), kSmAnchor));
-    fake.map(kTableAddress, table);
-    useCodeDir(kFakeFull);
-    SD::SmBios first;
-    SD::SmBios second;
+    FakePMem const& fake = smMachine(7);
+    SD::SmBios const first;
+    SD::SmBios const second;
     EXPECT_EQ(typesOf(first), typesOf(second));
     EXPECT_EQ(second.getMinorVersion(), 7);
     EXPECT_EQ(fake.opens(), 1);
@@ -542,246 +506,148 @@ TEST_F(Acquisition, LaterTablesAreCopiesOfTheFirstAcquisition) {
 }
 
 TEST_F(Acquisition, FirstAcquisitionFromSeveralThreadsHappensExactlyOnce) {
-    std::vector<uint8_t> const table = sampleTable();
-    FakePMem fake(kFakeFull);
-    fake.map(0xF0000, biosAreaWith(smEntryPoint(table, 2, 7), kSmAnchor));
-    fake.map(kTableAddress, table);
-    fake.setOpenDelay(50);  // widens the window in which the threads race
-    useCodeDir(kFakeFull);
+    smMachine(7).setOpenDelay(50);  // widens the window in which the threads race
     unsigned int const threadCount = 8;
     std::vector<std::vector<unsigned int>> seen(threadCount);
     std::vector<std::thread> threads;
     for (unsigned int i = 0; i < threadCount; ++i) {
-        threads.emplace_back([&seen, i]() {
-            SD::SmBios smbios;
-            seen[i] = typesOf(smbios);
-        });
+        threads.emplace_back([&seen, i]() { seen[i] = typesOf(SD::SmBios()); });
     }
     for (std::thread& t : threads) {
         t.join();
     }
-    EXPECT_EQ(fake.opens(), 1);
+    EXPECT_EQ(memory().opens(), 1);
     for (unsigned int i = 0; i < threadCount; ++i) {
-        EXPECT_EQ(seen[i], (std::vector<unsigned int>{0, 1, 4, 127, 17})) << "thread " << i;
+        EXPECT_EQ(seen[i], kSampleTypes) << "thread " << i;
     }
 }
 
 // The override dump file.
 
 TEST_F(Acquisition, OverrideFileIsUsedInsteadOfMemory) {
-    std::vector<uint8_t> const table = sampleTable();
-    smbiostest::writeOverrideDir(dataDir_.path(), smEntryPoint(table, 2, 8), table);
-    FakePMem fake(kFakeFull);
-    useCodeDir(kFakeFull);
-    LogCapture log;
-    SD::SmBios smbios;
+    writeOverride(smEntryPoint(table_, 2, 8));
+    FakePMem const& fake = memory();
+    SD::SmBios const smbios = acquire();
     EXPECT_EQ(smbios.getMajorVersion(), 2);
     EXPECT_EQ(smbios.getMinorVersion(), 8);
-    EXPECT_EQ(typesOf(smbios), (std::vector<unsigned int>{0, 1, 4, 127, 17}));
-    std::string const path = dataDir_.path() + "/SmBiosOverride/smbios.txt";
-    EXPECT_TRUE(log.contains("Constructor checking for " + path + " import smbios file"))
-        << log.dump();
-    EXPECT_TRUE(
-        log.contains("Constructor using " + path + " instead of this machine's SmBios Tables"))
-        << log.dump();
-    EXPECT_TRUE(log.contains("Constructor found _SM_ header length=31")) << log.dump();
-    EXPECT_TRUE(log.contains("Constructor checksum 1 good")) << log.dump();
-    EXPECT_TRUE(log.contains("Constructor version good")) << log.dump();
-    EXPECT_TRUE(log.contains("Constructor going to SmBios.getTables()")) << log.dump();
-    EXPECT_TRUE(log.contains("Constructor success")) << log.dump();
+    EXPECT_EQ(typesOf(smbios), kSampleTypes);
+    expectAllLogged(
+        {"Constructor checking for " + overridePath() + " import smbios file",
+         "Constructor using " + overridePath() + " instead of this machine's SmBios Tables",
+         "Constructor found _SM_ header length=31", "Constructor checksum 1 good",
+         "Constructor version good", "Constructor going to SmBios.getTables()",
+         "Constructor success"});
     EXPECT_EQ(fake.opens(), 0);
 }
 
 TEST_F(Acquisition, OverrideFileWithLegacyHeaderBcd24GivesVersion24Revision0) {
-    std::vector<uint8_t> const table = sampleTable();
-    smbiostest::writeOverrideDir(
-        dataDir_.path(),
-        smbiosdump::makeDmiEntryPoint(0x24, static_cast<uint16_t>(table.size()), 0xF0000, 5),
-        table);
-    LogCapture log;
-    SD::SmBios smbios;
-    EXPECT_EQ(smbios.getMajorVersion(), 2);
-    EXPECT_EQ(smbios.getMinorVersion(), 4);
-    EXPECT_EQ(smbios.getRevision(), 0);
-    EXPECT_EQ(smbios.getTables().size(), 5u);
-    EXPECT_TRUE(log.contains("Constructor found _DMI_ header length=0xf")) << log.dump();
-    EXPECT_TRUE(log.contains("Constructor checksum 2 good")) << log.dump();
+    writeOverride(legacyEntry(0x24, 0xF0000));
+    expectLegacyTable(acquire(),
+                      {"Constructor found _DMI_ header length=0xf", "Constructor checksum 2 good"});
 }
 
 TEST_F(Acquisition, OverrideFileWithBadChecksumEmptiesTableWithoutConsultingMemory) {
-    std::vector<uint8_t> const table = sampleTable();
-    std::vector<uint8_t> entry = smEntryPoint(table, 2, 7);
+    std::vector<uint8_t> entry = smEntryPoint(table_, 2, 7);
     entry[4] ^= 0x10;
-    smbiostest::writeOverrideDir(dataDir_.path(), entry, table);
-    FakePMem fake(kFakeFull);
-    fake.map(0xF0000, biosAreaWith(smEntryPoint(table, 2, 7), kSmAnchor));
-    fake.map(kTableAddress, table);
-    useCodeDir(kFakeFull);
-    LogCapture log;
-    SD::SmBios smbios;
-    EXPECT_TRUE(smbios.getTables().empty());
+    writeOverride(entry);
+    FakePMem const& fake = smMachine(7);
+    SD::SmBios const smbios = acquire();
+    expectEmpty(smbios, "Constructor checksum 1 failed");
     EXPECT_EQ(smbios.getMajorVersion(), 0);
-    EXPECT_TRUE(log.contains("Constructor checksum 1 failed")) << log.dump();
     EXPECT_EQ(fake.opens(), 0);
 }
 
 TEST_F(Acquisition, OverrideFileWithLegacyBadChecksumFailsChecksum2) {
-    std::vector<uint8_t> const table = sampleTable();
-    std::vector<uint8_t> entry =
-        smbiosdump::makeDmiEntryPoint(0x27, static_cast<uint16_t>(table.size()), 0xF0000, 5);
+    std::vector<uint8_t> entry = legacyEntry(0x27, 0xF0000);
     entry[6] ^= 0x01;
-    smbiostest::writeOverrideDir(dataDir_.path(), entry, table);
-    LogCapture log;
-    SD::SmBios smbios;
-    EXPECT_TRUE(smbios.getTables().empty());
-    EXPECT_TRUE(log.contains("Constructor checksum 2 failed")) << log.dump();
+    expectOverrideRejected(entry, "Constructor checksum 2 failed");
 }
 
 TEST_F(Acquisition, OverrideFileWithUnknownSignatureEmptiesTable) {
-    std::vector<uint8_t> const table = sampleTable();
-    std::vector<uint8_t> entry = smEntryPoint(table, 2, 7);
+    std::vector<uint8_t> entry = smEntryPoint(table_, 2, 7);
     entry[1] = 'X';
-    smbiostest::writeOverrideDir(dataDir_.path(), entry, table);
-    LogCapture log;
-    SD::SmBios smbios;
-    EXPECT_TRUE(smbios.getTables().empty());
-    EXPECT_TRUE(log.contains("Constructor _SM_ or _DMI_ signature failed")) << log.dump();
+    expectOverrideRejected(entry, "Constructor _SM_ or _DMI_ signature failed");
 }
 
 TEST_F(Acquisition, OverrideFileWithShortSmHeaderIsASignatureFailure) {
-    std::vector<uint8_t> const table = sampleTable();
-    std::vector<uint8_t> const entry = {'_', 'S', 'M', '_', 0x00, 0x1F};
-    smbiostest::writeOverrideDir(dataDir_.path(), entry, table);
-    LogCapture log;
-    SD::SmBios smbios;
-    EXPECT_TRUE(smbios.getTables().empty());
-    EXPECT_TRUE(log.contains("Constructor _SM_ or _DMI_ signature failed")) << log.dump();
+    expectOverrideRejected({'_', 'S', 'M', '_', 0x00, 0x1F},
+                           "Constructor _SM_ or _DMI_ signature failed");
 }
 
 TEST_F(Acquisition, OverrideFileWithShortLegacyHeaderFailsChecksum2) {
-    std::vector<uint8_t> const table = sampleTable();
-    std::vector<uint8_t> const entry = {'_', 'D', 'M', 'I', '_', 0x00};
-    smbiostest::writeOverrideDir(dataDir_.path(), entry, table);
-    LogCapture log;
-    SD::SmBios smbios;
-    EXPECT_TRUE(smbios.getTables().empty());
-    EXPECT_TRUE(log.contains("Constructor checksum 2 failed")) << log.dump();
+    expectOverrideRejected({'_', 'D', 'M', 'I', '_', 0x00}, "Constructor checksum 2 failed");
 }
 
 TEST_F(Acquisition, OverrideFileWithSmLengthBeyondHeaderFailsChecksum1) {
-    std::vector<uint8_t> const table = sampleTable();
-    std::vector<uint8_t> entry = smEntryPoint(table, 2, 7);
+    std::vector<uint8_t> entry = smEntryPoint(table_, 2, 7);
     entry.resize(16);  // byte 5 still says 31
-    smbiostest::writeOverrideDir(dataDir_.path(), entry, table);
-    LogCapture log;
-    SD::SmBios smbios;
-    EXPECT_TRUE(smbios.getTables().empty());
-    EXPECT_TRUE(log.contains("Constructor checksum 1 failed")) << log.dump();
+    expectOverrideRejected(entry, "Constructor checksum 1 failed");
 }
 
 TEST_F(Acquisition, OverrideFileWithBadHeaderTokensLogsReadHeadCode) {
-    std::vector<uint8_t> const table = sampleTable();
-    smbiostest::writeOverrideDir(dataDir_.path(), smEntryPoint(table, 2, 7), table);
-    smbiostest::writeFile(dataDir_.path() + "/SmBiosOverride/smbios.txt",
-                          "<SHOWSMBIOS>\n<HEADER>\n5F534D5F\n</EPHEADER>\n0000\n</SHOWSMBIOS>\n");
-    LogCapture log;
-    SD::SmBios smbios;
-    EXPECT_TRUE(smbios.getTables().empty());
-    EXPECT_TRUE(log.contains("Constructor readHead() return code 8")) << log.dump();
+    writeOverrideText("<SHOWSMBIOS>\n<HEADER>\n5F534D5F\n</EPHEADER>\n0000\n</SHOWSMBIOS>\n");
+    expectEmpty(acquire(), "Constructor readHead() return code 8");
 }
 
 TEST_F(Acquisition, OverrideFileWithoutClosingTagLogsReadTablesCode) {
-    std::vector<uint8_t> const table = sampleTable();
-    std::string text = smbiosdump::formatOverride(smEntryPoint(table, 2, 7), table);
-    text = text.substr(0, text.find("</SHOWSMBIOS>")) + "<END>\n";
-    smbiostest::writeOverrideDir(dataDir_.path(), smEntryPoint(table, 2, 7), table);
-    smbiostest::writeFile(dataDir_.path() + "/SmBiosOverride/smbios.txt", text);
-    LogCapture log;
-    SD::SmBios smbios;
-    EXPECT_TRUE(smbios.getTables().empty());
+    std::string const text = smbiosdump::formatOverride(smEntryPoint(table_, 2, 7), table_);
+    writeOverrideText(text.substr(0, text.find("</SHOWSMBIOS>")) + "<END>\n");
+    SD::SmBios const smbios = acquire();
+    expectEmpty(smbios, "Constructor readTables() return code 55");
     EXPECT_EQ(smbios.getMajorVersion(), 0);
-    EXPECT_TRUE(log.contains("Constructor readTables() return code 55")) << log.dump();
 }
 
 TEST_F(Acquisition, OverrideFileWithOnlyHeaderFallsBackToMemory) {
-    std::vector<uint8_t> const table = sampleTable();
-    std::string text = smbiosdump::formatOverride(smEntryPoint(table, 2, 7), table);
-    text = text.substr(0, text.find("</EPHEADER>") + std::string("</EPHEADER>").size()) + "\n";
-    smbiostest::writeOverrideDir(dataDir_.path(), smEntryPoint(table, 2, 7), table);
-    smbiostest::writeFile(dataDir_.path() + "/SmBiosOverride/smbios.txt", text);
-    FakePMem fake(kFakeFull);
-    fake.map(0xF0000, biosAreaWith(smEntryPoint(table, 2, 6), kSmAnchor));
-    fake.map(kTableAddress, table);
-    useCodeDir(kFakeFull);
-    LogCapture log;
-    SD::SmBios smbios;
-    EXPECT_EQ(smbios.getMinorVersion(), 6);
-    EXPECT_EQ(smbios.getTables().size(), 5u);
-    EXPECT_EQ(fake.opens(), 1);
-    EXPECT_TRUE(log.contains("importSmBios() file ended before tables read, no tables made"))
-        << log.dump();
+    std::string const text = smbiosdump::formatOverride(smEntryPoint(table_, 2, 7), table_);
+    writeOverrideText(text.substr(0, text.find("</EPHEADER>") + std::string("</EPHEADER>").size()) +
+                      "\n");
+    FakePMem const& fake = smMachine(6);
+    expectMemoryTable(acquire(), fake, 6);
+    expectLogged("importSmBios() file ended before tables read, no tables made");
 }
 
 TEST_F(Acquisition, MissingOverrideFileFallsBackToMemory) {
-    std::vector<uint8_t> const table = sampleTable();
-    FakePMem fake(kFakeFull);
-    fake.map(0xF0000, biosAreaWith(smEntryPoint(table, 2, 7), kSmAnchor));
-    fake.map(kTableAddress, table);
-    useCodeDir(kFakeFull);
-    LogCapture log;
-    SD::SmBios smbios;
+    FakePMem const& fake = smMachine(7);
+    SD::SmBios const smbios = acquire();
     EXPECT_EQ(smbios.getTables().size(), 5u);
     EXPECT_EQ(fake.opens(), 1);
-    EXPECT_TRUE(log.contains("importSmBios() file not found, using machine SMBios")) << log.dump();
+    expectLogged("importSmBios() file not found, using machine SMBios");
 }
 
 TEST_F(Acquisition, OverrideFileThatIsAFifoFallsBackToMemoryWithoutWaiting) {
-    std::vector<uint8_t> const table = sampleTable();
     std::string const folder = dataDir_.path() + "/SmBiosOverride";
-    std::string const fifo = folder + "/smbios.txt";
     ASSERT_EQ(mkdir(folder.c_str(), 0755), 0);
-    ASSERT_EQ(mkfifo(fifo.c_str(), 0600), 0);
-    FakePMem fake(kFakeFull);
-    fake.map(0xF0000, biosAreaWith(smEntryPoint(table, 2, 7), kSmAnchor));
-    fake.map(kTableAddress, table);
-    useCodeDir(kFakeFull);
-    LogCapture log;
-    bool waited = false;
-    SD::SmBios const smbios = acquireReleasingFifo(fifo, waited);
-    EXPECT_FALSE(waited) << "the acquisition waited for a writer on the override FIFO";
-    EXPECT_TRUE(log.contains("importSmBios() file not found, using machine SMBios")) << log.dump();
-    EXPECT_EQ(smbios.getMinorVersion(), 7);
-    EXPECT_EQ(smbios.getTables().size(), 5u);
-    EXPECT_EQ(fake.opens(), 1);
+    ASSERT_EQ(mkfifo(overridePath().c_str(), 0600), 0);
+    FakePMem const& fake = smMachine(7);
+    captureLog();
+    std::unique_ptr<SD::SmBios> smbios;
+    EXPECT_FALSE(smbiostest::waitedOnFifo(overridePath(), [&smbios] {
+        smbios.reset(new SD::SmBios());
+    })) << "the acquisition waited for a writer on the override FIFO";
+    expectLogged("importSmBios() file not found, using machine SMBios");
+    expectMemoryTable(*smbios, fake, 7);
     struct stat info;
-    ASSERT_EQ(lstat(fifo.c_str(), &info), 0);
+    ASSERT_EQ(lstat(overridePath().c_str(), &info), 0);
     EXPECT_TRUE(S_ISFIFO(info.st_mode)) << "the override FIFO was replaced";
 }
 
 TEST_F(Acquisition, OverrideFileThatIsAFolderFallsBackToMemory) {
-    std::vector<uint8_t> const table = sampleTable();
     std::string const folder = dataDir_.path() + "/SmBiosOverride";
     ASSERT_EQ(mkdir(folder.c_str(), 0755), 0);
-    ASSERT_EQ(mkdir((folder + "/smbios.txt").c_str(), 0755), 0);
-    FakePMem fake(kFakeFull);
-    fake.map(0xF0000, biosAreaWith(smEntryPoint(table, 2, 6), kSmAnchor));
-    fake.map(kTableAddress, table);
-    useCodeDir(kFakeFull);
-    LogCapture log;
-    SD::SmBios smbios;
-    EXPECT_TRUE(log.contains("importSmBios() file not found, using machine SMBios")) << log.dump();
-    EXPECT_EQ(smbios.getMinorVersion(), 6);
-    EXPECT_EQ(smbios.getTables().size(), 5u);
-    EXPECT_EQ(fake.opens(), 1);
+    ASSERT_EQ(mkdir(overridePath().c_str(), 0755), 0);
+    FakePMem const& fake = smMachine(6);
+    SD::SmBios const smbios = acquire();
+    expectLogged("importSmBios() file not found, using machine SMBios");
+    expectMemoryTable(smbios, fake, 6);
 }
 
 TEST_F(Acquisition, InitializerDestructorLogsItsLine) {
     TempDir emptyCodeDir;
     useCodeDir(emptyCodeDir.path() + "/");
-    LogCapture log;
+    captureLog();
     {
         SD::SmBiosInitializer initializer;
         EXPECT_TRUE(initializer.getTables().empty());
     }
-    EXPECT_TRUE(log.contains("Destructor entry-return")) << log.dump();
+    expectLogged("Destructor entry-return");
 }

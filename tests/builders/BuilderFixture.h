@@ -11,7 +11,9 @@
 #include <cmath>
 #include <cstddef>
 #include <cstdint>
+#include <functional>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "FrameFixture.h"
@@ -21,17 +23,22 @@
 namespace buildertest {
 
 using frametest::firstLogged;
+using frametest::group;
 using frametest::hasNodeType;
 using frametest::hasStrings;
 using frametest::hasUnsigned;
 using frametest::hasUnsignedList;
 using frametest::hasVersion;
+using frametest::isNode;
 using frametest::lacksProperty;
 using frametest::loggedLevels;
 using frametest::loggedTexts;
 using frametest::OverrideTable;
+using frametest::readNumberOfKind;
+using frametest::readOfKind;
 using frametest::readProperty;
 using frametest::StructureLists;
+using frametest::tableOf;
 using frametest::TestMI;
 using smbiostest::LogCapture;
 using smbiostest::Structure;
@@ -41,19 +48,13 @@ using smbiostest::TableBuilder;
 inline ::testing::AssertionResult hasString(IC::Node const* node, unsigned int id,
                                             std::string const& expected) {
     IC::PropertyValue value;
-    ::testing::AssertionResult read = readProperty(node, id, value);
-    if (!read) {
-        return read;
-    }
-    if (value.getKind() != IC::PropertyValue::STRING) {
-        return ::testing::AssertionFailure()
-               << "property " << id << " is of kind " << value.getKind() << ", not a string";
-    }
-    if (value.getString() != expected) {
+    ::testing::AssertionResult const read =
+        readOfKind(node, id, IC::PropertyValue::STRING, "a string", value);
+    if (read && value.getString() != expected) {
         return ::testing::AssertionFailure() << "property " << id << " is \"" << value.getString()
                                              << "\", expected \"" << expected << "\"";
     }
-    return ::testing::AssertionSuccess();
+    return read;
 }
 
 // Property id holds an IC::EnumValue of the given width (1, 2 or 4 bytes)
@@ -61,20 +62,14 @@ inline ::testing::AssertionResult hasString(IC::Node const* node, unsigned int i
 inline ::testing::AssertionResult hasEnum(IC::Node const* node, unsigned int id, unsigned int width,
                                           long long expected) {
     IC::PropertyValue value;
-    ::testing::AssertionResult read = readProperty(node, id, value);
-    if (!read) {
-        return read;
-    }
-    if (value.getKind() != IC::PropertyValue::ENUM) {
-        return ::testing::AssertionFailure() << "property " << id << " is of kind "
-                                             << value.getKind() << ", not an enumerated value";
-    }
-    if (value.getEnum().getWidth() != width || value.getEnum().getValue() != expected) {
+    ::testing::AssertionResult const read =
+        readOfKind(node, id, IC::PropertyValue::ENUM, "an enumerated value", value);
+    if (read && (value.getEnum().getWidth() != width || value.getEnum().getValue() != expected)) {
         return ::testing::AssertionFailure()
                << "property " << id << " is " << value.getEnum().getValue() << " of width "
                << value.getEnum().getWidth() << ", expected " << expected << " of width " << width;
     }
-    return ::testing::AssertionSuccess();
+    return read;
 }
 
 // Property id holds an IC::Number of kind DOUBLE equal to expected (within
@@ -82,83 +77,142 @@ inline ::testing::AssertionResult hasEnum(IC::Node const* node, unsigned int id,
 inline ::testing::AssertionResult hasDouble(IC::Node const* node, unsigned int id,
                                             double expected) {
     IC::PropertyValue value;
-    ::testing::AssertionResult read = readProperty(node, id, value);
-    if (!read) {
-        return read;
-    }
-    if (value.getKind() != IC::PropertyValue::NUMBER ||
-        value.getNumber().getKind() != IC::Number::DOUBLE) {
-        return ::testing::AssertionFailure()
-               << "property " << id << " is " << value << ", not a double number";
-    }
-    if (std::fabs(value.getNumber().getDouble() - expected) > 1e-6) {
+    ::testing::AssertionResult const read =
+        readNumberOfKind(node, id, IC::Number::DOUBLE, "a double", value);
+    if (read && std::fabs(value.getNumber().getDouble() - expected) > 1e-6) {
         return ::testing::AssertionFailure()
                << "property " << id << " is " << value.getNumber().getDouble() << ", expected "
                << expected;
     }
-    return ::testing::AssertionSuccess();
+    return read;
 }
 
 // Property id holds an IC::Number of kind BOOL equal to expected.
 inline ::testing::AssertionResult hasBool(IC::Node const* node, unsigned int id, bool expected) {
-    IC::PropertyValue value;
-    ::testing::AssertionResult read = readProperty(node, id, value);
-    if (!read) {
-        return read;
-    }
-    if (value.getKind() != IC::PropertyValue::NUMBER ||
-        value.getNumber().getKind() != IC::Number::BOOL) {
-        return ::testing::AssertionFailure()
-               << "property " << id << " is " << value << ", not a boolean number";
-    }
-    if (value.getNumber().getBool() != expected) {
-        return ::testing::AssertionFailure()
-               << "property " << id << " is " << value.getNumber().getBool() << ", expected "
-               << expected;
-    }
-    return ::testing::AssertionSuccess();
+    return frametest::hasNumber(node, id, IC::Number::BOOL, "a boolean", &IC::Number::getBool,
+                                expected);
 }
 
 // Property id holds a byte vector equal to expected.
 inline ::testing::AssertionResult hasBytes(IC::Node const* node, unsigned int id,
                                            std::vector<unsigned char> const& expected) {
     IC::PropertyValue value;
-    ::testing::AssertionResult read = readProperty(node, id, value);
-    if (!read) {
-        return read;
-    }
-    if (value.getKind() != IC::PropertyValue::BYTES) {
-        return ::testing::AssertionFailure()
-               << "property " << id << " is of kind " << value.getKind() << ", not bytes";
-    }
-    if (value.getBytes() != expected) {
+    ::testing::AssertionResult const read =
+        readOfKind(node, id, IC::PropertyValue::BYTES, "bytes", value);
+    if (read && value.getBytes() != expected) {
         return ::testing::AssertionFailure() << "property " << id << " is " << value
                                              << ", expected " << IC::PropertyValue(expected, true);
+    }
+    return read;
+}
+
+// The text that names an input value in failure messages: numbers as
+// decimal numbers, text as it is.
+inline std::string inputText(std::string const& text) { return text; }
+template <typename Number>
+inline std::string inputText(Number value) {
+    return std::to_string(value);
+}
+
+// One node per input, in order: the node made from inputs[i] holds
+// values[i] in property id as `has` checks it (hasUnsigned, or an hasEnum of
+// a given width), the failure naming "what inputs[i]".
+template <typename Input, typename Value, typename Has>
+void expectPerNode(std::vector<IC::Node*> const& nodes, std::vector<Input> const& inputs,
+                   std::string const& what, unsigned int id, std::vector<Value> const& values,
+                   Has has) {
+    ASSERT_EQ(inputs.size(), values.size());
+    ASSERT_EQ(inputs.size(), nodes.size());
+    for (size_t i = 0; i < inputs.size(); ++i) {
+        SCOPED_TRACE(what + " " + inputText(inputs[i]));
+        EXPECT_TRUE(has(nodes[i], id, values[i]));
+    }
+}
+
+// expectPerNode for a 1-byte enumerated property.
+template <typename Input>
+void expectEnumPerNode(std::vector<IC::Node*> const& nodes, std::vector<Input> const& inputs,
+                       std::string const& what, unsigned int id,
+                       std::vector<long long> const& values) {
+    expectPerNode(nodes, inputs, what, id, values,
+                  [](IC::Node const* node, unsigned int property, long long value) {
+                      return hasEnum(node, property, 1, value);
+                  });
+}
+
+// expectPerNode for an unsigned number property.
+template <typename Input>
+void expectUnsignedPerNode(std::vector<IC::Node*> const& nodes, std::vector<Input> const& inputs,
+                           std::string const& what, unsigned int id,
+                           std::vector<unsigned int> const& values) {
+    expectPerNode(nodes, inputs, what, id, values, hasUnsigned);
+}
+
+// Node id and index in one check.
+inline ::testing::AssertionResult hasIdAndIndex(IC::Node const* node, unsigned int id,
+                                                unsigned int index) {
+    if (node->getNodeId() != id || node->getIndex() != index) {
+        return ::testing::AssertionFailure()
+               << "node id " << node->getNodeId() << ", index " << node->getIndex()
+               << "; expected id " << id << ", index " << index;
     }
     return ::testing::AssertionSuccess();
 }
 
-// Node id, linked id, type, index, status and description in one check.
-inline ::testing::AssertionResult isNode(IC::Node const* node, unsigned int id,
-                                         unsigned int linkedId, unsigned int type,
-                                         unsigned int index, unsigned int status,
-                                         std::string const& description) {
-    if (node == nullptr) {
-        return ::testing::AssertionFailure() << "no node";
+// One expected property of a node, for expectProperties: its id and the
+// check of its value (one of the has... checks above, or lacksProperty).
+struct PropertyCheck {
+    unsigned int id;
+    std::function<::testing::AssertionResult(IC::Node const*)> check;
+};
+
+inline PropertyCheck stringProp(unsigned int id, std::string const& value) {
+    return {id, [id, value](IC::Node const* node) { return hasString(node, id, value); }};
+}
+inline PropertyCheck unsignedProp(unsigned int id, unsigned int value) {
+    return {id, [id, value](IC::Node const* node) { return hasUnsigned(node, id, value); }};
+}
+inline PropertyCheck enumProp(unsigned int id, unsigned int width, long long value) {
+    return {id,
+            [id, width, value](IC::Node const* node) { return hasEnum(node, id, width, value); }};
+}
+inline PropertyCheck boolProp(unsigned int id, bool value) {
+    return {id, [id, value](IC::Node const* node) { return hasBool(node, id, value); }};
+}
+inline PropertyCheck doubleProp(unsigned int id, double value) {
+    return {id, [id, value](IC::Node const* node) { return hasDouble(node, id, value); }};
+}
+inline PropertyCheck bytesProp(unsigned int id, std::vector<unsigned char> const& value) {
+    return {id, [id, value](IC::Node const* node) { return hasBytes(node, id, value); }};
+}
+inline PropertyCheck versionProp(unsigned int id, unsigned int major, unsigned int minor) {
+    return {id, [id, major, minor](IC::Node const* node) {
+                return hasVersion(node, id, major, minor);
+            }};
+}
+inline PropertyCheck unsignedListProp(unsigned int id, std::vector<unsigned int> const& value) {
+    return {id, [id, value](IC::Node const* node) { return hasUnsignedList(node, id, value); }};
+}
+inline PropertyCheck noProp(unsigned int id) {
+    return {id, [id](IC::Node const* node) { return lacksProperty(node, id); }};
+}
+
+// Every check holds on the node.
+inline void expectProperties(IC::Node const* node, std::vector<PropertyCheck> const& checks) {
+    for (PropertyCheck const& property : checks) {
+        EXPECT_TRUE(property.check(node)) << "property " << property.id;
     }
-    ::testing::AssertionResult typed = hasNodeType(node, type);
-    if (!typed) {
-        return typed;
-    }
-    if (node->getNodeId() != id || node->getLinkedId() != linkedId || node->getIndex() != index ||
-        node->getStatus() != status || node->getDescription() != description) {
+}
+
+// Node id, index and status in one check.
+inline ::testing::AssertionResult hasIdIndexAndStatus(IC::Node const* node, unsigned int id,
+                                                      unsigned int index, unsigned int status) {
+    ::testing::AssertionResult const placed = hasIdAndIndex(node, id, index);
+    if (placed && node->getStatus() != status) {
         return ::testing::AssertionFailure()
-               << "node {id " << node->getNodeId() << ", linked " << node->getLinkedId()
-               << ", index " << node->getIndex() << ", status " << node->getStatus() << ", \""
-               << node->getDescription() << "\"}, expected {id " << id << ", linked " << linkedId
-               << ", index " << index << ", status " << status << ", \"" << description << "\"}";
+               << "node " << id << " has status " << node->getStatus() << ", expected " << status;
     }
-    return ::testing::AssertionSuccess();
+    return placed;
 }
 
 // The property ids set on a node, ascending.
@@ -214,26 +268,32 @@ struct ParsedTable {
     StructureLists lists;
 };
 
-// A table of the structures, in order.
-inline TableBuilder tableOf(std::vector<Structure> const& structures) {
-    TableBuilder table;
-    for (Structure const& structure : structures) {
-        table.add(structure);
-    }
+// The structures as a table ended by an End-of-Table structure (handle
+// 0xFEFF).
+inline TableBuilder endedTableOf(std::vector<Structure> const& structures) {
+    TableBuilder table = tableOf(structures);
+    table.endOfTable(0xFEFF);
     return table;
 }
 
-// A parsed table with its structure lists, and a plug-in with a planar node
-// (id 2; the next id is 3) for a builder to hang its nodes under.
-struct PlanarSetup {
-    explicit PlanarSetup(TableBuilder const& table) : parsed(table.build()), lists(parsed) {
-        planar = addParent(mi);
-    }
+// A parsed table with its structure lists, and a plug-in with a parent node
+// (id 2, a planar unless told otherwise; the next id is 3) for a builder to
+// hang its nodes under.
+struct BuilderSetup {
+    explicit BuilderSetup(TableBuilder const& table, unsigned int parentType = 41)
+        : parsed(table.build()), lists(parsed), parent(addParent(mi, parentType)) {}
 
     SD::SmBios parsed;
     StructureLists lists;
     TestMI mi;
-    IC::MutableNode* planar = nullptr;
+    IC::MutableNode* parent;
+};
+
+// A BuilderSetup whose parent is a planar.
+struct PlanarSetup : BuilderSetup {
+    explicit PlanarSetup(TableBuilder const& table) : BuilderSetup(table), planar(parent) {}
+
+    IC::MutableNode* planar;
 };
 
 // A parsed table with its structure lists, and a parent node added to mi
@@ -286,6 +346,47 @@ inline std::vector<std::string> loggedBy(std::string const& loggerName) {
     return texts;
 }
 
+// The log-output texts `logged` (what `source` logged) are `texts`, in
+// order.
+inline ::testing::AssertionResult sameTexts(std::string const& source,
+                                            std::vector<std::string> const& logged,
+                                            std::vector<std::string> const& texts) {
+    if (logged == texts) {
+        return ::testing::AssertionSuccess();
+    }
+    ::testing::AssertionResult failure = ::testing::AssertionFailure();
+    failure << source << " logged " << logged.size() << " line(s), expected " << texts.size()
+            << ":";
+    for (size_t i = 0; i < logged.size() || i < texts.size(); ++i) {
+        failure << "\n  " << (i < logged.size() ? "\"" + logged[i] + "\"" : "(none)") << " / "
+                << (i < texts.size() ? "\"" + texts[i] + "\"" : "(none)");
+    }
+    return failure;
+}
+
+// The captured log-output texts written under one logger are `texts`, in
+// order.
+inline ::testing::AssertionResult loggedExactly(std::string const& loggerName,
+                                                std::vector<std::string> const& texts) {
+    return sameTexts(loggerName, loggedBy(loggerName), texts);
+}
+
+// The captured log-output texts of every logger are `texts`, in order.
+inline ::testing::AssertionResult loggedOnly(std::vector<std::string> const& texts) {
+    return sameTexts("the plug-in", loggedTexts(), texts);
+}
+
+// The plug-in holds `count` nodes, and the next node id it gives is
+// `nextId`.
+inline ::testing::AssertionResult holdsNodes(TestMI const& mi, size_t count, unsigned int nextId) {
+    if (mi.nodeList.size() != count || mi.nextNodeId != nextId) {
+        return ::testing::AssertionFailure()
+               << mi.nodeList.size() << " nodes, next id " << mi.nextNodeId << "; expected "
+               << count << " nodes, next id " << nextId;
+    }
+    return ::testing::AssertionSuccess();
+}
+
 // How many captured log-output texts contain text.
 inline size_t loggedCount(std::string const& text) {
     size_t n = 0;
@@ -324,6 +425,16 @@ inline Structure oemStrings(uint16_t handle, std::vector<std::string> const& str
     for (std::string const& text : strings) {
         structure.addString(text);
     }
+    return structure;
+}
+
+// A baseboard (type 2) of length 0x0C: every field up to the location,
+// then the low byte of the chassis handle, whose word straddles the end of
+// the formatted area.
+inline Structure straddlingBaseboard(uint16_t handle) {
+    Structure structure(2, handle);
+    structure.str("Board Maker").str("MB-100").str("BV-1").str("BRD-1").str("BA-1");
+    structure.byte(0x09).str("Slot A").byte(0x00);
     return structure;
 }
 

@@ -5,6 +5,7 @@
 #include <gtest/gtest.h>
 
 #include <cstdint>
+#include <map>
 #include <sstream>
 #include <string>
 #include <vector>
@@ -50,13 +51,9 @@ struct ChassisFields {
     std::string version = "CV-1";
     std::string serial = "CH-0001";
     std::string assetTag = "AT-9";
-    uint8_t bootUpState = 3;
-    uint8_t powerSupplyState = 4;
-    uint8_t thermalState = 5;
-    uint8_t securityStatus = 2;
+    uint8_t bootUpState = 3, powerSupplyState = 4, thermalState = 5, securityStatus = 2;
     uint32_t oemDefined = 0x04030201;
-    uint8_t height = 2;
-    uint8_t powerCords = 1;
+    uint8_t height = 2, powerCords = 1;
     // The first byte of each contained element record; each record is
     // recordLength bytes long (the rest: minimum and maximum counts).
     std::vector<uint8_t> elements;
@@ -72,19 +69,12 @@ ChassisFields ofType(uint8_t type, std::vector<uint8_t> const& elements = {}) {
 
 Structure chassis(uint16_t handle, ChassisFields const& fields) {
     Structure structure(3, handle);
-    structure.str(fields.manufacturer)
-        .byte(fields.type)
-        .str(fields.version)
-        .str(fields.serial)
-        .str(fields.assetTag)
-        .byte(fields.bootUpState)
-        .byte(fields.powerSupplyState)
-        .byte(fields.thermalState)
-        .byte(fields.securityStatus)
-        .dword(fields.oemDefined)
-        .byte(fields.height)
-        .byte(fields.powerCords)
-        .byte(static_cast<uint8_t>(fields.elements.size()))
+    structure.str(fields.manufacturer).byte(fields.type);
+    structure.str(fields.version).str(fields.serial).str(fields.assetTag);
+    structure.byte(fields.bootUpState).byte(fields.powerSupplyState).byte(fields.thermalState);
+    structure.byte(fields.securityStatus).dword(fields.oemDefined);
+    structure.byte(fields.height).byte(fields.powerCords);
+    structure.byte(static_cast<uint8_t>(fields.elements.size()))
         .byte(fields.elements.empty() ? 0 : fields.recordLength);
     for (uint8_t element : fields.elements) {
         structure.byte(element);
@@ -161,33 +151,67 @@ std::vector<unsigned int> loggedElements() {
 
 // What the chassis-type table gives for a chassis type.
 struct Expected {
+    std::string name;
     unsigned int packageType;
     unsigned int enclosure;
-    std::string name;
     bool mainChassis;
 };
 
 Expected expectedFor(unsigned int type) {
-    switch (type) {
-        case 0x07:
-            return {0x07, 3, "Tower Chassis", true};
-        case 0x11:
-            return {0x11, 3, "Main Server Chassis", true};
-        case 0x17:
-            return {0x11, 3, "Rack Mount Chassis", true};
-        case 0x19:
-            return {0x01, 3, "Multi System Chassis", true};
-        case 0x1C:
-            return {0x11, 16, "Blade Chassis", true};
-        case 0x1D:
-            return {0x1C, 17, "Blade Enclosure Chassis", false};
-        default:
-            break;
+    static std::map<unsigned int, Expected> const named = {
+        {0x07, {"Tower Chassis", 0x07, 3, true}},
+        {0x11, {"Main Server Chassis", 0x11, 3, true}},
+        {0x17, {"Rack Mount Chassis", 0x11, 3, true}},
+        {0x19, {"Multi System Chassis", 0x01, 3, true}},
+        {0x1C, {"Blade Chassis", 0x11, 16, true}},
+        {0x1D, {"Blade Enclosure Chassis", 0x1C, 17, false}},
+    };
+    auto const found = named.find(type);
+    if (found != named.end()) {
+        return found->second;
     }
     if (type <= 0x02 || type > 0x1D) {
-        return {0, 3, "Chassis", false};
+        return {"Chassis", 0, 3, false};
     }
-    return {type, 3, "Chassis", false};
+    return {"Chassis", type, 3, false};
+}
+
+// A text field of a tower's structure, set to the first text of each case
+// in a table with the default System Information structure, gives the
+// second text in property `id` (the system's text filling in where the
+// chassis has none).
+void expectFallback(std::string ChassisFields::*field, unsigned int id, std::string const& what,
+                    std::vector<std::pair<std::string, std::string>> const& cases) {
+    for (std::pair<std::string, std::string> const& c : cases) {
+        SCOPED_TRACE(what + " \"" + c.first + "\"");
+        ChassisFields fields = ofType(TOWER);
+        fields.*field = c.first;
+        ChassisRun run(systemAndChassis({fields}));
+        std::vector<IC::Node*> const nodes = run.chassisNodes();
+        ASSERT_EQ(1u, nodes.size());
+        EXPECT_TRUE(hasString(nodes[0], id, c.second));
+    }
+}
+
+// A desktop chassis, then one of `type`: the second's node passes
+// `checks`, and the planar hangs under the second when it is a main chassis
+// (`main`), else under the first.
+void expectSecondChassis(uint8_t type, std::vector<PropertyCheck> const& checks, bool main) {
+    ChassisRun run(systemAndChassis({ofType(DESKTOP), ofType(type)}));
+    std::vector<IC::Node*> const nodes = run.chassisNodes();
+    ASSERT_EQ(2u, nodes.size());
+    expectProperties(nodes[1], checks);
+    EXPECT_EQ(nodes[main ? 1 : 0]->getNodeId(), run.planarParent());
+}
+
+// A table of the default System Information structure and the enclosures
+// makes `count` chassis nodes, and the planar hangs under the one at
+// `home`.
+void expectPlanarHome(std::vector<ChassisFields> const& enclosures, size_t count, size_t home) {
+    ChassisRun run(systemAndChassis(enclosures));
+    std::vector<IC::Node*> const nodes = run.chassisNodes();
+    ASSERT_EQ(count, nodes.size());
+    EXPECT_EQ(nodes[home]->getNodeId(), run.planarParent());
 }
 
 }  // namespace
@@ -198,11 +222,7 @@ Expected expectedFor(unsigned int type) {
 TEST(ChassisBuilder, FullStructureGivesOneChassisNodeWithEveryProperty) {
     smbiostest::LogCapture log;
     ChassisFields fields = ofType(0x80 | RACK_MOUNT);
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.add(chassis(0x0300, fields));
-    table.endOfTable(0xFEFF);
-    ChassisRun run(table);
+    ChassisRun run(endedTableOf({systemInformation(0x0100), chassis(0x0300, fields)}));
 
     std::vector<IC::Node*> const nodes = run.chassisNodes();
     ASSERT_EQ(1u, nodes.size()) << log.dump();
@@ -217,20 +237,12 @@ TEST(ChassisBuilder, FullStructureGivesOneChassisNodeWithEveryProperty) {
     EXPECT_TRUE(hasString(node, 36, "Chassis Maker"));
     EXPECT_TRUE(hasString(node, 45, "7947"));
     EXPECT_TRUE(buildertest::hasBool(node, 10, true));
-    EXPECT_TRUE(hasString(node, 108, "Rack Mount Chassis"));
-    EXPECT_TRUE(hasString(node, 39, "RS-7400 [7947AC1]"));
-    EXPECT_TRUE(hasEnum(node, 11, 4, 17));
-    EXPECT_TRUE(hasEnum(node, 213, 4, 3));
-    EXPECT_TRUE(hasString(node, 307, "CV-1"));
-    EXPECT_TRUE(hasString(node, 50, "CH-0001"));
-    EXPECT_TRUE(hasString(node, 2, "AT-9"));
-    EXPECT_TRUE(hasEnum(node, 4, 1, 3));
-    EXPECT_TRUE(hasEnum(node, 46, 1, 4));
-    EXPECT_TRUE(hasEnum(node, 60, 1, 5));
-    EXPECT_TRUE(hasEnum(node, 49, 1, 2));
-    EXPECT_TRUE(hasBytes(node, 43, {0x04, 0x03, 0x02, 0x01}));
-    EXPECT_TRUE(hasUnsigned(node, 21, 2));
-    EXPECT_TRUE(hasUnsigned(node, 42, 1));
+    expectProperties(
+        node, {stringProp(108, "Rack Mount Chassis"), stringProp(39, "RS-7400 [7947AC1]"),
+               enumProp(11, 4, 17), enumProp(213, 4, 3), stringProp(307, "CV-1"),
+               stringProp(50, "CH-0001"), stringProp(2, "AT-9"), enumProp(4, 1, 3),
+               enumProp(46, 1, 4), enumProp(60, 1, 5), enumProp(49, 1, 2),
+               bytesProp(43, {0x04, 0x03, 0x02, 0x01}), unsignedProp(21, 2), unsignedProp(42, 1)});
 
     // The planar (no baseboard structure: a bare one) hangs under it.
     EXPECT_EQ(node->getNodeId(), run.planarParent()) << log.dump();
@@ -239,9 +251,8 @@ TEST(ChassisBuilder, FullStructureGivesOneChassisNodeWithEveryProperty) {
     EXPECT_EQ(2u, log.count("makeChassisNodes System model = RS-7400 [7947AC1] system "
                             "serial = SYS-0001"))
         << log.dump();
-    EXPECT_EQ(2u, log.count("Table 3 length = 21")) << log.dump();
-    EXPECT_EQ(2u, log.count("Chassis Type = 23")) << log.dump();
-    EXPECT_EQ(2u, log.count("makePlanarNodes entry")) << log.dump();
+    EXPECT_TRUE(frametest::loggedTimes(
+        log, 2, {"Table 3 length = 21", "Chassis Type = 23", "makePlanarNodes entry"}));
 }
 
 TEST(ChassisBuilder, LockBitClearSetsProperty10False) {
@@ -254,11 +265,7 @@ TEST(ChassisBuilder, LockBitClearSetsProperty10False) {
 
 TEST(ChassisBuilder, NoChassisStructureMakesNoChassisAndNoPlanar) {
     smbiostest::LogCapture log;
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.add(baseboard(0x0200));
-    table.endOfTable(0xFEFF);
-    ChassisRun run(table);
+    ChassisRun run(endedTableOf({systemInformation(0x0100), baseboard(0x0200)}));
 
     ASSERT_EQ(1u, run.mi.nodeList.size());
     EXPECT_EQ(run.computer, run.mi.nodeList[0]);
@@ -327,9 +334,9 @@ TEST(ChassisType, EveryChassisTypeMapsAsTheTableSays) {
         IC::Node const* node = nodes[1];
         Expected const expected = expectedFor(type);
         EXPECT_EQ(1u, node->getIndex());
-        EXPECT_TRUE(hasEnum(node, 11, 4, expected.packageType));
-        EXPECT_TRUE(hasEnum(node, 213, 4, expected.enclosure));
-        EXPECT_TRUE(hasString(node, 108, expected.name));
+        expectProperties(
+            node, {enumProp(11, 4, expected.packageType), enumProp(213, 4, expected.enclosure),
+                   stringProp(108, expected.name)});
         EXPECT_TRUE(buildertest::hasBool(node, 10, false));
         EXPECT_EQ(expected.mainChassis ? node->getNodeId() : nodes[0]->getNodeId(),
                   run.planarParent());
@@ -346,35 +353,24 @@ TEST(ChassisType, LockBitIsMaskedOffTheChassisType) {
 }
 
 TEST(ChassisType, RackMountChassisGetsPackageType17AndItsName) {
-    ChassisRun run(systemAndChassis({ofType(DESKTOP), ofType(RACK_MOUNT)}));
-    std::vector<IC::Node*> const nodes = run.chassisNodes();
-    ASSERT_EQ(2u, nodes.size());
-    EXPECT_TRUE(hasEnum(nodes[1], 11, 4, 17));
-    EXPECT_TRUE(hasEnum(nodes[1], 213, 4, 3));
-    EXPECT_TRUE(hasString(nodes[1], 108, "Rack Mount Chassis"));
     // A main chassis: it takes the planar.
-    EXPECT_EQ(nodes[1]->getNodeId(), run.planarParent());
+    expectSecondChassis(
+        RACK_MOUNT,
+        {enumProp(11, 4, 17), enumProp(213, 4, 3), stringProp(108, "Rack Mount Chassis")}, true);
 }
 
 TEST(ChassisType, BladeGetsPackageType17AndEnclosureKind16) {
-    ChassisRun run(systemAndChassis({ofType(DESKTOP), ofType(BLADE)}));
-    std::vector<IC::Node*> const nodes = run.chassisNodes();
-    ASSERT_EQ(2u, nodes.size());
-    EXPECT_TRUE(hasEnum(nodes[1], 11, 4, 0x11));
-    EXPECT_TRUE(hasEnum(nodes[1], 213, 4, 16));
-    EXPECT_TRUE(hasString(nodes[1], 108, "Blade Chassis"));
-    EXPECT_EQ(nodes[1]->getNodeId(), run.planarParent());
+    expectSecondChassis(
+        BLADE, {enumProp(11, 4, 0x11), enumProp(213, 4, 16), stringProp(108, "Blade Chassis")},
+        true);
 }
 
 TEST(ChassisType, BladeEnclosureGetsPackageType0x1CAndEnclosureKind17AndIsNotMain) {
-    ChassisRun run(systemAndChassis({ofType(DESKTOP), ofType(BLADE_ENCLOSURE)}));
-    std::vector<IC::Node*> const nodes = run.chassisNodes();
-    ASSERT_EQ(2u, nodes.size());
-    EXPECT_TRUE(hasEnum(nodes[1], 11, 4, 0x1C));
-    EXPECT_TRUE(hasEnum(nodes[1], 213, 4, 17));
-    EXPECT_TRUE(hasString(nodes[1], 108, "Blade Enclosure Chassis"));
     // Not a main chassis: the planar stays with the first chassis.
-    EXPECT_EQ(nodes[0]->getNodeId(), run.planarParent());
+    expectSecondChassis(
+        BLADE_ENCLOSURE,
+        {enumProp(11, 4, 0x1C), enumProp(213, 4, 17), stringProp(108, "Blade Enclosure Chassis")},
+        false);
 }
 
 TEST(ChassisType, MultiSystemChassisGetsPackageType1AndIsMain) {
@@ -415,10 +411,8 @@ TEST(ChassisFallback, NoSystemInformationStructureFallsBackToTheMissingTableSent
 
     std::vector<IC::Node*> const nodes = run.chassisNodes();
     ASSERT_EQ(1u, nodes.size());
-    EXPECT_TRUE(hasString(nodes[0], 36, NO_SYSTEM));
-    EXPECT_TRUE(hasString(nodes[0], 39, NO_SYSTEM));
-    EXPECT_TRUE(hasString(nodes[0], 50, NO_SYSTEM));
-    EXPECT_TRUE(lacksProperty(nodes[0], 45));
+    expectProperties(nodes[0], {stringProp(36, NO_SYSTEM), stringProp(39, NO_SYSTEM),
+                                stringProp(50, NO_SYSTEM), noProp(45)});
     EXPECT_EQ(2u, log.count("makeChassisNodes Smbios required system information table does "
                             "not exist"))
         << log.dump();
@@ -429,48 +423,32 @@ TEST(ChassisFallback, NoSystemInformationStructureKeepsTheChassisOwnTexts) {
     ChassisRun run(tableOf({chassis(0x0300, ofType(TOWER))}));
     std::vector<IC::Node*> const nodes = run.chassisNodes();
     ASSERT_EQ(1u, nodes.size());
-    EXPECT_TRUE(hasString(nodes[0], 36, "Chassis Maker"));
-    EXPECT_TRUE(hasString(nodes[0], 39, NO_SYSTEM));
-    EXPECT_TRUE(hasString(nodes[0], 50, "CH-0001"));
+    expectProperties(nodes[0], {stringProp(36, "Chassis Maker"), stringProp(39, NO_SYSTEM),
+                                stringProp(50, "CH-0001")});
 }
 
 TEST(ChassisFallback, ManufacturerFallsBackOnEmptyBlankAndLowerCaseNoneOnly) {
-    struct Case {
-        std::string manufacturer;
-        std::string expected;
-    };
-    std::vector<Case> const cases = {{"", "Corvane"},     {" ", "Corvane"},
-                                     {"none", "Corvane"}, {"NONE", "NONE"},
-                                     {"None", "None"},    {"  ", "  "},
-                                     {"none ", "none "},  {"Chassis Maker", "Chassis Maker"}};
-    for (Case const& c : cases) {
-        SCOPED_TRACE("chassis manufacturer \"" + c.manufacturer + "\"");
-        ChassisFields fields = ofType(TOWER);
-        fields.manufacturer = c.manufacturer;
-        ChassisRun run(systemAndChassis({fields}));
-        std::vector<IC::Node*> const nodes = run.chassisNodes();
-        ASSERT_EQ(1u, nodes.size());
-        EXPECT_TRUE(hasString(nodes[0], 36, c.expected));
-    }
+    expectFallback(&ChassisFields::manufacturer, 36, "chassis manufacturer",
+                   {{"", "Corvane"},
+                    {" ", "Corvane"},
+                    {"none", "Corvane"},
+                    {"NONE", "NONE"},
+                    {"None", "None"},
+                    {"  ", "  "},
+                    {"none ", "none "},
+                    {"Chassis Maker", "Chassis Maker"}});
 }
 
 TEST(ChassisFallback, SerialFallsBackOnEmptyBlankAndNoneInAnyCase) {
-    struct Case {
-        std::string serial;
-        std::string expected;
-    };
-    std::vector<Case> const cases = {
-        {"", "SYS-0001"},     {" ", "SYS-0001"}, {"none", "SYS-0001"}, {"NONE", "SYS-0001"},
-        {"NoNe", "SYS-0001"}, {"  ", "  "},      {"NONE1", "NONE1"},   {"CH-0001", "CH-0001"}};
-    for (Case const& c : cases) {
-        SCOPED_TRACE("chassis serial \"" + c.serial + "\"");
-        ChassisFields fields = ofType(TOWER);
-        fields.serial = c.serial;
-        ChassisRun run(systemAndChassis({fields}));
-        std::vector<IC::Node*> const nodes = run.chassisNodes();
-        ASSERT_EQ(1u, nodes.size());
-        EXPECT_TRUE(hasString(nodes[0], 50, c.expected));
-    }
+    expectFallback(&ChassisFields::serial, 50, "chassis serial",
+                   {{"", "SYS-0001"},
+                    {" ", "SYS-0001"},
+                    {"none", "SYS-0001"},
+                    {"NONE", "SYS-0001"},
+                    {"NoNe", "SYS-0001"},
+                    {"  ", "  "},
+                    {"NONE1", "NONE1"},
+                    {"CH-0001", "CH-0001"}});
 }
 
 TEST(ChassisFallback, SystemTextsComeFromTheFirstSystemInformationStructure) {
@@ -483,9 +461,8 @@ TEST(ChassisFallback, SystemTextsComeFromTheFirstSystemInformationStructure) {
     ChassisRun run(table);
     std::vector<IC::Node*> const nodes = run.chassisNodes();
     ASSERT_EQ(1u, nodes.size());
-    EXPECT_TRUE(hasString(nodes[0], 39, "First [1111AB1]"));
-    EXPECT_TRUE(hasString(nodes[0], 45, "1111"));
-    EXPECT_TRUE(hasString(nodes[0], 50, "SYS-1"));
+    expectProperties(nodes[0], {stringProp(39, "First [1111AB1]"), stringProp(45, "1111"),
+                                stringProp(50, "SYS-1")});
 }
 
 TEST(ChassisFallback, ProductWithoutPartNumberSetsNoProperty45) {
@@ -500,64 +477,41 @@ TEST(ChassisFallback, ProductWithoutPartNumberSetsNoProperty45) {
 // The chassis the planar hangs under
 
 TEST(ChassisPlanarHome, SingleChassisThatIsNotMainHoldsThePlanar) {
-    ChassisRun run(systemAndChassis({ofType(DESKTOP)}));
-    std::vector<IC::Node*> const nodes = run.chassisNodes();
-    ASSERT_EQ(1u, nodes.size());
-    EXPECT_EQ(nodes[0]->getNodeId(), run.planarParent());
+    expectPlanarHome({ofType(DESKTOP)}, 1, 0);
 }
 
 TEST(ChassisPlanarHome, SecondChassisBeingMainServerHoldsThePlanar) {
-    ChassisRun run(systemAndChassis({ofType(DESKTOP), ofType(MAIN_SERVER)}));
-    std::vector<IC::Node*> const nodes = run.chassisNodes();
-    ASSERT_EQ(2u, nodes.size());
-    EXPECT_EQ(nodes[1]->getNodeId(), run.planarParent());
+    expectPlanarHome({ofType(DESKTOP), ofType(MAIN_SERVER)}, 2, 1);
 }
 
 TEST(ChassisPlanarHome, FirstMainChassisWinsOverALaterOne) {
-    ChassisRun run(systemAndChassis({ofType(DESKTOP), ofType(TOWER), ofType(RACK_MOUNT)}));
-    std::vector<IC::Node*> const nodes = run.chassisNodes();
-    ASSERT_EQ(3u, nodes.size());
-    EXPECT_EQ(nodes[1]->getNodeId(), run.planarParent());
+    expectPlanarHome({ofType(DESKTOP), ofType(TOWER), ofType(RACK_MOUNT)}, 3, 1);
 }
 
 TEST(ChassisPlanarHome, MotherboardElementInTheFirstWinsOverALaterMainChassis) {
-    ChassisRun run(systemAndChassis({ofType(DESKTOP, {MOTHERBOARD_ELEMENT}), ofType(MAIN_SERVER)}));
-    std::vector<IC::Node*> const nodes = run.chassisNodes();
-    ASSERT_EQ(2u, nodes.size());
-    EXPECT_EQ(nodes[0]->getNodeId(), run.planarParent());
+    expectPlanarHome({ofType(DESKTOP, {MOTHERBOARD_ELEMENT}), ofType(MAIN_SERVER)}, 2, 0);
 }
 
 TEST(ChassisPlanarHome, LaterChassisWithABaseboardElementWinsOverAnEarlierOne) {
-    ChassisRun run(systemAndChassis({ofType(DESKTOP, {MOTHERBOARD_ELEMENT}), ofType(MAIN_SERVER),
-                                     ofType(DESKTOP, {DAUGHTER_BOARD_ELEMENT})}));
-    std::vector<IC::Node*> const nodes = run.chassisNodes();
-    ASSERT_EQ(3u, nodes.size());
-    EXPECT_EQ(nodes[2]->getNodeId(), run.planarParent());
+    expectPlanarHome({ofType(DESKTOP, {MOTHERBOARD_ELEMENT}), ofType(MAIN_SERVER),
+                      ofType(DESKTOP, {DAUGHTER_BOARD_ELEMENT})},
+                     3, 2);
 }
 
 TEST(ChassisPlanarHome, ServerBladeElementWinsOverAnEarlierMainChassis) {
-    ChassisRun run(systemAndChassis(
-        {ofType(MAIN_SERVER), ofType(BLADE_ENCLOSURE, {0x83, SERVER_BLADE_ELEMENT})}));
-    std::vector<IC::Node*> const nodes = run.chassisNodes();
-    ASSERT_EQ(2u, nodes.size());
-    EXPECT_EQ(nodes[1]->getNodeId(), run.planarParent());
+    expectPlanarHome({ofType(MAIN_SERVER), ofType(BLADE_ENCLOSURE, {0x83, SERVER_BLADE_ELEMENT})},
+                     2, 1);
 }
 
 TEST(ChassisPlanarHome, OtherElementsAndStructureTypesDoNotMakeAHome) {
     // 0x04 is a connectivity switch; 0x83, 0x89 and 0x8A name SMBIOS
     // structure types 3, 9 and 10, not baseboards.
-    ChassisRun run(
-        systemAndChassis({ofType(DESKTOP), ofType(DESKTOP, {0x04, 0x83, 0x89, 0x8A, 0x01, 0x02})}));
-    std::vector<IC::Node*> const nodes = run.chassisNodes();
-    ASSERT_EQ(2u, nodes.size());
-    EXPECT_EQ(nodes[0]->getNodeId(), run.planarParent());
+    expectPlanarHome({ofType(DESKTOP), ofType(DESKTOP, {0x04, 0x83, 0x89, 0x8A, 0x01, 0x02})}, 2,
+                     0);
 }
 
 TEST(ChassisPlanarHome, NoMainChassisAndNoElementLeavesTheFirstChassis) {
-    ChassisRun run(systemAndChassis({ofType(0x01), ofType(DESKTOP), ofType(BLADE_ENCLOSURE)}));
-    std::vector<IC::Node*> const nodes = run.chassisNodes();
-    ASSERT_EQ(3u, nodes.size());
-    EXPECT_EQ(nodes[0]->getNodeId(), run.planarParent());
+    expectPlanarHome({ofType(0x01), ofType(DESKTOP), ofType(BLADE_ENCLOSURE)}, 3, 0);
 }
 
 TEST(ChassisPlanarHome, ExpansionChassisFirstLeavesTheHomeAtZeroAndThePlanarFindsNoParent) {
@@ -574,17 +528,11 @@ TEST(ChassisPlanarHome, ExpansionChassisFirstLeavesTheHomeAtZeroAndThePlanarFind
 }
 
 TEST(ChassisPlanarHome, ExpansionChassisFirstThenMainChassisHoldsThePlanar) {
-    ChassisRun run(systemAndChassis({ofType(EXPANSION), ofType(TOWER)}));
-    std::vector<IC::Node*> const nodes = run.chassisNodes();
-    ASSERT_EQ(1u, nodes.size());
-    EXPECT_EQ(nodes[0]->getNodeId(), run.planarParent());
+    expectPlanarHome({ofType(EXPANSION), ofType(TOWER)}, 1, 0);
 }
 
 TEST(ChassisPlanarHome, ExpansionChassisFirstThenBaseboardElementHoldsThePlanar) {
-    ChassisRun run(systemAndChassis({ofType(EXPANSION), ofType(DESKTOP, {MOTHERBOARD_ELEMENT})}));
-    std::vector<IC::Node*> const nodes = run.chassisNodes();
-    ASSERT_EQ(1u, nodes.size());
-    EXPECT_EQ(nodes[0]->getNodeId(), run.planarParent());
+    expectPlanarHome({ofType(EXPANSION), ofType(DESKTOP, {MOTHERBOARD_ELEMENT})}, 1, 0);
 }
 
 TEST(ChassisPlanarHome, EveryChassisAnExpansionChassisCallsThePlanarBuilderWithParentZero) {

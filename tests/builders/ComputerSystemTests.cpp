@@ -81,15 +81,13 @@ Structure baseboard(uint16_t handle) {
         .byte(0);
 }
 
-// A group association (type 14) with its items, each (type, handle).
-Structure group(uint16_t handle, std::string const& name,
-                std::vector<std::pair<uint8_t, uint16_t>> const& items) {
-    Structure structure(14, handle);
-    structure.str(name);
-    for (auto const& item : items) {
-        structure.byte(item.first).word(item.second);
-    }
-    return structure;
+// Two System Information structures, "First [1111AB1]" (0x0100) and
+// "Second [2222AB2]" (0x0101), then the other structures.
+std::vector<Structure> twoSystemsAnd(std::vector<Structure> const& others) {
+    std::vector<Structure> structures = {systemInformation(0x0100, "First [1111AB1]"),
+                                         systemInformation(0x0101, "Second [2222AB2]")};
+    structures.insert(structures.end(), others.begin(), others.end());
+    return structures;
 }
 
 // Sets the process's time zone while the object lives, then restores it.
@@ -131,13 +129,6 @@ struct ComputerRun {
     TestMI mi;
     IC::MutableNode* root = nullptr;
 };
-
-// The structures as a table ended by an End-of-Table structure.
-TableBuilder endedTableOf(std::vector<Structure> const& structures) {
-    TableBuilder table = tableOf(structures);
-    table.endOfTable(0xFEFF);
-    return table;
-}
 
 // The builder run over a table that the process also acquires, at the given
 // SMBIOS version, from its override file; the log is captured from the run
@@ -262,8 +253,7 @@ TEST(ComputerSystemBuilder, FullStructureGivesOneComputerSystemNodeWithEveryProp
     EXPECT_NE(nullptr, dynamic_cast<IC::CmptrNode const*>(node));
     EXPECT_TRUE(isNode(node, 3u, run.root->getNodeId(), 40, 0u, 1u, "Computer System"));
     EXPECT_EQ(run.mi.miIdList, node->getMIIds());
-    EXPECT_EQ(2u, run.mi.nodeList.size());
-    EXPECT_EQ(4u, run.mi.nextNodeId);
+    EXPECT_TRUE(holdsNodes(run.mi, 2, 4));
 
     EXPECT_EQ((std::vector<unsigned int>{20, 36, 39, 45, 50, 52, 64, 65, 125, 126, 127, 307}),
               propertyIds(node));
@@ -271,16 +261,11 @@ TEST(ComputerSystemBuilder, FullStructureGivesOneComputerSystemNodeWithEveryProp
     std::int64_t const time = readDateTime(node);
     EXPECT_GE(time, before);
     EXPECT_LE(time, static_cast<std::int64_t>(std::time(nullptr)));
-    EXPECT_TRUE(hasDouble(node, 127, -2.0));
-    EXPECT_TRUE(hasString(node, 36, "Corvane"));
-    EXPECT_TRUE(hasString(node, 39, "RS-7400 [7947AC1]"));
-    EXPECT_TRUE(hasString(node, 45, "7947"));
-    EXPECT_TRUE(hasString(node, 307, "V1.2"));
-    EXPECT_TRUE(hasString(node, 50, "SYS-0001"));
-    EXPECT_TRUE(hasString(node, 64, UUID_REORDERED));
-    EXPECT_TRUE(hasEnum(node, 65, 1, 6));
-    EXPECT_TRUE(hasString(node, 52, "SKU-77"));
-    EXPECT_TRUE(hasString(node, 20, "Server"));
+    expectProperties(
+        node, {doubleProp(127, -2.0), stringProp(36, "Corvane"),
+               stringProp(39, "RS-7400 [7947AC1]"), stringProp(45, "7947"), stringProp(307, "V1.2"),
+               stringProp(50, "SYS-0001"), stringProp(64, UUID_REORDERED), enumProp(65, 1, 6),
+               stringProp(52, "SKU-77"), stringProp(20, "Server")});
 
     // What the builder stored: 126 a date-time made when the node was built,
     // 127 the offset at build time.
@@ -307,11 +292,7 @@ TEST(ComputerSystemBuilder, FullStructureGivesOneComputerSystemNodeWithEveryProp
 
 TEST(ComputerSystemBuilder, NoSystemInformationStructureMakesNoNodeAndNothingBelowIt) {
     smbiostest::LogCapture log;
-    TableBuilder table;
-    table.add(chassis(0x0300, 0x17));
-    table.add(baseboard(0x0200));
-    table.endOfTable(0xFEFF);
-    ComputerRun run(table);
+    ComputerRun run(endedTableOf({chassis(0x0300, 0x17), baseboard(0x0200)}));
 
     ASSERT_EQ(1u, run.mi.nodeList.size());
     EXPECT_EQ(run.root, run.mi.nodeList[0]);
@@ -329,10 +310,7 @@ TEST(ComputerSystemBuilder, NoSystemInformationStructureMakesNoNodeAndNothingBel
 TEST(ComputerSystemBuilder,
      TwoSystemStructuresWithoutBaseboardGetIndexesZeroAndOneEachWithItsOwnChassis) {
     REQUIRE_FRESH_TABLE();
-    AcquiredComputerRun const acquired(
-        endedTableOf({systemInformation(0x0100, "First [1111AB1]"),
-                      systemInformation(0x0101, "Second [2222AB2]"), chassis(0x0300, 0x17)}),
-        2, 4);
+    AcquiredComputerRun const acquired(endedTableOf(twoSystemsAnd({chassis(0x0300, 0x17)})), 2, 4);
     ComputerRun const& run = acquired.run;
     LogCapture const& log = acquired.log;
     std::vector<IC::Node*> const& computers = acquired.computers;
@@ -365,10 +343,8 @@ TEST(ComputerSystemBuilder,
 
 TEST(ComputerSystemBuilder, WithBaseboardOnlyTheFirstOfTwoSystemStructuresGetsANode) {
     REQUIRE_FRESH_TABLE();
-    AcquiredComputerRun const acquired(endedTableOf({systemInformation(0x0100, "First [1111AB1]"),
-                                                     systemInformation(0x0101, "Second [2222AB2]"),
-                                                     chassis(0x0300, 0x17), baseboard(0x0200)}),
-                                       2, 4);
+    AcquiredComputerRun const acquired(
+        endedTableOf(twoSystemsAnd({chassis(0x0300, 0x17), baseboard(0x0200)})), 2, 4);
     ComputerRun const& run = acquired.run;
     LogCapture const& log = acquired.log;
 
@@ -394,10 +370,8 @@ TEST(ComputerSystemBuilder, Smbios21StructureOfLength0x19LacksSkuAndFamily) {
     IC::Node const* node = acquired.computers[0];
     EXPECT_EQ((std::vector<unsigned int>{36, 39, 45, 50, 64, 65, 125, 126, 127, 307}),
               propertyIds(node));
-    EXPECT_TRUE(lacksProperty(node, 52));
-    EXPECT_TRUE(lacksProperty(node, 20));
-    EXPECT_TRUE(hasEnum(node, 65, 1, 6));
-    EXPECT_TRUE(hasString(node, 64, UUID_AS_FORMATTED));
+    expectProperties(
+        node, {noProp(52), noProp(20), enumProp(65, 1, 6), stringProp(64, UUID_AS_FORMATTED)});
     // A product without a part number still sets 45, empty.
     EXPECT_TRUE(hasString(node, 45, ""));
     EXPECT_EQ(2u, log.count("propString offset=25 length=25")) << log.dump();
@@ -411,13 +385,9 @@ TEST(ComputerSystemBuilder, Smbios20StructureOfLength8LacksUuidAndWakeUpType) {
     ASSERT_EQ(1u, acquired.computers.size());
     IC::Node const* node = acquired.computers[0];
     EXPECT_EQ((std::vector<unsigned int>{36, 39, 45, 50, 125, 126, 127, 307}), propertyIds(node));
-    EXPECT_TRUE(hasString(node, 36, "Corvane"));
-    EXPECT_TRUE(hasString(node, 39, "8837 Blade"));
-    EXPECT_TRUE(hasString(node, 45, "8837"));
-    EXPECT_TRUE(hasString(node, 307, "V1.2"));
-    EXPECT_TRUE(hasString(node, 50, "SYS-0001"));
-    EXPECT_TRUE(lacksProperty(node, 64));
-    EXPECT_TRUE(lacksProperty(node, 65));
+    expectProperties(
+        node, {stringProp(36, "Corvane"), stringProp(39, "8837 Blade"), stringProp(45, "8837"),
+               stringProp(307, "V1.2"), stringProp(50, "SYS-0001"), noProp(64), noProp(65)});
     EXPECT_EQ(2u, log.count("PlatformUtilities::uuid_unparse error ")) << log.dump();
     EXPECT_EQ(0u, log.count("reverse_uuid_byte_order entry")) << log.dump();
 }
@@ -430,9 +400,7 @@ TEST(ComputerSystemBuilder, StructureTooShortForTheUuidGetsNoUuidProperty) {
     ASSERT_EQ(0x17u, acquired.firstLength());
     ASSERT_EQ(1u, acquired.computers.size());
     IC::Node const* node = acquired.computers[0];
-    EXPECT_TRUE(lacksProperty(node, 64));
-    EXPECT_TRUE(lacksProperty(node, 65));
-    EXPECT_TRUE(hasString(node, 50, "SYS-0001"));
+    expectProperties(node, {noProp(64), noProp(65), stringProp(50, "SYS-0001")});
     EXPECT_EQ(2u, log.count("PlatformUtilities::uuid_unparse error ")) << log.dump();
     EXPECT_EQ(0u, log.count("reverse_uuid_byte_order entry")) << log.dump();
 }
@@ -452,10 +420,9 @@ TEST(ComputerSystemBuilder, StructureEndingRightAfterTheUuidGetsTheUuidButNoWake
 TEST(ComputerSystemBuilder, Smbios24TableSetsTheUuidAsFormatted) {
     REQUIRE_FRESH_TABLE();
     AcquiredComputerRun const acquired(endedTableOf({systemInformation(0x0100)}), 2, 4);
-    LogCapture const& log = acquired.log;
     ASSERT_EQ(1u, acquired.computers.size());
     EXPECT_TRUE(hasString(acquired.computers[0], 64, UUID_AS_FORMATTED));
-    EXPECT_EQ(0u, log.count("Entering if condition UUID = ")) << log.dump();
+    EXPECT_EQ(0u, acquired.log.count("Entering if condition UUID = ")) << acquired.log.dump();
     EXPECT_EQ(2u, acquired.run.mi.getSmBiosMajorVersion());
     EXPECT_EQ(4u, acquired.run.mi.getSmBiosMinorVersion());
 }
@@ -463,11 +430,12 @@ TEST(ComputerSystemBuilder, Smbios24TableSetsTheUuidAsFormatted) {
 TEST(ComputerSystemBuilder, Smbios26TableSetsTheUuidWithItsFirstThreeFieldsByteReversed) {
     REQUIRE_FRESH_TABLE();
     AcquiredComputerRun const acquired(endedTableOf({systemInformation(0x0100)}), 2, 6);
-    LogCapture const& log = acquired.log;
     ASSERT_EQ(1u, acquired.computers.size());
     EXPECT_TRUE(hasString(acquired.computers[0], 64, UUID_REORDERED));
-    EXPECT_EQ(2u, log.count("Entering if condition UUID = " + UUID_AS_FORMATTED)) << log.dump();
-    EXPECT_EQ(2u, log.count("Exiting if condition UUID = " + UUID_REORDERED)) << log.dump();
+    EXPECT_EQ(2u, acquired.log.count("Entering if condition UUID = " + UUID_AS_FORMATTED))
+        << acquired.log.dump();
+    EXPECT_EQ(2u, acquired.log.count("Exiting if condition UUID = " + UUID_REORDERED))
+        << acquired.log.dump();
 }
 
 TEST(ComputerSystemBuilder, ProductWithoutPartNumberAndEmptyTextsAreStillSet) {

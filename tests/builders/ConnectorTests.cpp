@@ -41,6 +41,16 @@ struct ConnectorRun : PlanarSetup {
     }
 };
 
+// One connector of the internal designator and port type makes one node
+// with the designator (108) and the port type (128).
+void expectOneConnector(std::string const& designator, uint8_t portType) {
+    ConnectorRun setup(tableOf({connector(0x0800, designator, portType)}));
+    std::vector<IC::Node*> const nodes = setup.run();
+    ASSERT_EQ(1u, nodes.size());
+    EXPECT_TRUE(hasString(nodes[0], 108, designator));
+    EXPECT_TRUE(hasEnum(nodes[0], 128, 1, portType));
+}
+
 }  // namespace
 
 TEST(ConnectorBuilder, ConnectorNodeFieldByField) {
@@ -56,30 +66,17 @@ TEST(ConnectorBuilder, ConnectorNodeFieldByField) {
     EXPECT_TRUE(hasString(node, 108, "Compute ITE 1"));
     EXPECT_TRUE(hasEnum(node, 128, 1, 0x10));
 
-    EXPECT_EQ(2u, setup.mi.nodeList.size());
-    EXPECT_EQ(4u, setup.mi.nextNodeId);
-    EXPECT_EQ((std::vector<std::string>{"makeConnectorNodes entry", "Table 8 length = 9",
-                                        "makeConnectorNodes exit"}),
-              loggedBy(CONNECTOR_LOGGER))
-        << log.dump();
+    EXPECT_TRUE(holdsNodes(setup.mi, 2, 4));
+    EXPECT_TRUE(loggedExactly(CONNECTOR_LOGGER, {"makeConnectorNodes entry", "Table 8 length = 9",
+                                                 "makeConnectorNodes exit"}));
 }
 
 TEST(ConnectorBuilder, DesignatorBeginningWithComputeITEAndANumberBecomesANode) {
-    ConnectorRun setup(tableOf({connector(0x0800, "Compute ITE 12", 0x09)}));
-    std::vector<IC::Node*> const nodes = setup.run();
-
-    ASSERT_EQ(1u, nodes.size());
-    EXPECT_TRUE(hasString(nodes[0], 108, "Compute ITE 12"));
-    EXPECT_TRUE(hasEnum(nodes[0], 128, 1, 0x09));
+    expectOneConnector("Compute ITE 12", 0x09);
 }
 
 TEST(ConnectorBuilder, DesignatorWithWordsBeforeComputeITEBecomesANodeWithTheWholeText) {
-    ConnectorRun setup(tableOf({connector(0x0800, "Rear Panel Compute ITE 3 (LAN)", 0x1F)}));
-    std::vector<IC::Node*> const nodes = setup.run();
-
-    ASSERT_EQ(1u, nodes.size());
-    EXPECT_TRUE(hasString(nodes[0], 108, "Rear Panel Compute ITE 3 (LAN)"));
-    EXPECT_TRUE(hasEnum(nodes[0], 128, 1, 0x1F));
+    expectOneConnector("Rear Panel Compute ITE 3 (LAN)", 0x1F);
 }
 
 TEST(ConnectorBuilder, LowerCaseComputeIteMakesNoNode) {
@@ -98,8 +95,7 @@ TEST(ConnectorBuilder, DesignatorWithoutComputeITEMakesNoNode) {
                  connector(0x0802, "ComputeITE 1", 0x09)}));
 
     EXPECT_TRUE(setup.run().empty());
-    EXPECT_EQ(1u, setup.mi.nodeList.size());
-    EXPECT_EQ(3u, setup.mi.nextNodeId);
+    EXPECT_TRUE(holdsNodes(setup.mi, 1, 3));
     // Every structure is looked at, each with its own line.
     EXPECT_EQ(3u, frametest::loggedLevels("Table 8 length = 9").size()) << log.dump();
 }
@@ -134,10 +130,8 @@ TEST(ConnectorBuilder, TwoQualifyingConnectorsKeepTheirGroupPositions) {
     std::vector<IC::Node*> const nodes = setup.run();
 
     ASSERT_EQ(2u, nodes.size());
-    EXPECT_EQ(3u, nodes[0]->getNodeId());
-    EXPECT_EQ(0u, nodes[0]->getIndex());
-    EXPECT_EQ(4u, nodes[1]->getNodeId());
-    EXPECT_EQ(2u, nodes[1]->getIndex());
+    EXPECT_TRUE(hasIdAndIndex(nodes[0], 3, 0));
+    EXPECT_TRUE(hasIdAndIndex(nodes[1], 4, 2));
     EXPECT_TRUE(hasEnum(nodes[1], 128, 1, 0x0D));
 }
 
@@ -158,11 +152,8 @@ TEST(ConnectorBuilder, EmptyConnectorGroupMakesNoNodesAndLogsOnlyEntryAndExit) {
 
     smbiostest::LogCapture log;
     EXPECT_TRUE(setup.run().empty());
-    EXPECT_EQ(1u, setup.mi.nodeList.size());
-    EXPECT_EQ(3u, setup.mi.nextNodeId);
-    EXPECT_EQ((std::vector<std::string>{"makeConnectorNodes entry", "makeConnectorNodes exit"}),
-              frametest::loggedTexts())
-        << log.dump();
+    EXPECT_TRUE(holdsNodes(setup.mi, 1, 3));
+    EXPECT_TRUE(loggedOnly({"makeConnectorNodes entry", "makeConnectorNodes exit"}));
 }
 
 TEST(ConnectorBuilder, FailureInOneConnectorIsLoggedAndTheNextStillGetsANode) {
@@ -179,8 +170,7 @@ TEST(ConnectorBuilder, FailureInOneConnectorIsLoggedAndTheNextStillGetsANode) {
 
     EXPECT_TRUE(loggedOutOfRangeAt("Table 8 index =0")) << log.dump();
     ASSERT_EQ(1u, nodes.size());
-    EXPECT_EQ(3u, nodes[0]->getNodeId());
-    EXPECT_EQ(1u, nodes[0]->getIndex());
+    EXPECT_TRUE(hasIdAndIndex(nodes[0], 3, 1));
     EXPECT_TRUE(hasString(nodes[0], 108, "Compute ITE 2"));
     std::vector<std::string> const texts = loggedBy(CONNECTOR_LOGGER);
     ASSERT_FALSE(texts.empty());

@@ -76,10 +76,8 @@ TEST(KvdNode, ExampleStringMakesOneNodeWithEveryField) {
     EXPECT_TRUE(isNode(node, 3u, 2u, 53, 0u, 1u, DESCRIPTION));
     EXPECT_EQ(std::vector<unsigned int>{1}, node->getMIIds());
     EXPECT_EQ((std::vector<unsigned int>{104, 107, 134, 171}), propertyIds(node));
-    EXPECT_TRUE(hasString(node, 134, "3.10 -[AB12C-3.10]-"));
-    EXPECT_TRUE(hasUnsigned(node, 104, 3));
-    EXPECT_TRUE(hasUnsigned(node, 107, 10));
-    EXPECT_TRUE(hasString(node, 171, "AB12C-3.10"));
+    expectProperties(node, {stringProp(134, "3.10 -[AB12C-3.10]-"), unsignedProp(104, 3),
+                            unsignedProp(107, 10), stringProp(171, "AB12C-3.10")});
     EXPECT_EQ(node, lists.storage[11][0].node);
     EXPECT_EQ(2u, mi.nodeList.size());
     EXPECT_TRUE(childrenOf(mi, 3).empty());
@@ -227,10 +225,8 @@ TEST(KvdNode, VersionTextStartsAtTheFirstNonBlankAndRunsToTheEnd) {
     KvdRun const run(mi, oemTable({{"OEM: " + EYE + "    12.345   -[Z-9]- tail"}}));
     ASSERT_EQ(1u, run.nodes.size());
     IC::Node const* node = run.nodes[0];
-    EXPECT_TRUE(hasString(node, 134, "12.345   -[Z-9]- tail"));
-    EXPECT_TRUE(hasUnsigned(node, 104, 12));
-    EXPECT_TRUE(hasUnsigned(node, 107, 345));
-    EXPECT_TRUE(hasString(node, 171, "Z-9"));
+    expectProperties(node, {stringProp(134, "12.345   -[Z-9]- tail"), unsignedProp(104, 12),
+                            unsignedProp(107, 345), stringProp(171, "Z-9")});
 }
 
 TEST(KvdNode, MissingDigitsGiveZero) {
@@ -239,12 +235,8 @@ TEST(KvdNode, MissingDigitsGiveZero) {
 
     std::vector<IC::Node*> const& nodes = run.nodes;
     ASSERT_EQ(2u, nodes.size());
-    EXPECT_TRUE(hasUnsigned(nodes[0], 104, 0));
-    EXPECT_TRUE(hasUnsigned(nodes[0], 107, 5));
-    EXPECT_TRUE(hasString(nodes[0], 171, "B1"));
-    EXPECT_TRUE(hasUnsigned(nodes[1], 104, 7));
-    EXPECT_TRUE(hasUnsigned(nodes[1], 107, 0));
-    EXPECT_TRUE(hasString(nodes[1], 171, "B2"));
+    expectProperties(nodes[0], {unsignedProp(104, 0), unsignedProp(107, 5), stringProp(171, "B1")});
+    expectProperties(nodes[1], {unsignedProp(104, 7), unsignedProp(107, 0), stringProp(171, "B2")});
 }
 
 TEST(KvdNode, RejectedStringDoesNotEndTheScan) {
@@ -254,10 +246,8 @@ TEST(KvdNode, RejectedStringDoesNotEndTheScan) {
 
     std::vector<IC::Node*> const& nodes = run.nodes;
     ASSERT_EQ(1u, nodes.size()) << log.dump();
-    EXPECT_TRUE(hasString(nodes[0], 134, "4.2 -[GOOD]-"));
-    EXPECT_TRUE(hasUnsigned(nodes[0], 104, 4));
-    EXPECT_TRUE(hasUnsigned(nodes[0], 107, 2));
-    EXPECT_TRUE(hasString(nodes[0], 171, "GOOD"));
+    expectProperties(nodes[0], {stringProp(134, "4.2 -[GOOD]-"), unsignedProp(104, 4),
+                                unsignedProp(107, 2), stringProp(171, "GOOD")});
     EXPECT_EQ(1u, loggedCount(NOT_XY)) << log.dump();
 }
 
@@ -303,8 +293,7 @@ TEST(KvdNode, IndexIsThePositionOfTheStructureAmongTheOemStrings) {
 
     std::vector<IC::Node*> const& nodes = run.nodes;
     ASSERT_EQ(1u, nodes.size());
-    EXPECT_EQ(3u, nodes[0]->getNodeId());
-    EXPECT_EQ(2u, nodes[0]->getIndex());
+    EXPECT_TRUE(hasIdAndIndex(nodes[0], 3, 2));
     EXPECT_TRUE(hasString(nodes[0], 171, "K5"));
     EXPECT_EQ(nullptr, lists.storage[11][0].node);
     EXPECT_EQ(nullptr, lists.storage[11][1].node);

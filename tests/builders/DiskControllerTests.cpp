@@ -38,12 +38,9 @@ void expectIdeBusNode(IC::Node const* node, unsigned int parentId, unsigned int 
     EXPECT_EQ(status, node->getStatus());
     EXPECT_EQ("IDE Bus", node->getDescription());
     EXPECT_EQ((std::vector<unsigned int>{44, 81, 85, 125, 128, 185}), propertyIds(node));
-    EXPECT_TRUE(hasUnsignedList(node, 125, {1, 16}));
-    EXPECT_TRUE(hasUnsigned(node, 85, 0));
-    EXPECT_TRUE(hasUnsigned(node, 185, 36));
-    EXPECT_TRUE(hasUnsigned(node, 81, 2));
-    EXPECT_TRUE(hasString(node, 128, "IDE Bus"));
-    EXPECT_TRUE(hasString(node, 44, "Other"));
+    expectProperties(node,
+                     {unsignedListProp(125, {1, 16}), unsignedProp(85, 0), unsignedProp(185, 36),
+                      unsignedProp(81, 2), stringProp(128, "IDE Bus"), stringProp(44, "Other")});
 }
 
 // The one node the builder makes from a single OEM Strings structure holding
@@ -51,6 +48,16 @@ void expectIdeBusNode(IC::Node const* node, unsigned int parentId, unsigned int 
 IC::Node* ideNodeOf(DiskRun& setup) {
     std::vector<IC::Node*> const nodes = setup.run();
     return nodes.size() == 1 ? nodes[0] : nullptr;
+}
+
+// The run makes one node, of id `id` and status `status`, and the next
+// node id is `nextId`.
+void expectOneNode(DiskRun& setup, unsigned int id, unsigned int status, unsigned int nextId) {
+    std::vector<IC::Node*> const nodes = setup.run();
+    ASSERT_EQ(1u, nodes.size());
+    EXPECT_EQ(id, nodes[0]->getNodeId());
+    EXPECT_EQ(status, nodes[0]->getStatus());
+    EXPECT_EQ(nextId, setup.mi.nextNodeId);
 }
 
 }  // namespace
@@ -75,8 +82,7 @@ TEST(DiskControllerBuilder, EnabledIdeStringMakesAnEnabledNodeFieldByField) {
     ASSERT_EQ(0u, node->getProperty(128, busType).getStatus());
     EXPECT_EQ(IC::PropertyValue::STRING, busType.getKind());
 
-    EXPECT_EQ(2u, setup.mi.nodeList.size());
-    EXPECT_EQ(4u, setup.mi.nextNodeId);
+    EXPECT_TRUE(holdsNodes(setup.mi, 2, 4));
     std::vector<std::string> const texts = loggedBy(DISK_LOGGER);
     ASSERT_FALSE(texts.empty()) << log.dump();
     EXPECT_EQ("makeDiskControllerNodes entry", texts.front()) << log.dump();
@@ -141,18 +147,13 @@ TEST(DiskControllerBuilder, IdeStringOnlyInTheSecondStructureGetsTheSecondReserv
     for (IC::Node const* node : setup.mi.nodeList) {
         EXPECT_NE(3u, node->getNodeId());
     }
-    EXPECT_EQ(2u, setup.mi.nodeList.size());
-    EXPECT_EQ(5u, setup.mi.nextNodeId);
+    EXPECT_TRUE(holdsNodes(setup.mi, 2, 5));
 }
 
 TEST(DiskControllerBuilder, BothIdeStringsInOneStructureOnlyTheFirstFoundMakesANode) {
     DiskRun setup(tableOf({oemStrings(0x0B00, {"Corvane", DISABLED, ENABLED})}));
-    std::vector<IC::Node*> const nodes = setup.run();
 
-    ASSERT_EQ(1u, nodes.size());
-    EXPECT_EQ(3u, nodes[0]->getNodeId());
-    EXPECT_EQ(16u, nodes[0]->getStatus());
-    EXPECT_EQ(4u, setup.mi.nextNodeId);
+    expectOneNode(setup, 3, 16, 4);
 }
 
 TEST(DiskControllerBuilder, NoOemStringsStructureMakesNoNodeAndUsesNoId) {
@@ -160,20 +161,15 @@ TEST(DiskControllerBuilder, NoOemStringsStructureMakesNoNodeAndUsesNoId) {
 
     smbiostest::LogCapture log;
     EXPECT_TRUE(setup.run().empty());
-    EXPECT_EQ(1u, setup.mi.nodeList.size());
-    EXPECT_EQ(3u, setup.mi.nextNodeId);
-    EXPECT_EQ(
-        (std::vector<std::string>{"makeDiskControllerNodes entry", "makeDiskControllerNodes exit"}),
-        frametest::loggedTexts())
-        << log.dump();
+    EXPECT_TRUE(holdsNodes(setup.mi, 1, 3));
+    EXPECT_TRUE(loggedOnly({"makeDiskControllerNodes entry", "makeDiskControllerNodes exit"}));
 }
 
 TEST(DiskControllerBuilder, StructureWithoutTheIdeStringStillUsesUpANodeId) {
     DiskRun setup(tableOf({oemStrings(0x0B00, {"Corvane", "RS-7400"})}));
 
     EXPECT_TRUE(setup.run().empty());
-    EXPECT_EQ(1u, setup.mi.nodeList.size());
-    EXPECT_EQ(4u, setup.mi.nextNodeId);
+    EXPECT_TRUE(holdsNodes(setup.mi, 1, 4));
 }
 
 TEST(DiskControllerBuilder, StructureWithCountZeroStillUsesUpANodeId) {
@@ -217,12 +213,8 @@ TEST(DiskControllerBuilder, CountBeyondTheStringsReadsMissingStringsAsEmpty) {
     table.add(Structure(11, 0x0B00).byte(4).addString(DISABLED));
     table.add(Structure(11, 0x0B01).byte(4).addString("Corvane"));
     DiskRun setup(table);
-    std::vector<IC::Node*> const nodes = setup.run();
 
-    ASSERT_EQ(1u, nodes.size());
-    EXPECT_EQ(3u, nodes[0]->getNodeId());
-    EXPECT_EQ(16u, nodes[0]->getStatus());
-    EXPECT_EQ(5u, setup.mi.nextNodeId);
+    expectOneNode(setup, 3, 16, 5);
 }
 
 TEST(DiskControllerBuilder, IndexIsAlwaysOne) {
@@ -231,12 +223,8 @@ TEST(DiskControllerBuilder, IndexIsAlwaysOne) {
     std::vector<IC::Node*> const nodes = setup.run();
 
     ASSERT_EQ(2u, nodes.size());
-    EXPECT_EQ(3u, nodes[0]->getNodeId());
-    EXPECT_EQ(1u, nodes[0]->getIndex());
-    EXPECT_EQ(1u, nodes[0]->getStatus());
-    EXPECT_EQ(5u, nodes[1]->getNodeId());
-    EXPECT_EQ(1u, nodes[1]->getIndex());
-    EXPECT_EQ(16u, nodes[1]->getStatus());
+    EXPECT_TRUE(hasIdIndexAndStatus(nodes[0], 3, 1, 1));
+    EXPECT_TRUE(hasIdIndexAndStatus(nodes[1], 5, 1, 16));
     expectIdeBusNode(nodes[1], setup.planar->getNodeId(), 16);
     EXPECT_EQ(6u, setup.mi.nextNodeId);
 }

@@ -20,6 +20,7 @@
 #include <cstdlib>
 #include <functional>
 #include <iostream>
+#include <map>
 #include <set>
 #include <sstream>
 #include <stdexcept>
@@ -154,6 +155,72 @@ unsigned int probeLocation(Bytes const& structure) {
     return structure.size() > 5 && structure[1] > 5 ? structure[5] & 0x1Fu : 0u;
 }
 
+// A builder of the plug-in that takes the structure lists and the parent
+// alone.
+typedef void (IC::SmBiosMI::*Build)(IC::TableLists, unsigned int);
+// One that takes a third number: a cache handle or a probe location.
+typedef void (IC::SmBiosMI::*BuildWith)(IC::TableLists, unsigned int, unsigned int);
+
+// The step that runs the builder and adds nothing to the snapshot.
+Step stepOf(Build build) {
+    return [build](TestMI& mi, IC::TableLists lists, unsigned int parent) {
+        (mi.*build)(lists, parent);
+        return std::string();
+    };
+}
+Step stepOf(BuildWith build, unsigned int with) {
+    return [build, with](TestMI& mi, IC::TableLists lists, unsigned int parent) {
+        (mi.*build)(lists, parent, with);
+        return std::string();
+    };
+}
+
+// The builders of lists and parent alone that read a structure of the type,
+// in the order they run.
+std::vector<Build> buildersOf(uint8_t type) {
+    using MI = IC::SmBiosMI;
+    static std::map<uint8_t, std::vector<Build>> const builders = {
+        // The system's texts are read by the chassis and planar builders
+        // too, whether or not there is a chassis or baseboard.
+        {1, {&MI::makeComputerNodes, &MI::makeChassisNodes, &MI::makePlanarNodes}},
+        {11, {&MI::makeDiskControllerNodes, &MI::makeFirmwareNodes, &MI::makeKVDNode}},
+        // The types one builder reads.
+        {0, {&MI::makeFirmwareNodes}},
+        {2, {&MI::makePlanarNodes}},
+        {3, {&MI::makeChassisNodes}},
+        {4, {&MI::makeCpuNodes}},
+        {8, {&MI::makeConnectorNodes}},
+        {9, {&MI::makeSlotNodes}},
+        {15, {&MI::makeLogNodes}},
+        {16, {&MI::makeDimmNodes}},
+        {17, {&MI::makeDimmNodes}},
+        {38, {&MI::makeBMCNodes}},
+    };
+    auto const found = builders.find(type);
+    return found == builders.end() ? std::vector<Build>() : found->second;
+}
+
+// The group lookup makes no node: what it finds for each item of the group
+// goes into the snapshot.
+Step groupLookups(Bytes const& group) {
+    std::vector<std::pair<unsigned int, unsigned int>> items;
+    for (size_t at = 5; at + 2 < group.size() && at + 2 < group[1]; at += 3) {
+        items.push_back(std::make_pair(
+            group[at], static_cast<unsigned int>(group[at + 1] | (group[at + 2] << 8))));
+    }
+    return [items](TestMI& mi, IC::TableLists lists, unsigned int) {
+        std::ostringstream found;
+        for (auto const& item : items) {
+            found << "group lookup " << item.first << " " << item.second << ":";
+            for (auto const& member : mi.findGroup(lists, item.first, item.second)) {
+                found << " " << static_cast<unsigned int>(member.first) << "/" << member.second;
+            }
+            found << "\n";
+        }
+        return found.str();
+    };
+}
+
 // The builders that read a structure of this type, given the structure as it
 // was before any cut (the handle a processor would name, the location a
 // host would ask for). The raw-table nodes of the frame come with every
@@ -161,147 +228,20 @@ unsigned int probeLocation(Bytes const& structure) {
 std::vector<Step> stepsFor(Bytes const& original) {
     std::vector<Step> steps;
     uint8_t const type = original[0];
-    switch (type) {
-        case 0:
-            steps.push_back([](TestMI& mi, IC::TableLists lists, unsigned int parent) {
-                mi.makeFirmwareNodes(lists, parent);
-                return std::string();
-            });
-            break;
-        case 1:
-            // The system's texts are read by the chassis and planar builders
-            // too, whether or not there is a chassis or baseboard.
-            steps.push_back([](TestMI& mi, IC::TableLists lists, unsigned int parent) {
-                mi.makeComputerNodes(lists, parent);
-                return std::string();
-            });
-            steps.push_back([](TestMI& mi, IC::TableLists lists, unsigned int parent) {
-                mi.makeChassisNodes(lists, parent);
-                return std::string();
-            });
-            steps.push_back([](TestMI& mi, IC::TableLists lists, unsigned int parent) {
-                mi.makePlanarNodes(lists, parent);
-                return std::string();
-            });
-            break;
-        case 2:
-            steps.push_back([](TestMI& mi, IC::TableLists lists, unsigned int parent) {
-                mi.makePlanarNodes(lists, parent);
-                return std::string();
-            });
-            break;
-        case 3:
-            steps.push_back([](TestMI& mi, IC::TableLists lists, unsigned int parent) {
-                mi.makeChassisNodes(lists, parent);
-                return std::string();
-            });
-            break;
-        case 4:
-            steps.push_back([](TestMI& mi, IC::TableLists lists, unsigned int parent) {
-                mi.makeCpuNodes(lists, parent);
-                return std::string();
-            });
-            break;
-        case 7: {
-            unsigned int const handle = handleOf(original);
-            steps.push_back([handle](TestMI& mi, IC::TableLists lists, unsigned int parent) {
-                mi.makeCacheNodes(lists, parent, handle);
-                return std::string();
-            });
-            break;
-        }
-        case 8:
-            steps.push_back([](TestMI& mi, IC::TableLists lists, unsigned int parent) {
-                mi.makeConnectorNodes(lists, parent);
-                return std::string();
-            });
-            break;
-        case 9:
-            steps.push_back([](TestMI& mi, IC::TableLists lists, unsigned int parent) {
-                mi.makeSlotNodes(lists, parent);
-                return std::string();
-            });
-            break;
-        case 11:
-            steps.push_back([](TestMI& mi, IC::TableLists lists, unsigned int parent) {
-                mi.makeDiskControllerNodes(lists, parent);
-                return std::string();
-            });
-            steps.push_back([](TestMI& mi, IC::TableLists lists, unsigned int parent) {
-                mi.makeFirmwareNodes(lists, parent);
-                return std::string();
-            });
-            steps.push_back([](TestMI& mi, IC::TableLists lists, unsigned int parent) {
-                mi.makeKVDNode(lists, parent);
-                return std::string();
-            });
-            break;
-        case 14: {
-            // The group lookup makes no node: what it finds for each item of
-            // the group goes into the snapshot.
-            std::vector<std::pair<unsigned int, unsigned int>> items;
-            for (size_t at = 5; at + 2 < original.size() && at + 2 < original[1]; at += 3) {
-                items.push_back(std::make_pair(
-                    original[at],
-                    static_cast<unsigned int>(original[at + 1] | (original[at + 2] << 8))));
-            }
-            steps.push_back([items](TestMI& mi, IC::TableLists lists, unsigned int) {
-                std::ostringstream found;
-                for (auto const& item : items) {
-                    found << "group lookup " << item.first << " " << item.second << ":";
-                    for (auto const& member : mi.findGroup(lists, item.first, item.second)) {
-                        found << " " << static_cast<unsigned int>(member.first) << "/"
-                              << member.second;
-                    }
-                    found << "\n";
-                }
-                return found.str();
-            });
-            break;
-        }
-        case 15:
-            steps.push_back([](TestMI& mi, IC::TableLists lists, unsigned int parent) {
-                mi.makeLogNodes(lists, parent);
-                return std::string();
-            });
-            break;
-        case 16:
-        case 17:
-            steps.push_back([](TestMI& mi, IC::TableLists lists, unsigned int parent) {
-                mi.makeDimmNodes(lists, parent);
-                return std::string();
-            });
-            break;
-        case 26: {
-            unsigned int const location = probeLocation(original);
-            steps.push_back([location](TestMI& mi, IC::TableLists lists, unsigned int parent) {
-                mi.makeVoltageSensorNodes(lists, parent, location);
-                return std::string();
-            });
-            break;
-        }
-        case 28: {
-            unsigned int const location = probeLocation(original);
-            steps.push_back([location](TestMI& mi, IC::TableLists lists, unsigned int parent) {
-                mi.makeTemperatureSensorNodes(lists, parent, location);
-                return std::string();
-            });
-            break;
-        }
-        case 38:
-            steps.push_back([](TestMI& mi, IC::TableLists lists, unsigned int parent) {
-                mi.makeBMCNodes(lists, parent);
-                return std::string();
-            });
-            break;
-        default:
-            break;
+    for (Build build : buildersOf(type)) {
+        steps.push_back(stepOf(build));
+    }
+    if (type == 7) {
+        steps.push_back(stepOf(&IC::SmBiosMI::makeCacheNodes, handleOf(original)));
+    } else if (type == 14) {
+        steps.push_back(groupLookups(original));
+    } else if (type == 26) {
+        steps.push_back(stepOf(&IC::SmBiosMI::makeVoltageSensorNodes, probeLocation(original)));
+    } else if (type == 28) {
+        steps.push_back(stepOf(&IC::SmBiosMI::makeTemperatureSensorNodes, probeLocation(original)));
     }
     if (type <= 31) {
-        steps.push_back([](TestMI& mi, IC::TableLists lists, unsigned int parent) {
-            mi.makeSMBIOSTableNodes(lists, parent);
-            return std::string();
-        });
+        steps.push_back(stepOf(&IC::SmBiosMI::makeSMBIOSTableNodes));
     }
     return steps;
 }
@@ -453,6 +393,22 @@ private:
     size_t differing_ = 0;
 };
 
+// Calls `use` on the table of every corpus dump, once the empty table is
+// acquired. Skips the test (there being no real dumps to `what`) without a
+// corpus; fails it when the corpus holds no dump.
+void forEachCorpusDump(std::string const& what,
+                       std::function<void(SourceTable const&)> const& use) {
+    if (smbiostest::corpusDir().empty()) {
+        GTEST_SKIP() << "SMBIOS_CORPUS_DIR is unset or not a folder; no real dumps to " << what;
+    }
+    std::vector<std::string> const names = smbiostest::corpusNames();
+    ASSERT_FALSE(names.empty()) << "no .bin dumps in " << smbiostest::corpusDir();
+    acquireEmptyTable();
+    for (std::string const& name : names) {
+        use(corpusTable(name));
+    }
+}
+
 double secondsSince(std::chrono::steady_clock::time_point start) {
     return std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
 }
@@ -488,19 +444,10 @@ struct ReadsInLogLines : TestMI {
     }
 };
 
-// A baseboard of length 0x0C: the word at 0x0B straddles the end.
-Bytes straddlingBaseboard() {
-    TableBuilder table;
-    table.add(Structure(2, 0x0200)
-                  .str("Board Maker")
-                  .str("MB-100")
-                  .str("BV-1")
-                  .str("BRD-1")
-                  .str("BA-1")
-                  .byte(0x09)
-                  .str("Slot A")
-                  .byte(0x00));
-    return table.build();
+// The table of one baseboard of length 0x0C: the word at 0x0B straddles the
+// end.
+Bytes straddlingBaseboardTable() {
+    return buildertest::tableOf({buildertest::straddlingBaseboard(0x0200)}).build();
 }
 
 size_t lineCount(std::string const& text) {
@@ -520,7 +467,7 @@ std::string buildReadingInLogLines(Bytes const& raw) {
 }  // namespace
 
 TEST(LogIndependenceHarness, NoticesAReadInsideALogLineThatChangesTheTree) {
-    Bytes const raw = straddlingBaseboard();
+    Bytes const raw = straddlingBaseboardTable();
     ASSERT_EQ(0x0C, raw[1]);
     LogToFile file;
     LevelComparison const result = compareLevels(
@@ -535,7 +482,7 @@ TEST(LogIndependenceHarness, NoticesAReadInsideALogLineThatChangesTheTree) {
 }
 
 TEST(LogIndependenceHarness, NoticesAReadInsideALogLineThatOnlyRaisesAFailure) {
-    Bytes const raw = straddlingBaseboard();
+    Bytes const raw = straddlingBaseboardTable();
     LogToFile file;
     LevelComparison const result = compareLevels(
         [&] { return buildReadingInLogLines<&ReadsInLogLines::buildKeepingTheTree>(raw); }, file);
@@ -551,7 +498,7 @@ TEST(LogIndependenceHarness, NoticesAReadInsideALogLineThatOnlyRaisesAFailure) {
 TEST(LogIndependenceHarness, AgentThresholdsRunLogsTheFailuresARealReadRaises) {
     // The same straddling word read before the log line: every run fails
     // alike, and the agent-level run writes the failure to its file.
-    Bytes const raw = straddlingBaseboard();
+    Bytes const raw = straddlingBaseboardTable();
     int const logLevel = QNLog::QNLogger::getLogLevel();
     int const traceLevel = QNLog::QNLogger::getTraceLevel();
     LogToFile file;
@@ -672,37 +619,27 @@ TEST(LogIndependence, DemoStructuresCutShortGiveTheSameTreesAtEveryLogSetting) {
 // The real machines' dumps
 
 TEST(LogIndependence, CorpusStructuresCutShortGiveTheSameTreesAtEveryLogSetting) {
-    if (smbiostest::corpusDir().empty()) {
-        GTEST_SKIP() << "SMBIOS_CORPUS_DIR is unset or not a folder; no real dumps to cut";
-    }
-    std::vector<std::string> const names = smbiostest::corpusNames();
-    ASSERT_FALSE(names.empty()) << "no .bin dumps in " << smbiostest::corpusDir();
-    acquireEmptyTable();
     auto const start = std::chrono::steady_clock::now();
+    size_t dumps = 0;
     size_t compared = 0;
-    for (std::string const& name : names) {
-        SourceTable const dump = corpusTable(name);
-        Checker checker(name);
+    forEachCorpusDump("cut", [&](SourceTable const& dump) {
+        Checker checker(dump.name);
         checker.checkStructuresAlone(dump.table);
         checker.finish();
         compared += checker.compared();
+        ++dumps;
+    });
+    if (dumps > 0) {
+        std::cout << "[ info     ] " << dumps << " dumps, " << compared << " comparisons in "
+                  << secondsSince(start) << " s" << std::endl;
     }
-    std::cout << "[ info     ] " << names.size() << " dumps, " << compared << " comparisons in "
-              << secondsSince(start) << " s" << std::endl;
 }
 
 TEST(LogIndependence, CorpusInventoriesAreTheSameAtEveryLogSetting) {
-    if (smbiostest::corpusDir().empty()) {
-        GTEST_SKIP() << "SMBIOS_CORPUS_DIR is unset or not a folder; no real dumps to build";
-    }
-    std::vector<std::string> const names = smbiostest::corpusNames();
-    ASSERT_FALSE(names.empty()) << "no .bin dumps in " << smbiostest::corpusDir();
-    acquireEmptyTable();
-    for (std::string const& name : names) {
-        SourceTable const dump = corpusTable(name);
+    forEachCorpusDump("build", [](SourceTable const& dump) {
         std::set<unsigned int> const locations = probeLocations(structuresOf(dump.table));
-        Checker checker(name);
+        Checker checker(dump.name);
         checker.check("whole table", [&] { return buildWholeTree(dump.table, locations); });
         checker.finish();
-    }
+    });
 }

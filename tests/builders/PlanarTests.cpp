@@ -51,16 +51,10 @@ BoardFields boardOfType(uint8_t type, std::string const& product) {
 
 Structure baseboard(uint16_t handle, BoardFields const& fields = BoardFields()) {
     Structure structure(2, handle);
-    structure.str(fields.manufacturer)
-        .str(fields.product)
-        .str(fields.version)
-        .str(fields.serial)
-        .str(fields.assetTag)
-        .byte(fields.featureFlags)
-        .str(fields.location)
-        .word(fields.chassisHandle)
-        .byte(fields.boardType)
-        .byte(static_cast<uint8_t>(fields.count >= 0 ? fields.count : fields.handles.size()));
+    structure.str(fields.manufacturer).str(fields.product).str(fields.version);
+    structure.str(fields.serial).str(fields.assetTag).byte(fields.featureFlags);
+    structure.str(fields.location).word(fields.chassisHandle).byte(fields.boardType);
+    structure.byte(static_cast<uint8_t>(fields.count >= 0 ? fields.count : fields.handles.size()));
     for (uint16_t contained : fields.handles) {
         structure.word(contained);
     }
@@ -77,17 +71,6 @@ Structure systemInformation(uint16_t handle, std::string const& manufacturer = "
         .byte(0x06)
         .str("SKU-77")
         .str("Server");
-}
-
-// A group association (type 14) with its items, each (type, handle).
-Structure group(uint16_t handle, std::string const& name,
-                std::vector<std::pair<uint8_t, uint16_t>> const& items) {
-    Structure structure(14, handle);
-    structure.str(name);
-    for (auto const& item : items) {
-        structure.byte(item.first).word(item.second);
-    }
-    return structure;
 }
 
 // An additional-information structure (type 40): no builder makes a node of
@@ -118,6 +101,35 @@ struct PlanarRun {
     TestMI mi;
     IC::MutableNode* parent = nullptr;
 };
+
+// The run made one planar node, of product `product` (property 39).
+void expectOnlyPlanar(PlanarRun const& run, std::string const& product) {
+    std::vector<IC::Node*> const planars = run.planars();
+    ASSERT_EQ(1u, planars.size());
+    EXPECT_TRUE(hasString(planars[0], 39, product));
+}
+
+// The run made one planar node, of product `product` (property 39) and
+// board type `type` (property 128).
+void expectOnlyPlanar(PlanarRun const& run, std::string const& product, unsigned int type) {
+    std::vector<IC::Node*> const planars = run.planars();
+    ASSERT_EQ(1u, planars.size());
+    EXPECT_TRUE(hasString(planars[0], 39, product));
+    EXPECT_TRUE(hasUnsigned(planars[0], 128, type));
+}
+
+// A System Information structure (0x0100) and a baseboard (0x0200) of the
+// fields.
+TableBuilder boardTable(BoardFields const& fields = BoardFields()) {
+    return tableOf({systemInformation(0x0100), baseboard(0x0200, fields)});
+}
+
+// The default fields with one text field empty.
+BoardFields emptied(std::string BoardFields::*field) {
+    BoardFields fields;
+    fields.*field = "";
+    return fields;
+}
 
 // The entry lines of the component builders that the planar calls, in the
 // order they were logged.
@@ -169,11 +181,7 @@ std::vector<unsigned int> loggedHandles(bool& closed) {
 
 TEST(PlanarBuilder, FullStructureGivesOnePlanarNodeWithEveryProperty) {
     smbiostest::LogCapture log;
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.add(baseboard(0x0200));
-    table.endOfTable(0xFEFF);
-    PlanarRun run(table);
+    PlanarRun run(endedTableOf({systemInformation(0x0100), baseboard(0x0200)}));
 
     std::vector<IC::Node*> const planars = run.planars();
     ASSERT_EQ(1u, planars.size()) << log.dump();
@@ -183,26 +191,21 @@ TEST(PlanarBuilder, FullStructureGivesOnePlanarNodeWithEveryProperty) {
 
     // The version string is not read.
     EXPECT_EQ((std::vector<unsigned int>{2, 31, 36, 39, 44, 50, 128, 172}), propertyIds(node));
-    EXPECT_TRUE(hasString(node, 36, "Board Maker"));
-    EXPECT_TRUE(hasString(node, 39, "MB-100"));
-    EXPECT_TRUE(hasString(node, 172, "MB-100"));
-    EXPECT_TRUE(hasString(node, 50, "BRD-1"));
-    EXPECT_TRUE(hasString(node, 2, "BA-1"));
-    EXPECT_TRUE(hasEnum(node, 44, 1, 0x09));
-    EXPECT_TRUE(hasString(node, 31, "Slot A"));
-    EXPECT_TRUE(hasUnsigned(node, 128, 0x0A));
+    expectProperties(
+        node, {stringProp(36, "Board Maker"), stringProp(39, "MB-100"), stringProp(172, "MB-100"),
+               stringProp(50, "BRD-1"), stringProp(2, "BA-1"), enumProp(44, 1, 0x09),
+               stringProp(31, "Slot A"), unsignedProp(128, 0x0A)});
 
     // The product and the location also go to the parent.
     EXPECT_EQ((std::vector<unsigned int>{31, 172}), propertyIds(run.parent));
     EXPECT_TRUE(hasString(run.parent, 172, "MB-100"));
     EXPECT_TRUE(hasString(run.parent, 31, "Slot A"));
 
-    EXPECT_EQ(2u, log.count("makePlanarNodes entry")) << log.dump();
-    EXPECT_EQ(2u, log.count("makePlanarNodes exit")) << log.dump();
-    EXPECT_EQ(2u, log.count("makePlanarNodes system manufacturer = Corvane")) << log.dump();
-    EXPECT_EQ(2u, log.count("Table 2 length = 15")) << log.dump();
-    EXPECT_EQ(2u, log.count("Handle=768")) << log.dump();
-    EXPECT_EQ(2u, log.count("Count of contained object handles=0")) << log.dump();
+    EXPECT_TRUE(frametest::loggedTimes(
+        log, 2,
+        {"makePlanarNodes entry", "makePlanarNodes exit",
+         "makePlanarNodes system manufacturer = Corvane", "Table 2 length = 15", "Handle=768",
+         "Count of contained object handles=0"}));
     EXPECT_EQ(0u, log.count("Handles=")) << log.dump();
     EXPECT_EQ(0u, log.count("No Table 2 for Planar")) << log.dump();
 }
@@ -224,9 +227,7 @@ TEST(PlanarBuilder, ShortBaseboardSetsBoardTypeZeroAndLacksTheLaterFields) {
 }
 
 TEST(PlanarBuilder, EmptyProductSetsEmpty39AndNo172OnEitherNode) {
-    BoardFields fields;
-    fields.product = "";
-    PlanarRun run(tableOf({systemInformation(0x0100), baseboard(0x0200, fields)}));
+    PlanarRun run(boardTable(emptied(&BoardFields::product)));
 
     std::vector<IC::Node*> const planars = run.planars();
     ASSERT_EQ(1u, planars.size());
@@ -238,9 +239,7 @@ TEST(PlanarBuilder, EmptyProductSetsEmpty39AndNo172OnEitherNode) {
 }
 
 TEST(PlanarBuilder, EmptyLocationSetsNo31OnEitherNode) {
-    BoardFields fields;
-    fields.location = "";
-    PlanarRun run(tableOf({systemInformation(0x0100), baseboard(0x0200, fields)}));
+    PlanarRun run(boardTable(emptied(&BoardFields::location)));
 
     std::vector<IC::Node*> const planars = run.planars();
     ASSERT_EQ(1u, planars.size());
@@ -257,10 +256,7 @@ TEST(PlanarBoardType, MotherboardListedAfterAServerBladeBecomesThePlanar) {
     PlanarRun run(tableOf({baseboard(0x0200, boardOfType(SERVER_BLADE, "Blade")),
                            baseboard(0x0201, boardOfType(MOTHERBOARD, "Motherboard"))}));
 
-    std::vector<IC::Node*> const planars = run.planars();
-    ASSERT_EQ(1u, planars.size());
-    EXPECT_TRUE(hasString(planars[0], 39, "Motherboard"));
-    EXPECT_TRUE(hasUnsigned(planars[0], 128, MOTHERBOARD));
+    expectOnlyPlanar(run, "Motherboard", MOTHERBOARD);
 }
 
 TEST(PlanarBoardType, EachBoardTypeWinsOverTheNextInThePriorityList) {
@@ -271,10 +267,7 @@ TEST(PlanarBoardType, EachBoardTypeWinsOverTheNextInThePriorityList) {
         table.add(baseboard(0x0200, boardOfType(PRIORITY[i + 1], "Less preferred")));
         table.add(baseboard(0x0201, boardOfType(PRIORITY[i], "Preferred")));
         PlanarRun run(table);
-        std::vector<IC::Node*> const planars = run.planars();
-        ASSERT_EQ(1u, planars.size());
-        EXPECT_TRUE(hasString(planars[0], 39, "Preferred"));
-        EXPECT_TRUE(hasUnsigned(planars[0], 128, PRIORITY[i]));
+        expectOnlyPlanar(run, "Preferred", PRIORITY[i]);
     }
 }
 
@@ -285,43 +278,31 @@ TEST(PlanarBoardType, MotherboardWinsOverEveryOtherBoardType) {
         table.add(baseboard(handle++, boardOfType(PRIORITY[i], "Board " + std::to_string(i))));
     }
     PlanarRun run(table);
-    std::vector<IC::Node*> const planars = run.planars();
-    ASSERT_EQ(1u, planars.size());
-    EXPECT_TRUE(hasString(planars[0], 39, "Board 0"));
-    EXPECT_TRUE(hasUnsigned(planars[0], 128, MOTHERBOARD));
+    expectOnlyPlanar(run, "Board 0", MOTHERBOARD);
 }
 
 TEST(PlanarBoardType, FirstOfTwoEqualBoardsBecomesThePlanar) {
     PlanarRun run(tableOf({baseboard(0x0200, boardOfType(MOTHERBOARD, "First")),
                            baseboard(0x0201, boardOfType(MOTHERBOARD, "Second"))}));
-    std::vector<IC::Node*> const planars = run.planars();
-    ASSERT_EQ(1u, planars.size());
-    EXPECT_TRUE(hasString(planars[0], 39, "First"));
+    expectOnlyPlanar(run, "First");
 }
 
 TEST(PlanarBoardType, BoardTypeOutsideTheListIsStillTakenWhenAlone) {
     PlanarRun run(tableOf({baseboard(0x0200, boardOfType(0x20, "Odd board"))}));
-    std::vector<IC::Node*> const planars = run.planars();
-    ASSERT_EQ(1u, planars.size());
-    EXPECT_TRUE(hasString(planars[0], 39, "Odd board"));
-    EXPECT_TRUE(hasUnsigned(planars[0], 128, 0x20));
+    expectOnlyPlanar(run, "Odd board", 0x20);
 }
 
 TEST(PlanarBoardType, FirstStructureIsTakenWhenNoBoardTypeIsInTheList) {
     PlanarRun run(tableOf({baseboard(0x0200, boardOfType(0x20, "First")),
                            baseboard(0x0201, boardOfType(0x00, "Second")),
                            baseboard(0x0202, boardOfType(0x0E, "Third"))}));
-    std::vector<IC::Node*> const planars = run.planars();
-    ASSERT_EQ(1u, planars.size());
-    EXPECT_TRUE(hasString(planars[0], 39, "First"));
+    expectOnlyPlanar(run, "First");
 }
 
 TEST(PlanarBoardType, UnknownBoardTypeWinsOverATypeOutsideTheList) {
     PlanarRun run(tableOf({baseboard(0x0200, boardOfType(0x20, "Odd")),
                            baseboard(0x0201, boardOfType(0x01, "Unknown"))}));
-    std::vector<IC::Node*> const planars = run.planars();
-    ASSERT_EQ(1u, planars.size());
-    EXPECT_TRUE(hasString(planars[0], 39, "Unknown"));
+    expectOnlyPlanar(run, "Unknown");
 }
 
 // ---------------------------------------------------------------------------
@@ -363,13 +344,9 @@ TEST(PlanarTakeover, AfterTheBuilderEverySharedListIsEmpty) {
 }
 
 TEST(PlanarTakeover, RawTableNodesHangUnderThePlanar) {
-    TableBuilder table;
-    table.add(systemInformation(0x0100));
-    table.add(baseboard(0x0200));
-    table.add(Structure(3, 0x0300).str("Chassis Maker").byte(0x17));
-    table.add(additional(0x2800));
-    table.endOfTable(0xFEFF);
-    PlanarRun run(table);
+    PlanarRun run(
+        endedTableOf({systemInformation(0x0100), baseboard(0x0200),
+                      Structure(3, 0x0300).str("Chassis Maker").byte(0x17), additional(0x2800)}));
 
     std::vector<IC::Node*> const planars = run.planars();
     ASSERT_EQ(1u, planars.size());
@@ -387,7 +364,7 @@ TEST(PlanarTakeover, RawTableNodesHangUnderThePlanar) {
 
 TEST(PlanarTakeover, ChildBuildersRunInTheFirstOrderWithABaseboard) {
     smbiostest::LogCapture log;
-    PlanarRun run(tableOf({systemInformation(0x0100), baseboard(0x0200)}));
+    PlanarRun run(boardTable());
     EXPECT_EQ((std::vector<std::string>{
                   "makeCpuNodes entry", "makeSlotNodes entry", "makeConnectorNodes entry",
                   "makeDimmNodes entry", "makeDiskControllerNodes entry",
@@ -446,10 +423,9 @@ TEST(PlanarTakeover, NoBaseboardMakesABarePlanarAndLeavesTheSharedListsAsTheyAre
 
 TEST(PlanarBuilder, ParentNotFoundBuildsNothing) {
     smbiostest::LogCapture log;
-    PlanarRun run(tableOf({systemInformation(0x0100), baseboard(0x0200)}), 99);
+    PlanarRun run(boardTable(), 99);
 
-    EXPECT_EQ(1u, run.mi.nodeList.size());
-    EXPECT_EQ(3u, run.mi.nextNodeId);
+    EXPECT_TRUE(holdsNodes(run.mi, 1, 3));
     EXPECT_TRUE(propertyIds(run.parent).empty());
     EXPECT_EQ(2u, log.count("makePlanarNodes Exit: failed to find parent node for nodeid 99"))
         << log.dump();
@@ -513,12 +489,11 @@ TEST(PlanarContainedHandles, HandlesAreLookedUpInEveryGroup) {
     bool closed = false;
     EXPECT_EQ((std::vector<unsigned int>{10240, 2457, 512}), loggedHandles(closed)) << log.dump();
     EXPECT_TRUE(closed) << log.dump();
-    EXPECT_EQ(2u, log.count("Planar contained element handle 10240 found in Bios table 40"))
-        << log.dump();
-    EXPECT_EQ(2u, log.count("Planar contained element handle 2457 not found in Bios tables "))
-        << log.dump();
-    EXPECT_EQ(2u, log.count("Planar contained element handle 512 found in Bios table 2"))
-        << log.dump();
+    EXPECT_TRUE(
+        frametest::loggedTimes(log, 2,
+                               {"Planar contained element handle 10240 found in Bios table 40",
+                                "Planar contained element handle 2457 not found in Bios tables ",
+                                "Planar contained element handle 512 found in Bios table 2"}));
     // The handles do not limit what the component builders see.
     EXPECT_EQ(2u, nodesOfType(run.mi, 55).size());
 }
@@ -575,9 +550,10 @@ TEST(PlanarGroup, GroupHoldingTheBaseboardHandleAsATypeIsReported) {
         tableOf({systemInformation(0x0100), baseboard(0x0020),
                  group(0x0E00, "Board group", {{0x20, 0x0002}, {4, 0x0400}, {7, 0x0700}})}));
 
-    EXPECT_EQ(2u, log.count(" Planar Group Associations Exist: ")) << log.dump();
-    EXPECT_EQ(2u, log.count("    Table Type=4 Handle=1024")) << log.dump();
-    EXPECT_EQ(2u, log.count("    Table Type=7 Handle=1792")) << log.dump();
+    EXPECT_TRUE(frametest::loggedTimes(
+        log, 2,
+        {" Planar Group Associations Exist: ", "    Table Type=4 Handle=1024",
+         "    Table Type=7 Handle=1792"}));
     EXPECT_EQ(1u, run.planars().size());
 }
 
@@ -596,21 +572,6 @@ TEST(PlanarGroup, GroupHoldingTheBaseboardByTypeAndHandleIsNotReported) {
 // The log thresholds: the chassis handle at 0x0B is read whatever they are.
 
 namespace {
-
-// A baseboard of length 0x0C: every field up to the location, then the low
-// byte of the chassis handle, whose word straddles the end of the formatted
-// area.
-Structure straddlingBaseboard(uint16_t handle) {
-    return Structure(2, handle)
-        .str("Board Maker")
-        .str("MB-100")
-        .str("BV-1")
-        .str("BRD-1")
-        .str("BA-1")
-        .byte(0x09)
-        .str("Slot A")
-        .byte(0x00);
-}
 
 // The table the planar would hand on to its component builders: a BIOS, the
 // system, the short baseboard, a slot and the end of the table.

@@ -68,54 +68,43 @@ private:
 struct Cpu {
     uint16_t handle = 0x0400;
     std::string socket = "CPU0";
-    uint8_t processorType = 3;
-    uint8_t family = 0xB3;
+    uint8_t processorType = 3, family = 0xB3;
     std::string manufacturer = "Corvane Silicon";
     uint64_t id = 0xBFEBFBFF000906EAull;
     std::string version = "Corvane X9 @ 3.00GHz";
     uint8_t voltage = 0x8C;
-    uint16_t externalClock = 100;
-    uint16_t maxSpeed = 4000;
-    uint16_t currentSpeed = 3000;
-    uint8_t status = 0x41;
-    uint8_t upgrade = 6;
-    uint16_t l1 = 0xFFFF;
-    uint16_t l2 = 0xFFFF;
-    uint16_t l3 = 0xFFFF;
-    std::string serial = "SN-0001";
-    std::string assetTag = "AT-42";
-    std::string partNumber = "PN-X9";
-    uint8_t coreCount = 0;
-    uint8_t coreEnabled = 0;
-    uint8_t threadCount = 0;
+    uint16_t externalClock = 100, maxSpeed = 4000, currentSpeed = 3000;
+    uint8_t status = 0x41, upgrade = 6;
+    uint16_t l1 = 0xFFFF, l2 = 0xFFFF, l3 = 0xFFFF;
+    std::string serial = "SN-0001", assetTag = "AT-42", partNumber = "PN-X9";
+    uint8_t coreCount = 0, coreEnabled = 0, threadCount = 0;
     uint16_t characteristics = 0x0004;
     size_t length = 0x28;
+
+    // The three core fields in one go.
+    Cpu& cores(uint8_t count, uint8_t enabled, uint8_t threads) {
+        coreCount = count;
+        coreEnabled = enabled;
+        threadCount = threads;
+        return *this;
+    }
+    // The L1, L2 and L3 cache handles in one go.
+    Cpu& caches(uint16_t level1, uint16_t level2, uint16_t level3) {
+        l1 = level1;
+        l2 = level2;
+        l3 = level3;
+        return *this;
+    }
 };
 
 Structure cpu(Cpu const& c) {
     Fields fields;
-    fields.str(c.socket)
-        .byte(c.processorType)
-        .byte(c.family)
-        .str(c.manufacturer)
-        .qword(c.id)
-        .str(c.version)
-        .byte(c.voltage)
-        .word(c.externalClock)
-        .word(c.maxSpeed)
-        .word(c.currentSpeed)
-        .byte(c.status)
-        .byte(c.upgrade)
-        .word(c.l1)
-        .word(c.l2)
-        .word(c.l3)
-        .str(c.serial)
-        .str(c.assetTag)
-        .str(c.partNumber)
-        .byte(c.coreCount)
-        .byte(c.coreEnabled)
-        .byte(c.threadCount)
-        .word(c.characteristics);
+    fields.str(c.socket).byte(c.processorType).byte(c.family).str(c.manufacturer).qword(c.id);
+    fields.str(c.version).byte(c.voltage);
+    fields.word(c.externalClock).word(c.maxSpeed).word(c.currentSpeed);
+    fields.byte(c.status).byte(c.upgrade).word(c.l1).word(c.l2).word(c.l3);
+    fields.str(c.serial).str(c.assetTag).str(c.partNumber);
+    fields.byte(c.coreCount).byte(c.coreEnabled).byte(c.threadCount).word(c.characteristics);
     return fields.structure(4, c.handle, c.length);
 }
 
@@ -123,17 +112,25 @@ Structure cpu(Cpu const& c) {
 // the given level, 32 KB.
 Structure cache(uint16_t handle, std::string const& socket, unsigned int level) {
     Structure out(7, handle);
-    out.str(socket)
-        .word(static_cast<uint16_t>(0x0180 | ((level - 1) & 7)))
-        .word(32)
-        .word(32)
-        .word(0x0002)
-        .word(0x0002)
-        .byte(0)
-        .byte(5)
-        .byte(5)
-        .byte(7);
+    out.str(socket).word(static_cast<uint16_t>(0x0180 | ((level - 1) & 7)));
+    out.word(32).word(32).word(0x0002).word(0x0002);
+    out.byte(0).byte(5).byte(5).byte(7);
     return out;
+}
+
+// The three caches a processor's handles 0x0700 to 0x0702 name, L1 to L3.
+std::vector<Structure> threeCaches() {
+    return {cache(0x0700, "L1-Cache", 1), cache(0x0701, "L2-Cache", 2),
+            cache(0x0702, "L3-Cache", 3)};
+}
+
+// A default processor "CPU1" at handle 0x0401, to follow one at the default
+// handle.
+Structure secondCpu() {
+    Cpu c;
+    c.handle = 0x0401;
+    c.socket = "CPU1";
+    return cpu(c);
 }
 
 // A table of one default processor per value, with handles from 0x0400 up,
@@ -151,71 +148,75 @@ TableBuilder oneCpuPerValue(std::vector<Value> const& values, Set set) {
     return table;
 }
 
-// makeCpuNodes run on mi over the table, under a planar node added first
-// (node id 2); cpus holds the processor nodes (type 4) it made, in order.
-struct CpuRun {
-    CpuRun(TestMI& mi, TableBuilder const& table) : parsed(table.build()), lists(parsed) {
-        planar = buildertest::addParent(mi);
+// makeCpuNodes run over the table, under a planar node added first (node
+// id 2); cpus holds the processor nodes (type 4) it made, in order.
+struct CpuRun : PlanarSetup {
+    explicit CpuRun(TableBuilder const& table) : PlanarSetup(table) {
         mi.makeCpuNodes(lists.get(), planar->getNodeId());
         cpus = nodesOfType(mi, 4);
     }
-    SD::SmBios parsed;
-    StructureLists lists;
-    IC::MutableNode* planar = nullptr;
+    // A table of the one processor.
+    explicit CpuRun(Cpu const& c) : CpuRun(tableOf({cpu(c)})) {}
     std::vector<IC::Node*> cpus;
 };
+
+// A processor of Status byte `status` is selected: its node "CPU 1" has
+// status 1 and property 55 (populated) true.
+void expectSelected(uint8_t status) {
+    Cpu c;
+    c.status = status;
+    CpuRun const run(c);
+    ASSERT_EQ(1u, run.cpus.size());
+    EXPECT_EQ(1u, run.cpus[0]->getStatus());
+    EXPECT_EQ("CPU 1", run.cpus[0]->getDescription());
+    EXPECT_TRUE(hasBool(run.cpus[0], 55, true));
+}
 
 }  // namespace
 
 TEST(ProcessorNodes, PopulatedEnabledProcessorWithCachesAndCoresFieldByField) {
     smbiostest::LogCapture log;
     Cpu c;
-    c.l1 = 0x0700;
-    c.l2 = 0x0701;
-    c.l3 = 0x0702;
-    c.coreCount = 2;
-    c.coreEnabled = 2;
-    c.threadCount = 4;
-    c.characteristics = 0x00FC;
-    TestMI mi;
-    CpuRun const run(mi, tableOf({cache(0x0700, "L1-Cache", 1), cache(0x0701, "L2-Cache", 2),
-                                  cache(0x0702, "L3-Cache", 3), cpu(c)}));
+    c.caches(0x0700, 0x0701, 0x0702).cores(2, 2, 4).characteristics = 0x00FC;
+    std::vector<Structure> structures = threeCaches();
+    structures.push_back(cpu(c));
+    CpuRun const run(tableOf(structures));
     ASSERT_EQ(2u, run.planar->getNodeId());
 
     // Planar, processor, three caches, two cores.
-    ASSERT_EQ(7u, mi.nodeList.size());
-    EXPECT_EQ(9u, mi.nextNodeId);
+    ASSERT_EQ(7u, run.mi.nodeList.size());
+    EXPECT_EQ(9u, run.mi.nextNodeId);
     ASSERT_EQ(1u, run.cpus.size());
     IC::Node const* node = run.cpus[0];
-    EXPECT_EQ(node, mi.nodeList[1]);
+    EXPECT_EQ(node, run.mi.nodeList[1]);
     EXPECT_TRUE(isNode(node, 3u, 2u, 4, 0u, 1u, "CPU 1"));
-    EXPECT_EQ(mi.miIdList, node->getMIIds());
+    EXPECT_EQ(run.mi.miIdList, node->getMIIds());
     EXPECT_EQ((std::vector<unsigned int>{2,  15, 19,  36,  38,  45,  50,  53,  55,  80,
                                          87, 89, 124, 125, 189, 190, 296, 298, 304, 307}),
               propertyIds(node));
-    EXPECT_TRUE(hasUnsignedList(node, 125, {0, 1, 16, 24, 7}));
-    EXPECT_TRUE(hasString(node, 53, "CPU0"));
-    EXPECT_TRUE(hasEnum(node, 296, 1, 3));
-    EXPECT_TRUE(hasUnsigned(node, 298, 0xB3));
-    EXPECT_TRUE(hasString(node, 36, "Corvane Silicon"));
-    EXPECT_TRUE(hasBytes(node, 89, {0xBF, 0xEB, 0xFB, 0xFF, 0x00, 0x09, 0x06, 0xEA}));
-    EXPECT_TRUE(hasString(node, 124, "10"));
-    EXPECT_TRUE(hasString(node, 307, "Corvane X9 @ 3.00GHz"));
-    EXPECT_TRUE(hasUnsigned(node, 19, 100));
-    EXPECT_TRUE(hasUnsigned(node, 38, 4000));
-    EXPECT_TRUE(hasUnsigned(node, 80, 3000));
-    EXPECT_TRUE(hasBool(node, 55, true));
-    EXPECT_TRUE(hasEnum(node, 304, 1, 4));
-    EXPECT_TRUE(hasString(node, 50, "SN-0001"));
-    EXPECT_TRUE(hasString(node, 2, "AT-42"));
-    EXPECT_TRUE(hasString(node, 45, "PN-X9"));
-    EXPECT_TRUE(hasUnsigned(node, 15, 64));
-    EXPECT_TRUE(hasUnsigned(node, 190, 2));
-    EXPECT_TRUE(hasUnsigned(node, 189, 2));
-    EXPECT_TRUE(hasUnsigned(node, 87, 4));
+    expectProperties(node, {unsignedListProp(125, {0, 1, 16, 24, 7}),
+                            stringProp(53, "CPU0"),
+                            enumProp(296, 1, 3),
+                            unsignedProp(298, 0xB3),
+                            stringProp(36, "Corvane Silicon"),
+                            bytesProp(89, {0xBF, 0xEB, 0xFB, 0xFF, 0x00, 0x09, 0x06, 0xEA}),
+                            stringProp(124, "10"),
+                            stringProp(307, "Corvane X9 @ 3.00GHz"),
+                            unsignedProp(19, 100),
+                            unsignedProp(38, 4000),
+                            unsignedProp(80, 3000),
+                            boolProp(55, true),
+                            enumProp(304, 1, 4),
+                            stringProp(50, "SN-0001"),
+                            stringProp(2, "AT-42"),
+                            stringProp(45, "PN-X9"),
+                            unsignedProp(15, 64),
+                            unsignedProp(190, 2),
+                            unsignedProp(189, 2),
+                            unsignedProp(87, 4)});
 
     // The caches come right after the processor, L1 to L3, then the cores.
-    std::vector<IC::Node*> const children = childrenOf(mi, 3);
+    std::vector<IC::Node*> const children = childrenOf(run.mi, 3);
     ASSERT_EQ(5u, children.size());
     for (unsigned int level = 0; level < 3; ++level) {
         SCOPED_TRACE("cache L" + std::to_string(level + 1));
@@ -236,11 +237,10 @@ TEST(ProcessorNodes, PopulatedEnabledProcessorWithCachesAndCoresFieldByField) {
         EXPECT_EQ(core, coreNode->getIndex());
         EXPECT_EQ(1u, coreNode->getStatus());
         EXPECT_EQ("CPU Core Information", coreNode->getDescription());
-        EXPECT_EQ(mi.miIdList, coreNode->getMIIds());
+        EXPECT_EQ(run.mi.miIdList, coreNode->getMIIds());
         EXPECT_EQ((std::vector<unsigned int>{87, 125, 128}), propertyIds(coreNode));
-        EXPECT_TRUE(hasUnsignedList(coreNode, 125, {1, 16}));
-        EXPECT_TRUE(hasEnum(coreNode, 128, 1, 0));
-        EXPECT_TRUE(hasUnsigned(coreNode, 87, 4));
+        expectProperties(
+            coreNode, {unsignedListProp(125, {1, 16}), enumProp(128, 1, 0), unsignedProp(87, 4)});
     }
 
     std::vector<std::string> const texts = loggedBy(CPU_LOGGER);
@@ -257,16 +257,7 @@ TEST(ProcessorNodes, PopulatedEnabledProcessorWithCachesAndCoresFieldByField) {
     EXPECT_EQ("makeCpuNodes exit", texts[9]);
 }
 
-TEST(ProcessorNodes, StatusPopulatedAndEnabledMakesANode) {
-    Cpu c;
-    c.status = 0x41;
-    TestMI mi;
-    CpuRun const run(mi, tableOf({cpu(c)}));
-
-    ASSERT_EQ(1u, run.cpus.size());
-    EXPECT_EQ(1u, run.cpus[0]->getStatus());
-    EXPECT_TRUE(hasBool(run.cpus[0], 55, true));
-}
+TEST(ProcessorNodes, StatusPopulatedAndEnabledMakesANode) { expectSelected(0x41); }
 
 TEST(ProcessorNodes, StatusNotPopulatedOrDisabledByBiosMakesNoNodeAndNoCacheNodes) {
     smbiostest::LogCapture log;
@@ -274,22 +265,12 @@ TEST(ProcessorNodes, StatusNotPopulatedOrDisabledByBiosMakesNoNodeAndNoCacheNode
         SCOPED_TRACE("status " + std::to_string(status));
         QNLog::QNLogger::clearCapture();
         Cpu c;
-        c.status = status;
-        c.l1 = 0x0700;
-        c.l2 = 0x0701;
-        c.l3 = 0x0702;
-        c.coreCount = 2;
-        c.coreEnabled = 2;
-        TableBuilder table;
-        table.add(cache(0x0700, "L1-Cache", 1));
-        table.add(cache(0x0701, "L2-Cache", 2));
-        table.add(cache(0x0702, "L3-Cache", 3));
-        table.add(cpu(c));
-        TestMI mi;
-        CpuRun const run(mi, table);
+        c.caches(0x0700, 0x0701, 0x0702).cores(2, 2, 0).status = status;
+        std::vector<Structure> structures = threeCaches();
+        structures.push_back(cpu(c));
+        CpuRun const run(tableOf(structures));
 
-        EXPECT_EQ(1u, mi.nodeList.size());
-        EXPECT_EQ(3u, mi.nextNodeId);
+        EXPECT_TRUE(holdsNodes(run.mi, 1, 3));
         EXPECT_TRUE(loggedBy(CACHE_LOGGER).empty()) << log.dump();
         // The structure is still looked at: its length is logged.
         EXPECT_EQ(1u, loggedCount("Table 4 length = 40")) << log.dump();
@@ -297,17 +278,7 @@ TEST(ProcessorNodes, StatusNotPopulatedOrDisabledByBiosMakesNoNodeAndNoCacheNode
     }
 }
 
-TEST(ProcessorNodes, StatusWithReservedBit7SetStillMakesANode) {
-    Cpu c;
-    c.status = 0xC1;
-    TestMI mi;
-    CpuRun const run(mi, tableOf({cpu(c)}));
-
-    ASSERT_EQ(1u, run.cpus.size());
-    EXPECT_EQ(1u, run.cpus[0]->getStatus());
-    EXPECT_EQ("CPU 1", run.cpus[0]->getDescription());
-    EXPECT_TRUE(hasBool(run.cpus[0], 55, true));
-}
+TEST(ProcessorNodes, StatusWithReservedBit7SetStillMakesANode) { expectSelected(0xC1); }
 
 // CPU status 2 (disabled by the user), 3 (disabled by firmware) and 4 (idle)
 // would map to node statuses 16, 24 and 7, but the selection lets only CPU
@@ -315,16 +286,12 @@ TEST(ProcessorNodes, StatusWithReservedBit7SetStillMakesANode) {
 TEST(ProcessorNodes, StatusesDisabledByUserOrFirmwareOrIdleMakeNoNode) {
     smbiostest::LogCapture log;
     std::vector<uint8_t> const statuses = {uint8_t{0x42}, uint8_t{0x43}, uint8_t{0x44}};
-    TestMI mi;
-    CpuRun const run(mi, oneCpuPerValue(statuses, [](Cpu& c, uint8_t status) {
-                         c.status = status;
-                         c.coreCount = 1;
-                         c.coreEnabled = 1;
-                     }));
+    CpuRun const run(
+        oneCpuPerValue(statuses, [](Cpu& c, uint8_t status) { c.cores(1, 1, 0).status = status; }));
 
-    EXPECT_EQ(1u, mi.nodeList.size());
+    EXPECT_EQ(1u, run.mi.nodeList.size());
     EXPECT_TRUE(run.cpus.empty());
-    EXPECT_TRUE(nodesOfType(mi, 42).empty());
+    EXPECT_TRUE(nodesOfType(run.mi, 42).empty());
     EXPECT_EQ(3u, loggedCount("Table 4 length = ")) << log.dump();
     EXPECT_EQ(0u, loggedCount("makeCacheNodes entry")) << log.dump();
 }
@@ -334,11 +301,10 @@ TEST(ProcessorNodes, StatusesDisabledByUserOrFirmwareOrIdleMakeNoNode) {
 TEST(ProcessorNodes, OnlyPopulatedWithCpuStatusOneIsSelected) {
     std::vector<uint8_t> const statuses = {0x00, 0x01, 0x02, 0x07, 0x40, 0x41, 0x45,
                                            0x46, 0x47, 0x49, 0x61, 0x81, 0xC1, 0xFF};
-    TestMI mi;
-    CpuRun const run(mi, oneCpuPerValue(statuses, [](Cpu& c, uint8_t status) {
-                         c.status = status;
-                         c.socket = "Socket " + std::to_string(status);
-                     }));
+    CpuRun const run(oneCpuPerValue(statuses, [](Cpu& c, uint8_t status) {
+        c.status = status;
+        c.socket = "Socket " + std::to_string(status);
+    }));
 
     // 0x41, 0x49 (bit 3 is outside the mask), 0x61 (bit 5 likewise) and 0xC1.
     ASSERT_EQ(4u, run.cpus.size());
@@ -352,15 +318,9 @@ TEST(ProcessorNodes, OnlyPopulatedWithCpuStatusOneIsSelected) {
 }
 
 TEST(ProcessorNodes, FirstProcessorSkippedSecondGetsIndexZeroAndDescriptionEndingInOne) {
-    Cpu absent;
-    absent.handle = 0x0400;
-    absent.socket = "CPU0";
+    Cpu absent;  // handle 0x0400, "CPU0"
     absent.status = 0x00;
-    Cpu present;
-    present.handle = 0x0401;
-    present.socket = "CPU1";
-    TestMI mi;
-    CpuRun const run(mi, tableOf({cpu(absent), cpu(present)}));
+    CpuRun const run(tableOf({cpu(absent), secondCpu()}));
 
     ASSERT_EQ(1u, run.cpus.size());
     EXPECT_TRUE(hasString(run.cpus[0], 53, "CPU1"));
@@ -377,8 +337,7 @@ TEST(ProcessorNodes, DescriptionCountsFromOneWhileIndexCountsFromZero) {
         c.socket = "CPU" + std::to_string(i);
         table.add(cpu(c));
     }
-    TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(table);
 
     ASSERT_EQ(3u, run.cpus.size());
     for (unsigned int i = 0; i < 3; ++i) {
@@ -393,8 +352,7 @@ TEST(ProcessorNodes, DescriptionCountsFromOneWhileIndexCountsFromZero) {
 TEST(ProcessorNodes, ProcessorIdIsStoredAsItsEightBytesReversed) {
     Cpu c;
     c.id = 0x0123456789ABCDEFull;
-    TestMI mi;
-    CpuRun const run(mi, tableOf({cpu(c)}));
+    CpuRun const run(c);
     ASSERT_EQ(0xEF, run.parsed.getTables()[0].getByte(0x08));
 
     ASSERT_EQ(1u, run.cpus.size());
@@ -407,10 +365,8 @@ TEST(ProcessorNodes, SteppingIsTheLowNibbleOfTheFirstIdByteAsDecimalText) {
     smbiostest::LogCapture log;
     std::vector<uint8_t> const firstBytes = {0x00, 0x07, 0xA9, 0x5C};
     std::vector<std::string> const steppings = {"0", "7", "9", "12"};
-    TestMI mi;
-    CpuRun const run(mi, oneCpuPerValue(firstBytes, [](Cpu& c, uint8_t first) {
-                         c.id = 0xBFEBFBFF00090600ull | first;
-                     }));
+    CpuRun const run(oneCpuPerValue(
+        firstBytes, [](Cpu& c, uint8_t first) { c.id = 0xBFEBFBFF00090600ull | first; }));
 
     ASSERT_EQ(4u, run.cpus.size());
     for (size_t i = 0; i < run.cpus.size(); ++i) {
@@ -422,30 +378,18 @@ TEST(ProcessorNodes, SteppingIsTheLowNibbleOfTheFirstIdByteAsDecimalText) {
 
 TEST(ProcessorNodes, UpgradeOtherAndUnknownGiveZeroThreeGivesOneAbove22GiveZero) {
     std::vector<uint8_t> const upgrades = {1, 2, 3, 22, 23, 0x2B};
-    std::vector<long long> const values = {0, 0, 1, 20, 0, 0};
-    TestMI mi;
     CpuRun const run(
-        mi, oneCpuPerValue(upgrades, [](Cpu& c, uint8_t upgrade) { c.upgrade = upgrade; }));
+        oneCpuPerValue(upgrades, [](Cpu& c, uint8_t upgrade) { c.upgrade = upgrade; }));
 
-    ASSERT_EQ(upgrades.size(), run.cpus.size());
-    for (size_t i = 0; i < run.cpus.size(); ++i) {
-        SCOPED_TRACE("upgrade " + std::to_string(upgrades[i]));
-        EXPECT_TRUE(hasEnum(run.cpus[i], 304, 1, values[i]));
-    }
+    expectEnumPerNode(run.cpus, upgrades, "upgrade", 304, {0, 0, 1, 20, 0, 0});
 }
 
 TEST(ProcessorNodes, CharacteristicsBit2GivesSixtyFourElseThirtyTwo) {
     std::vector<uint16_t> const words = {0x0004, 0x0006, 0x00FB, 0x0000, 0xFFFF};
-    std::vector<unsigned int> const widths = {64, 64, 32, 32, 64};
-    TestMI mi;
     CpuRun const run(
-        mi, oneCpuPerValue(words, [](Cpu& c, uint16_t word) { c.characteristics = word; }));
+        oneCpuPerValue(words, [](Cpu& c, uint16_t word) { c.characteristics = word; }));
 
-    ASSERT_EQ(words.size(), run.cpus.size());
-    for (size_t i = 0; i < run.cpus.size(); ++i) {
-        SCOPED_TRACE("characteristics " + std::to_string(words[i]));
-        EXPECT_TRUE(hasUnsigned(run.cpus[i], 15, widths[i]));
-    }
+    expectUnsignedPerNode(run.cpus, words, "characteristics", 15, {64, 64, 32, 32, 64});
 }
 
 // A structure that ends one byte into the Processor Characteristics word:
@@ -455,13 +399,9 @@ TEST(ProcessorNodes, CharacteristicsBit2GivesSixtyFourElseThirtyTwo) {
 TEST(ProcessorNodes, StructureEndingInsideCharacteristicsKeepsPropertiesSetSoFar) {
     smbiostest::LogCapture log;
     Cpu c;
-    c.length = 0x27;
+    c.cores(2, 2, 2).length = 0x27;
     c.l1 = 0x0700;
-    c.coreCount = 2;
-    c.coreEnabled = 2;
-    c.threadCount = 2;
-    TestMI mi;
-    CpuRun const run(mi, tableOf({cache(0x0700, "L1-Cache", 1), cpu(c)}));
+    CpuRun const run(tableOf({cache(0x0700, "L1-Cache", 1), cpu(c)}));
     ASSERT_EQ(0x27, run.parsed.getTables()[1].getLength());
 
     ASSERT_EQ(1u, run.cpus.size());
@@ -471,12 +411,10 @@ TEST(ProcessorNodes, StructureEndingInsideCharacteristicsKeepsPropertiesSetSoFar
     EXPECT_EQ((std::vector<unsigned int>{2, 19, 36, 38, 45, 50, 53, 55, 80, 89, 124, 125, 296, 298,
                                          304, 307}),
               propertyIds(node));
-    EXPECT_TRUE(hasString(node, 45, "PN-X9"));
-    EXPECT_TRUE(lacksProperty(node, 15));
-    EXPECT_TRUE(lacksProperty(node, 190));
+    expectProperties(node, {stringProp(45, "PN-X9"), noProp(15), noProp(190)});
     // The cache was made before the failure; no cores after it.
-    EXPECT_EQ(1u, nodesOfType(mi, 31).size());
-    EXPECT_TRUE(nodesOfType(mi, 42).empty());
+    EXPECT_EQ(1u, nodesOfType(run.mi, 31).size());
+    EXPECT_TRUE(nodesOfType(run.mi, 42).empty());
     std::string const failure = frametest::firstLogged("Exception=");
     // The position is the one in the processor structures' list.
     EXPECT_NE(std::string::npos, failure.find("Table 4 index =0")) << log.dump();
@@ -487,14 +425,9 @@ TEST(ProcessorNodes, StructureEndingInsideCharacteristicsKeepsPropertiesSetSoFar
 
 TEST(ProcessorNodes, FailingProcessorDoesNotStopTheNextOne) {
     smbiostest::LogCapture log;
-    Cpu broken;
-    broken.handle = 0x0400;
+    Cpu broken;  // handle 0x0400
     broken.length = 0x27;
-    Cpu whole;
-    whole.handle = 0x0401;
-    whole.socket = "CPU1";
-    TestMI mi;
-    CpuRun const run(mi, tableOf({cpu(broken), cpu(whole)}));
+    CpuRun const run(tableOf({cpu(broken), secondCpu()}));
 
     ASSERT_EQ(2u, run.cpus.size());
     EXPECT_TRUE(lacksProperty(run.cpus[0], 15));
@@ -509,19 +442,15 @@ TEST(ProcessorNodes, FailingProcessorDoesNotStopTheNextOne) {
 TEST(ProcessorNodes, ThreeCacheCallsPerProcessorAndHandleFFFFMatchesNothing) {
     smbiostest::LogCapture log;
     Cpu c;
-    c.l1 = 0x0700;
-    c.l2 = 0xFFFF;
-    c.l3 = 0xFFFF;
-    TestMI mi;
-    CpuRun const run(mi,
-                     tableOf({cache(0x0700, "L1-Cache", 1), cache(0x0701, "L2-Cache", 2), cpu(c)}));
+    c.caches(0x0700, 0xFFFF, 0xFFFF);
+    CpuRun const run(tableOf({cache(0x0700, "L1-Cache", 1), cache(0x0701, "L2-Cache", 2), cpu(c)}));
 
     EXPECT_EQ(3u, loggedCount("makeCacheNodes entry handle=")) << log.dump();
     EXPECT_EQ(1u, loggedCount("makeCacheNodes entry handle=1792")) << log.dump();
     EXPECT_EQ(2u, loggedCount("makeCacheNodes entry handle=65535")) << log.dump();
     EXPECT_EQ(1u, loggedCount(" L2 Cache handle = 65535")) << log.dump();
     EXPECT_EQ(1u, loggedCount(" L3 Cache handle = 65535")) << log.dump();
-    std::vector<IC::Node*> const caches = nodesOfType(mi, 31);
+    std::vector<IC::Node*> const caches = nodesOfType(run.mi, 31);
     ASSERT_EQ(1u, caches.size());
     EXPECT_TRUE(hasString(caches[0], 53, "L1-Cache"));
     EXPECT_EQ(3u, caches[0]->getLinkedId());
@@ -536,53 +465,44 @@ TEST(ProcessorNodes, EachProcessorGetsItsOwnCachesAndCoresWithIdsInCreationOrder
     for (uint16_t i = 0; i < 2; ++i) {
         Cpu c;
         c.handle = static_cast<uint16_t>(0x0400 + i);
-        c.l1 = static_cast<uint16_t>(0x0700 + i);
-        c.l3 = 0x0702;
-        c.coreCount = 1;
-        c.coreEnabled = 1;
-        c.threadCount = 2;
+        c.caches(static_cast<uint16_t>(0x0700 + i), 0xFFFF, 0x0702).cores(1, 1, 2);
         table.add(cpu(c));
     }
-    TestMI mi;
-    CpuRun const run(mi, table);
+    CpuRun const run(table);
 
     // Processor 3: L1 4, L3 5, core 6. Processor 7: L1 8, L3 9, core 10.
-    ASSERT_EQ(9u, mi.nodeList.size());
+    ASSERT_EQ(9u, run.mi.nodeList.size());
     std::vector<unsigned int> const types = {41, 4, 31, 31, 42, 4, 31, 31, 42};
     std::vector<unsigned int> const links = {1, 2, 3, 3, 3, 2, 7, 7, 7};
-    for (size_t i = 0; i < mi.nodeList.size(); ++i) {
+    for (size_t i = 0; i < run.mi.nodeList.size(); ++i) {
         SCOPED_TRACE("node " + std::to_string(i));
-        EXPECT_EQ(i + 2, mi.nodeList[i]->getNodeId());
-        EXPECT_TRUE(hasNodeType(mi.nodeList[i], types[i]));
-        EXPECT_EQ(links[i], mi.nodeList[i]->getLinkedId());
+        EXPECT_EQ(i + 2, run.mi.nodeList[i]->getNodeId());
+        EXPECT_TRUE(hasNodeType(run.mi.nodeList[i], types[i]));
+        EXPECT_EQ(links[i], run.mi.nodeList[i]->getLinkedId());
     }
-    EXPECT_TRUE(hasString(mi.nodeList[2], 53, "P0-L1"));
-    EXPECT_TRUE(hasString(mi.nodeList[3], 53, "Shared-L3"));
-    EXPECT_TRUE(hasString(mi.nodeList[6], 53, "P1-L1"));
-    EXPECT_TRUE(hasString(mi.nodeList[7], 53, "Shared-L3"));
+    EXPECT_TRUE(hasString(run.mi.nodeList[2], 53, "P0-L1"));
+    EXPECT_TRUE(hasString(run.mi.nodeList[3], 53, "Shared-L3"));
+    EXPECT_TRUE(hasString(run.mi.nodeList[6], 53, "P1-L1"));
+    EXPECT_TRUE(hasString(run.mi.nodeList[7], 53, "Shared-L3"));
     // A cache's index is its position among the cache structures.
-    EXPECT_EQ(0u, mi.nodeList[2]->getIndex());
-    EXPECT_EQ(1u, mi.nodeList[6]->getIndex());
-    EXPECT_EQ(2u, mi.nodeList[3]->getIndex());
-    EXPECT_EQ(2u, mi.nodeList[7]->getIndex());
+    EXPECT_EQ(0u, run.mi.nodeList[2]->getIndex());
+    EXPECT_EQ(1u, run.mi.nodeList[6]->getIndex());
+    EXPECT_EQ(2u, run.mi.nodeList[3]->getIndex());
+    EXPECT_EQ(2u, run.mi.nodeList[7]->getIndex());
     // Core indexes count per processor.
-    EXPECT_EQ(0u, mi.nodeList[4]->getIndex());
-    EXPECT_EQ(0u, mi.nodeList[8]->getIndex());
+    EXPECT_EQ(0u, run.mi.nodeList[4]->getIndex());
+    EXPECT_EQ(0u, run.mi.nodeList[8]->getIndex());
 }
 
 TEST(ProcessorNodes, FourCoresTwoEnabledEightThreads) {
     Cpu c;
-    c.coreCount = 4;
-    c.coreEnabled = 2;
-    c.threadCount = 8;
-    TestMI mi;
-    CpuRun const run(mi, tableOf({cpu(c)}));
+    c.cores(4, 2, 8);
+    CpuRun const run(c);
 
     ASSERT_EQ(1u, run.cpus.size());
-    EXPECT_TRUE(hasUnsigned(run.cpus[0], 190, 4));
-    EXPECT_TRUE(hasUnsigned(run.cpus[0], 189, 2));
-    EXPECT_TRUE(hasUnsigned(run.cpus[0], 87, 8));
-    std::vector<IC::Node*> const cores = childrenOf(mi, run.cpus[0]->getNodeId());
+    expectProperties(run.cpus[0],
+                     {unsignedProp(190, 4), unsignedProp(189, 2), unsignedProp(87, 8)});
+    std::vector<IC::Node*> const cores = childrenOf(run.mi, run.cpus[0]->getNodeId());
     ASSERT_EQ(4u, cores.size());
     for (unsigned int i = 0; i < 4; ++i) {
         SCOPED_TRACE("core " + std::to_string(i));
@@ -592,24 +512,20 @@ TEST(ProcessorNodes, FourCoresTwoEnabledEightThreads) {
         EXPECT_EQ(i < 2 ? 1u : 16u, cores[i]->getStatus());
         EXPECT_EQ("CPU Core Information", cores[i]->getDescription());
         // Each core carries the processor's whole thread count.
-        EXPECT_TRUE(hasUnsigned(cores[i], 87, 8));
-        EXPECT_TRUE(hasUnsignedList(cores[i], 125, {1, 16}));
-        EXPECT_TRUE(hasEnum(cores[i], 128, 1, 0));
+        expectProperties(
+            cores[i], {unsignedProp(87, 8), unsignedListProp(125, {1, 16}), enumProp(128, 1, 0)});
     }
 }
 
 TEST(ProcessorNodes, ThreadCountZeroLeavesCoresWithoutThreadProperty) {
     smbiostest::LogCapture log;
     Cpu c;
-    c.coreCount = 2;
-    c.coreEnabled = 1;
-    c.threadCount = 0;
-    TestMI mi;
-    CpuRun const run(mi, tableOf({cpu(c)}));
+    c.cores(2, 1, 0);
+    CpuRun const run(c);
 
     ASSERT_EQ(1u, run.cpus.size());
     EXPECT_TRUE(hasUnsigned(run.cpus[0], 87, 0));
-    std::vector<IC::Node*> const cores = nodesOfType(mi, 42);
+    std::vector<IC::Node*> const cores = nodesOfType(run.mi, 42);
     ASSERT_EQ(2u, cores.size());
     for (IC::Node const* core : cores) {
         EXPECT_EQ((std::vector<unsigned int>{125, 128}), propertyIds(core));
@@ -623,12 +539,8 @@ TEST(ProcessorNodes, ThreadCountZeroLeavesCoresWithoutThreadProperty) {
 TEST(ProcessorNodes, Level20StructureHasNoCoreDataAndLogsTheNoCoreSuffix) {
     smbiostest::LogCapture log;
     Cpu c;
-    c.length = 0x1A;
-    c.coreCount = 4;
-    c.coreEnabled = 4;
-    c.threadCount = 8;
-    TestMI mi;
-    CpuRun const run(mi, tableOf({cpu(c)}));
+    c.cores(4, 4, 8).length = 0x1A;
+    CpuRun const run(c);
     ASSERT_EQ(0x1A, run.parsed.getTables()[0].getLength());
 
     ASSERT_EQ(1u, run.cpus.size());
@@ -638,13 +550,10 @@ TEST(ProcessorNodes, Level20StructureHasNoCoreDataAndLogsTheNoCoreSuffix) {
     EXPECT_EQ((std::vector<unsigned int>{15, 19, 36, 38, 53, 55, 80, 87, 89, 124, 125, 189, 190,
                                          296, 298, 304, 307}),
               propertyIds(node));
-    EXPECT_TRUE(hasUnsigned(node, 15, 32));
-    EXPECT_TRUE(hasUnsigned(node, 190, 0));
-    EXPECT_TRUE(hasUnsigned(node, 189, 0));
-    EXPECT_TRUE(hasUnsigned(node, 87, 0));
-    EXPECT_TRUE(hasEnum(node, 304, 1, 4));
-    EXPECT_TRUE(nodesOfType(mi, 42).empty());
-    EXPECT_EQ(2u, mi.nodeList.size());
+    expectProperties(node, {unsignedProp(15, 32), unsignedProp(190, 0), unsignedProp(189, 0),
+                            unsignedProp(87, 0), enumProp(304, 1, 4)});
+    EXPECT_TRUE(nodesOfType(run.mi, 42).empty());
+    EXPECT_EQ(2u, run.mi.nodeList.size());
     EXPECT_EQ(" Cores =0 enabled=0 thread count=0 - no core data in smbios tables",
               frametest::firstLogged(" Cores ="))
         << log.dump();
@@ -655,13 +564,10 @@ TEST(ProcessorNodes, Level20StructureHasNoCoreDataAndLogsTheNoCoreSuffix) {
 TEST(ProcessorNodes, CoreCountZeroMakesNoCoreNodes) {
     smbiostest::LogCapture log;
     Cpu c;
-    c.coreCount = 0;
-    c.coreEnabled = 0;
-    c.threadCount = 4;
-    TestMI mi;
-    CpuRun const run(mi, tableOf({cpu(c)}));
+    c.cores(0, 0, 4);
+    CpuRun const run(c);
 
-    EXPECT_TRUE(nodesOfType(mi, 42).empty());
+    EXPECT_TRUE(nodesOfType(run.mi, 42).empty());
     ASSERT_EQ(1u, run.cpus.size());
     EXPECT_TRUE(hasUnsigned(run.cpus[0], 190, 0));
     EXPECT_TRUE(hasUnsigned(run.cpus[0], 87, 4));
@@ -678,8 +584,7 @@ TEST(ProcessorNodes, EmptyStringsAreSetAsEmptyText) {
     c.serial = "";
     c.assetTag = "";
     c.partNumber = "";
-    TestMI mi;
-    CpuRun const run(mi, tableOf({cpu(c)}));
+    CpuRun const run(c);
 
     ASSERT_EQ(1u, run.cpus.size());
     for (unsigned int id : {53u, 36u, 307u, 50u, 2u, 45u}) {
@@ -690,12 +595,9 @@ TEST(ProcessorNodes, EmptyStringsAreSetAsEmptyText) {
 
 TEST(ProcessorNodes, NoProcessorStructuresLogCountZeroAndMakeNothing) {
     smbiostest::LogCapture log;
-    TestMI mi;
-    CpuRun const run(mi, tableOf({cache(0x0700, "L1-Cache", 1)}));
+    CpuRun const run(tableOf({cache(0x0700, "L1-Cache", 1)}));
 
-    EXPECT_EQ(1u, mi.nodeList.size());
-    EXPECT_EQ(
-        (std::vector<std::string>{"makeCpuNodes entry", "Table 4 count =0", "makeCpuNodes exit"}),
-        loggedBy(CPU_LOGGER))
-        << log.dump();
+    EXPECT_EQ(1u, run.mi.nodeList.size());
+    EXPECT_TRUE(
+        loggedExactly(CPU_LOGGER, {"makeCpuNodes entry", "Table 4 count =0", "makeCpuNodes exit"}));
 }

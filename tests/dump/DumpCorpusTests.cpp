@@ -5,6 +5,7 @@
 #include <gtest/gtest.h>
 
 #include <fstream>
+#include <functional>
 #include <regex>
 #include <string>
 #include <utility>
@@ -20,16 +21,6 @@ using hosttest::describe;
 using hosttest::RunResult;
 
 namespace {
-
-#define REQUIRE_CORPUS()                                                                    \
-    do {                                                                                    \
-        if (smbiostest::corpusDir().empty()) {                                              \
-            GTEST_SKIP() << "SMBIOS_CORPUS_DIR is unset or not a folder; no real dumps to " \
-                            "capture";                                                      \
-        }                                                                                   \
-        ASSERT_FALSE(smbiostest::corpusNames().empty())                                     \
-            << "no .bin dumps in " << smbiostest::corpusDir();                              \
-    } while (0)
 
 struct Decoding {
     unsigned major = 0;
@@ -68,6 +59,24 @@ std::string binPath(std::string const& name) {
     return smbiostest::corpusDir() + "/" + name + ".bin";
 }
 
+// smbios-dump --from-bin on the corpus dump `name`, writing `out`.
+RunResult dumpFromBin(std::string const& name, std::string const& out) {
+    return dumptest::runDump({"--from-bin", binPath(name), "-o", out});
+}
+
+// Runs `check` on every corpus dump, under its name, with a folder for what
+// it writes. Skips the test without a corpus; fails it when the corpus holds
+// no dump.
+void forEachDump(
+    std::function<void(std::string const& name, smbiostest::TempDir const& dir)> const& check) {
+    SMBIOS_REQUIRE_CORPUS("to capture");
+    smbiostest::TempDir dir;
+    for (std::string const& name : smbiostest::corpusNames()) {
+        SCOPED_TRACE(name);
+        check(name, dir);
+    }
+}
+
 // Whether the built host offers --from-bin (another change adds it).
 bool hostReadsDumpBin() {
     RunResult const help = hosttest::runHost({"--help"});
@@ -77,12 +86,9 @@ bool hostReadsDumpBin() {
 }  // namespace
 
 TEST(DumpCorpus, FromBinReadsBackThroughPluginImportToImageTable) {
-    REQUIRE_CORPUS();
-    smbiostest::TempDir dir;
-    for (std::string const& name : smbiostest::corpusNames()) {
-        SCOPED_TRACE(name);
+    forEachDump([](std::string const& name, smbiostest::TempDir const& dir) {
         std::string const out = dir.file(name + ".smbios.txt");
-        RunResult const run = dumptest::runDump({"--from-bin", binPath(name), "-o", out});
+        RunResult const run = dumpFromBin(name, out);
         ASSERT_EQ(run.exitStatus, 0) << describe(run);
 
         smbiosdump::DumpImage image;
@@ -119,14 +125,11 @@ TEST(DumpCorpus, FromBinReadsBackThroughPluginImportToImageTable) {
                       std::string::npos)
                 << run.err;
         }
-    }
+    });
 }
 
 TEST(DumpCorpus, FromTableOfImageReadsBackToSameTable) {
-    REQUIRE_CORPUS();
-    smbiostest::TempDir dir;
-    for (std::string const& name : smbiostest::corpusNames()) {
-        SCOPED_TRACE(name);
+    forEachDump([](std::string const& name, smbiostest::TempDir const& dir) {
         smbiosdump::DumpImage image;
         std::string error;
         ASSERT_TRUE(smbiosdump::readDumpBin(smbiostest::fileBytes(binPath(name)), image, error))
@@ -144,20 +147,18 @@ TEST(DumpCorpus, FromTableOfImageReadsBackToSameTable) {
         EXPECT_EQ(back.header[6], image.major);
         EXPECT_EQ(back.header[7], image.minor);
         EXPECT_EQ(dumptest::word(back.header, 0x1C), smbiosdump::tableStats(image.table).count);
-    }
+    });
 }
 
 TEST(DumpCorpus, InventoryOfWrittenFileEqualsInventoryFromBin) {
-    REQUIRE_CORPUS();
+    SMBIOS_REQUIRE_CORPUS("to capture");
     if (!hostReadsDumpBin()) {
         GTEST_SKIP() << "smbios-inventory has no --from-bin option in this build; nothing to "
                         "compare the written files with";
     }
-    smbiostest::TempDir dir;
-    for (std::string const& name : smbiostest::corpusNames()) {
-        SCOPED_TRACE(name);
+    forEachDump([](std::string const& name, smbiostest::TempDir const& dir) {
         std::string const out = dir.file(name + ".smbios.txt");
-        RunResult const dumped = dumptest::runDump({"--from-bin", binPath(name), "-o", out});
+        RunResult const dumped = dumpFromBin(name, out);
         ASSERT_EQ(dumped.exitStatus, 0) << describe(dumped);
         RunResult const fromFile = hosttest::runHost({"--dump", out, "--format", "json"});
         RunResult const fromBin =
@@ -172,5 +173,5 @@ TEST(DumpCorpus, InventoryOfWrittenFileEqualsInventoryFromBin) {
         EXPECT_GT(fileInventory.size(), 1000u) << describe(fromFile);
         EXPECT_EQ(maskedFile, maskedBin);
         EXPECT_EQ(fileInventory, binInventory);
-    }
+    });
 }

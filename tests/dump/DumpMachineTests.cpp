@@ -16,10 +16,8 @@
 #include "TestSupport.h"
 
 using dumptest::Bytes;
-using dumptest::runDump;
 using hosttest::describe;
 using hosttest::RunResult;
-using smbiostest::TempDir;
 
 namespace {
 
@@ -52,10 +50,12 @@ public:
     }
 
     // The folder for outputs; it holds the region files too.
-    TempDir const& dir() const { return dir_; }
+    smbiostest::TempDir const& dir() const { return dir_; }
+    // The dump file the tests write.
+    std::string output() const { return dir_.file("smbios.txt"); }
 
 private:
-    TempDir dir_;
+    smbiostest::TempDir dir_;
     std::string regions_;
 };
 
@@ -79,21 +79,27 @@ RunResult dumpMachine(FakeMachine const& machine, std::string const& library,
     for (auto const& variable : env.set) {
         merged.set[variable.first] = variable.second;
     }
-    return runDump({"--from-machine", "--pmem", library, "-o", out}, merged);
+    return dumptest::runDump({"--from-machine", "--pmem", library, "-o", out}, merged);
+}
+
+// The dump ran and wrote `out`, which the plug-in reads back as `header`
+// and `table`.
+void expectWritten(RunResult const& run, std::string const& out, Bytes const& header,
+                   Bytes const& table) {
+    ASSERT_EQ(run.exitStatus, 0) << describe(run);
+    dumptest::ReadBack const back = dumptest::readBackThroughPlugin(out);
+    ASSERT_TRUE(back.ok()) << back.imported << " " << back.head << " " << back.tables;
+    EXPECT_EQ(back.header, header);
+    EXPECT_EQ(back.table, table);
 }
 
 TEST(DumpMachine, SmEntryPointAndTableOfMachine) {
     FakeMachine machine;
     Bytes const ep = mapSmMachine(machine);
-    std::string const out = machine.dir().file("smbios.txt");
-    RunResult const run = dumpMachine(machine, dumptest::fakePMem("full"), out);
-    ASSERT_EQ(run.exitStatus, 0) << describe(run);
-    EXPECT_EQ(run.err, "smbios-dump: wrote " + out + ": SMBIOS 2.7, 3 structures, " +
+    RunResult const run = dumpMachine(machine, dumptest::fakePMem("full"), machine.output());
+    expectWritten(run, machine.output(), ep, dumptest::sampleTable());
+    EXPECT_EQ(run.err, "smbios-dump: wrote " + machine.output() + ": SMBIOS 2.7, 3 structures, " +
                            std::to_string(dumptest::sampleTable().size()) + " bytes\n");
-    dumptest::ReadBack const back = dumptest::readBackThroughPlugin(out);
-    ASSERT_TRUE(back.ok()) << back.imported << " " << back.head << " " << back.tables;
-    EXPECT_EQ(back.header, ep);
-    EXPECT_EQ(back.table, dumptest::sampleTable());
 }
 
 TEST(DumpMachine, DmiOnlyMachineGivesLegacyEntryPoint) {
@@ -105,14 +111,9 @@ TEST(DumpMachine, DmiOnlyMachineGivesLegacyEntryPoint) {
     std::copy(dmi.begin(), dmi.end(), low.begin() + 0x9A0);
     machine.map(0x9000, low);  // the anchor at 0x99A0, far below the BIOS area
     machine.map(0xE8000, table);
-    std::string const out = machine.dir().file("smbios.txt");
-    RunResult const run = dumpMachine(machine, dumptest::fakePMem("full"), out);
-    ASSERT_EQ(run.exitStatus, 0) << describe(run);
+    RunResult const run = dumpMachine(machine, dumptest::fakePMem("full"), machine.output());
+    expectWritten(run, machine.output(), dmi, table);
     EXPECT_NE(run.err.find("SMBIOS 2.4, 3 structures"), std::string::npos) << describe(run);
-    dumptest::ReadBack const back = dumptest::readBackThroughPlugin(out);
-    ASSERT_TRUE(back.ok());
-    EXPECT_EQ(back.header, dmi);
-    EXPECT_EQ(back.table, table);
 }
 
 TEST(DumpMachine, SmAnchorBelowBiosAreaIsFoundByItsDmiPart) {
@@ -124,13 +125,8 @@ TEST(DumpMachine, SmAnchorBelowBiosAreaIsFoundByItsDmiPart) {
                                                   kTableAddress, 3, 40);
     machine.map(0xE0000, ep);
     machine.map(kTableAddress, table);
-    std::string const out = machine.dir().file("smbios.txt");
-    RunResult const run = dumpMachine(machine, dumptest::fakePMem("full"), out);
-    ASSERT_EQ(run.exitStatus, 0) << describe(run);
-    dumptest::ReadBack const back = dumptest::readBackThroughPlugin(out);
-    ASSERT_TRUE(back.ok());
-    EXPECT_EQ(back.header, Bytes(ep.begin() + 0x10, ep.end()));
-    EXPECT_EQ(back.table, table);
+    RunResult const run = dumpMachine(machine, dumptest::fakePMem("full"), machine.output());
+    expectWritten(run, machine.output(), Bytes(ep.begin() + 0x10, ep.end()), table);
     EXPECT_NE(run.err.find("SMBIOS 2.6"), std::string::npos) << describe(run);
 }
 
@@ -140,40 +136,33 @@ void expectMachineRefused(RunResult const& run, std::string const& says,
     EXPECT_EQ(run.err.rfind("smbios-dump: cannot read this machine's SMBIOS table: ", 0), 0u)
         << describe(run);
     EXPECT_NE(run.err.find(says), std::string::npos) << describe(run);
-    EXPECT_FALSE(dumptest::exists(machine.dir().file("smbios.txt")));
+    EXPECT_FALSE(dumptest::exists(machine.output()));
     for (std::string const& name : dumptest::folderEntries(machine.dir().path())) {
         EXPECT_EQ(name.rfind("region-", 0), 0u) << "left behind: " << name;
     }
 }
 
-TEST(DumpMachine, LibraryThatDoesNotInitializeFails) {
+// The stand-in library, told by `variable`=0 to fail, fails the dump of a
+// machine with a table with a message that says `says`.
+void expectLibraryFailure(std::string const& variable, std::string const& says) {
     FakeMachine machine;
     mapSmMachine(machine);
     hosttest::Environment env;
-    env.set["FAKE_PMEM_INITIALIZED"] = "0";
-    expectMachineRefused(
-        dumpMachine(machine, dumptest::fakePMem("full"), machine.dir().file("smbios.txt"), env),
-        "PMemIsInitialized returned 0", machine);
+    env.set[variable] = "0";
+    expectMachineRefused(dumpMachine(machine, dumptest::fakePMem("full"), machine.output(), env),
+                         says, machine);
+}
+
+TEST(DumpMachine, LibraryThatDoesNotInitializeFails) {
+    expectLibraryFailure("FAKE_PMEM_INITIALIZED", "PMemIsInitialized returned 0");
 }
 
 TEST(DumpMachine, FailingOpenFails) {
-    FakeMachine machine;
-    mapSmMachine(machine);
-    hosttest::Environment env;
-    env.set["FAKE_PMEM_OPEN"] = "0";
-    expectMachineRefused(
-        dumpMachine(machine, dumptest::fakePMem("full"), machine.dir().file("smbios.txt"), env),
-        "PMemOpen returned 0", machine);
+    expectLibraryFailure("FAKE_PMEM_OPEN", "PMemOpen returned 0");
 }
 
 TEST(DumpMachine, FailingCloseFails) {
-    FakeMachine machine;
-    mapSmMachine(machine);
-    hosttest::Environment env;
-    env.set["FAKE_PMEM_CLOSE"] = "0";
-    expectMachineRefused(
-        dumpMachine(machine, dumptest::fakePMem("full"), machine.dir().file("smbios.txt"), env),
-        "PMemClose returned 0", machine);
+    expectLibraryFailure("FAKE_PMEM_CLOSE", "PMemClose returned 0");
 }
 
 TEST(DumpMachine, UnreadableTableFails) {
@@ -182,33 +171,30 @@ TEST(DumpMachine, UnreadableTableFails) {
     Bytes const ep = smbiosdump::makeSmEntryPoint(2, 7, static_cast<uint16_t>(table.size()),
                                                   kTableAddress, 3, 40);
     machine.map(kSmAnchor, ep);  // no table where it points
-    expectMachineRefused(
-        dumpMachine(machine, dumptest::fakePMem("full"), machine.dir().file("smbios.txt")),
-        "PMemRead of the structure table", machine);
+    expectMachineRefused(dumpMachine(machine, dumptest::fakePMem("full"), machine.output()),
+                         "PMemRead of the structure table", machine);
 }
 
 TEST(DumpMachine, MachineWithoutEntryPointFails) {
     FakeMachine machine;
     machine.map(0, Bytes(0x100000, 0));
-    expectMachineRefused(
-        dumpMachine(machine, dumptest::fakePMem("full"), machine.dir().file("smbios.txt")),
-        "no _SM_ entry point", machine);
+    expectMachineRefused(dumpMachine(machine, dumptest::fakePMem("full"), machine.output()),
+                         "no _SM_ entry point", machine);
 }
 
 TEST(DumpMachine, MissingLibraryFails) {
     FakeMachine machine;
     mapSmMachine(machine);
     std::string const missing = machine.dir().file("lib/libpmem.so");
-    RunResult const run = dumpMachine(machine, missing, machine.dir().file("smbios.txt"));
+    RunResult const run = dumpMachine(machine, missing, machine.output());
     expectMachineRefused(run, "cannot load the physical-memory library " + missing, machine);
 }
 
 TEST(DumpMachine, LibraryWithoutSearchFails) {
     FakeMachine machine;
     mapSmMachine(machine);
-    expectMachineRefused(
-        dumpMachine(machine, dumptest::fakePMem("nosearch"), machine.dir().file("smbios.txt")),
-        "does not export PMemSearch", machine);
+    expectMachineRefused(dumpMachine(machine, dumptest::fakePMem("nosearch"), machine.output()),
+                         "does not export PMemSearch", machine);
 }
 
 // The default library: beside the program, else in ../lib from it. A copy
@@ -223,13 +209,9 @@ void expectDefaultLibraryFound(std::string const& programFolder, std::string con
     std::string const program = root + "/" + programFolder + "/smbios-dump";
     fs::copy_file(dumptest::toolPath(), program);
     fs::copy_file(dumptest::fakePMem("full"), root + "/" + libFolder + "/libpmem.so");
-    std::string const out = machine.dir().file("smbios.txt");
-    RunResult const run =
-        hosttest::runProgram(program, {"--from-machine", "-o", out}, machine.environment());
-    ASSERT_EQ(run.exitStatus, 0) << describe(run);
-    dumptest::ReadBack const back = dumptest::readBackThroughPlugin(out);
-    ASSERT_TRUE(back.ok());
-    EXPECT_EQ(back.header, ep);
+    RunResult const run = hosttest::runProgram(program, {"--from-machine", "-o", machine.output()},
+                                               machine.environment());
+    expectWritten(run, machine.output(), ep, dumptest::sampleTable());
 
     // Without the library the default is named.
     fs::remove(root + "/" + libFolder + "/libpmem.so");

@@ -23,6 +23,12 @@ std::vector<std::string> names(std::initializer_list<char const*> list) {
     return std::vector<std::string>(list.begin(), list.end());
 }
 
+// The folder holds the dump file smbios.txt alone, with `text` in it.
+void expectOnlyDumpFile(TempDir const& dir, std::string const& text) {
+    EXPECT_EQ(dumptest::readText(dir.file("smbios.txt")), text);
+    EXPECT_EQ(dumptest::folderEntries(dir.path()), names({"smbios.txt"}));
+}
+
 TEST(DumpDataDir, OptionThenEnvironmentThenDefault) {
     {
         ScopedEnv env("KESTREL_DATA_DIR", "/srv/agent-data/");
@@ -79,8 +85,7 @@ TEST(DumpWrite, WritesNewFileAndNothingElse) {
     EXPECT_EQ(smbiosdump::writeFileAtomically(dir.file("smbios.txt"), "content\n", false, error),
               WriteResult::WRITTEN)
         << error;
-    EXPECT_EQ(dumptest::readText(dir.file("smbios.txt")), "content\n");
-    EXPECT_EQ(dumptest::folderEntries(dir.path()), names({"smbios.txt"}));
+    expectOnlyDumpFile(dir, "content\n");
 }
 
 TEST(DumpWrite, NewFileGetsModeOfUmask) {
@@ -102,8 +107,7 @@ TEST(DumpWrite, LeavesExistingFileAloneWithoutReplace) {
     std::string error;
     EXPECT_EQ(smbiosdump::writeFileAtomically(dir.file("smbios.txt"), "new", false, error),
               WriteResult::EXISTS);
-    EXPECT_EQ(dumptest::readText(dir.file("smbios.txt")), "old");
-    EXPECT_EQ(dumptest::folderEntries(dir.path()), names({"smbios.txt"}));
+    expectOnlyDumpFile(dir, "old");
 }
 
 TEST(DumpWrite, ReplacesExistingFileWhenAsked) {
@@ -113,8 +117,7 @@ TEST(DumpWrite, ReplacesExistingFileWhenAsked) {
     EXPECT_EQ(smbiosdump::writeFileAtomically(dir.file("smbios.txt"), "new", true, error),
               WriteResult::WRITTEN)
         << error;
-    EXPECT_EQ(dumptest::readText(dir.file("smbios.txt")), "new");
-    EXPECT_EQ(dumptest::folderEntries(dir.path()), names({"smbios.txt"}));
+    expectOnlyDumpFile(dir, "new");
 }
 
 TEST(DumpWrite, FolderInPlaceIsNeverReplaced) {

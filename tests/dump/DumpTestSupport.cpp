@@ -1,14 +1,11 @@
 #include "DumpTestSupport.h"
 
 #include <dirent.h>
-#include <fcntl.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
 #include <algorithm>
-#include <chrono>
 #include <fstream>
-#include <future>
 #include <iterator>
 #include <nlohmann/json.hpp>
 
@@ -21,24 +18,6 @@ std::string toolPath() { return hosttest::outDir() + "/smbios-dump"; }
 hosttest::RunResult runDump(std::vector<std::string> const& args,
                             hosttest::Environment const& environment) {
     return hosttest::runProgram(toolPath(), args, environment);
-}
-
-bool waitedOnFifo(std::string const& fifo, std::function<void()> const& work) {
-    std::future<void> working = std::async(std::launch::async, work);
-    bool waited = false;
-    std::chrono::milliseconds patience(10000);
-    while (working.wait_for(patience) != std::future_status::ready) {
-        waited = true;
-        patience = std::chrono::milliseconds(100);
-        for (int side : {O_RDONLY, O_WRONLY}) {
-            int const fd = open(fifo.c_str(), side | O_NONBLOCK | O_CLOEXEC);
-            if (fd >= 0) {
-                close(fd);
-            }
-        }
-    }
-    working.get();
-    return waited;
 }
 
 bool makeFifo(std::string const& path) { return mkfifo(path.c_str(), 0600) == 0; }
@@ -82,23 +61,6 @@ std::string inventoryWithoutClock(std::string const& json, unsigned& masked) {
         masked += static_cast<unsigned>(node["properties"].erase("127"));
     }
     return document.dump(2);
-}
-
-uint8_t byteSum(Bytes const& bytes, size_t begin, size_t end) {
-    uint8_t sum = 0;
-    for (size_t i = begin; i < end && i < bytes.size(); ++i) {
-        sum = static_cast<uint8_t>(sum + bytes[i]);
-    }
-    return sum;
-}
-
-uint16_t word(Bytes const& bytes, size_t offset) {
-    return static_cast<uint16_t>(bytes.at(offset) | (bytes.at(offset + 1) << 8));
-}
-
-uint32_t dword(Bytes const& bytes, size_t offset) {
-    return static_cast<uint32_t>(word(bytes, offset)) |
-           (static_cast<uint32_t>(word(bytes, offset + 2)) << 16);
 }
 
 Bytes sampleTable() {

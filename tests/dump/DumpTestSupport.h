@@ -24,12 +24,9 @@ std::string toolPath();
 hosttest::RunResult runDump(std::vector<std::string> const& args,
                             hosttest::Environment const& environment = hosttest::Environment());
 
-// Runs `work` on a thread of its own. Should it still run after 10 s, it is
-// taken to wait on the FIFO `fifo`: the FIFO is then opened from both sides
-// and closed again, every 100 ms until the work ends, which releases a
-// reader waiting for a writer and a writer waiting for a reader. Returns
-// whether that was needed, so that a test fails instead of hanging.
-bool waitedOnFifo(std::string const& fifo, std::function<void()> const& work);
+// Runs `work` on a thread of its own and releases it should it wait on a
+// FIFO (see smbiostest::waitedOnFifo).
+using smbiostest::waitedOnFifo;
 
 // Makes a FIFO; false when it cannot be made.
 bool makeFifo(std::string const& path);
@@ -63,11 +60,10 @@ std::string readText(std::string const& path);
 // `masked` counts the values removed. "" when the text is not JSON.
 std::string inventoryWithoutClock(std::string const& json, unsigned& masked);
 
-// The 8-bit sum of bytes[begin, end).
-uint8_t byteSum(Bytes const& bytes, size_t begin, size_t end);
-
-uint16_t word(Bytes const& bytes, size_t offset);
-uint32_t dword(Bytes const& bytes, size_t offset);
+// The 8-bit sum of bytes[begin, end); the little-endian word and double word.
+using smbiostest::byteSum;
+using smbiostest::dword;
+using smbiostest::word;
 
 // A small table of three structures (BIOS, system, end of table).
 Bytes sampleTable();

@@ -31,6 +31,31 @@ struct TableInput {
     TempDir dir;
 };
 
+// A command line smbios-dump refuses, and what it says.
+struct RefusedLine {
+    std::vector<std::string> args;
+    std::string says;
+};
+
+// The command line as a trace names it: smbios-dump 'ARG' 'ARG'...
+std::string commandText(std::vector<std::string> const& args) {
+    std::string text = "smbios-dump";
+    for (std::string const& arg : args) {
+        text += " '" + arg + "'";
+    }
+    return text;
+}
+
+// smbios-dump refuses the command line: exit status 2, nothing on standard
+// output, nothing written beside the input. The run, for what it said.
+RunResult expectRefusedLine(TableInput const& input, std::vector<std::string> const& args) {
+    RunResult const run = runDump(args);
+    EXPECT_EQ(run.exitStatus, 2) << describe(run);
+    EXPECT_TRUE(run.out.empty()) << describe(run);
+    EXPECT_EQ(dumptest::folderEntries(input.dir.path()), (std::vector<std::string>{"table.bin"}));
+    return run;
+}
+
 std::string wroteLine(std::string const& target) {
     return "smbios-dump: wrote " + target + ": SMBIOS 2.7, 3 structures, " +
            std::to_string(dumptest::sampleTable().size()) + " bytes\n";
@@ -460,11 +485,7 @@ TEST(DumpTool, WrongCommandLinesExitTwoWithMessage) {
     TableInput input;
     std::string const out = input.dir.file("out.txt");
     std::string const table = input.path();
-    struct Case {
-        std::vector<std::string> args;
-        char const* says;
-    };
-    std::vector<Case> const cases = {
+    std::vector<RefusedLine> const cases = {
         {{}, "exactly one source"},
         {{"-o", out}, "exactly one source"},
         {{"--from-table", table, "-o", out}, "--version MAJ.MIN"},
@@ -483,19 +504,11 @@ TEST(DumpTool, WrongCommandLinesExitTwoWithMessage) {
         {{"--from-bin", table, "-o", out, "extra"}, "extra"},
         {{"--from-bin"}, "--from-bin"},
     };
-    for (Case const& c : cases) {
-        std::string joined;
-        for (std::string const& arg : c.args) {
-            joined += " '" + arg + "'";
-        }
-        SCOPED_TRACE("smbios-dump" + joined);
-        RunResult const run = runDump(c.args);
-        EXPECT_EQ(run.exitStatus, 2) << describe(run);
+    for (RefusedLine const& c : cases) {
+        SCOPED_TRACE(commandText(c.args));
+        RunResult const run = expectRefusedLine(input, c.args);
         EXPECT_EQ(run.err.rfind("smbios-dump: ", 0), 0u) << describe(run);
         EXPECT_NE(run.err.find(c.says), std::string::npos) << describe(run);
-        EXPECT_TRUE(run.out.empty()) << describe(run);
-        EXPECT_EQ(dumptest::folderEntries(input.dir.path()),
-                  (std::vector<std::string>{"table.bin"}));
     }
 }
 
@@ -516,11 +529,7 @@ TEST(DumpTool, EachCommandLineRuleSaysItsOwnLine) {
     TableInput input;
     std::string const out = input.dir.file("out.txt");
     std::string const table = input.path();
-    struct Case {
-        std::vector<std::string> args;
-        std::string says;
-    };
-    std::vector<Case> const cases = {
+    std::vector<RefusedLine> const cases = {
         {{"-o", out},
          "exactly one source is needed: --from-bin FILE, --from-table FILE --version MAJ.MIN or "
          "--from-machine"},
@@ -538,18 +547,10 @@ TEST(DumpTool, EachCommandLineRuleSaysItsOwnLine) {
          "no output: give -o FILE, -o - (standard output) or --install"},
         {{"--from-table", table, "--version", "2.7", "-o", ""}, "-o: empty file name"},
     };
-    for (Case const& c : cases) {
-        std::string joined;
-        for (std::string const& arg : c.args) {
-            joined += " '" + arg + "'";
-        }
-        SCOPED_TRACE("smbios-dump" + joined);
-        RunResult const run = runDump(c.args);
-        EXPECT_EQ(run.exitStatus, 2) << describe(run);
+    for (RefusedLine const& c : cases) {
+        SCOPED_TRACE(commandText(c.args));
+        RunResult const run = expectRefusedLine(input, c.args);
         EXPECT_EQ(run.err, "smbios-dump: " + c.says + " (see --help)\n");
-        EXPECT_TRUE(run.out.empty()) << describe(run);
-        EXPECT_EQ(dumptest::folderEntries(input.dir.path()),
-                  (std::vector<std::string>{"table.bin"}));
     }
 }
 

@@ -155,16 +155,27 @@ inline Decoding parse(std::string const& text) {
     return decoding;
 }
 
+// Whether `pattern` is found in `text`; the match in `m`, and the decimal
+// number of its first group in `number`.
+inline bool searchNumber(std::string const& text, std::regex const& pattern, std::smatch& m,
+                         uint64_t& number) {
+    if (!std::regex_search(text, m, pattern)) {
+        return false;
+    }
+    number = std::stoull(m[1].str());
+    return true;
+}
+
 // A size as dmidecode prints it ("32 kB", "4 MB", "16 GB", "1024 MB (Single-
 // bank Connection)") in KB. False when the text is not a number and a unit
 // or the size is not a whole number of KB.
 inline bool sizeInKb(std::string const& text, uint64_t& kb) {
     static std::regex const size(R"(^(\d+) (bytes|kB|MB|GB|TB)\b)");
     std::smatch m;
-    if (!std::regex_search(text, m, size)) {
+    uint64_t number = 0;
+    if (!searchNumber(text, size, m, number)) {
         return false;
     }
-    uint64_t const number = std::stoull(m[1].str());
     std::string const unit = m[2].str();
     if (unit == "bytes") {
         if (number % 1024 != 0) {
@@ -188,11 +199,7 @@ inline bool sizeInKb(std::string const& text, uint64_t& kb) {
 inline bool leadingNumber(std::string const& text, uint64_t& number) {
     static std::regex const digits(R"(^(\d+))");
     std::smatch m;
-    if (!std::regex_search(text, m, digits)) {
-        return false;
-    }
-    number = std::stoull(m[1].str());
-    return true;
+    return searchNumber(text, digits, m, number);
 }
 
 // A handle value as dmidecode prints it ("0x0005"). False for the other

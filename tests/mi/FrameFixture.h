@@ -10,6 +10,7 @@
 #include <cstdint>
 #include <sstream>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "DumpFormat.h"
@@ -68,6 +69,26 @@ inline SD::SmBios parse(smbiostest::TableBuilder const& builder) {
     return SD::SmBios(builder.build());
 }
 
+// A table of the structures, in order.
+inline smbiostest::TableBuilder tableOf(std::vector<smbiostest::Structure> const& structures) {
+    smbiostest::TableBuilder table;
+    for (smbiostest::Structure const& structure : structures) {
+        table.add(structure);
+    }
+    return table;
+}
+
+// A group association (type 14) with its items, each (type, handle).
+inline smbiostest::Structure group(uint16_t handle, std::string const& name,
+                                   std::vector<std::pair<uint8_t, uint16_t>> const& items) {
+    smbiostest::Structure structure(14, handle);
+    structure.str(name);
+    for (auto const& item : items) {
+        structure.byte(item.first).word(item.second);
+    }
+    return structure;
+}
+
 inline IC::MutableNode const* asMutable(IC::Node const* node) {
     return dynamic_cast<IC::MutableNode const*>(node);
 }
@@ -81,6 +102,29 @@ inline ::testing::AssertionResult hasNodeType(IC::Node const* node, unsigned int
     if (mutableNode->getNodeType() != type) {
         return ::testing::AssertionFailure()
                << "node type " << mutableNode->getNodeType() << ", expected " << type;
+    }
+    return ::testing::AssertionSuccess();
+}
+
+// Node id, linked id, type, index, status and description in one check.
+inline ::testing::AssertionResult isNode(IC::Node const* node, unsigned int id,
+                                         unsigned int linkedId, unsigned int type,
+                                         unsigned int index, unsigned int status,
+                                         std::string const& description) {
+    if (node == nullptr) {
+        return ::testing::AssertionFailure() << "no node";
+    }
+    ::testing::AssertionResult typed = hasNodeType(node, type);
+    if (!typed) {
+        return typed;
+    }
+    if (node->getNodeId() != id || node->getLinkedId() != linkedId || node->getIndex() != index ||
+        node->getStatus() != status || node->getDescription() != description) {
+        return ::testing::AssertionFailure()
+               << "node {id " << node->getNodeId() << ", linked " << node->getLinkedId()
+               << ", index " << node->getIndex() << ", status " << node->getStatus() << ", \""
+               << node->getDescription() << "\"}, expected {id " << id << ", linked " << linkedId
+               << ", index " << index << ", status " << status << ", \"" << description << "\"}";
     }
     return ::testing::AssertionSuccess();
 }
@@ -146,28 +190,57 @@ inline ::testing::AssertionResult lacksProperty(IC::Node const* node, unsigned i
     return ::testing::AssertionSuccess();
 }
 
-// Property id holds an IC::Number of kind UNSIGNED with the given value.
-inline ::testing::AssertionResult hasUnsigned(IC::Node const* node, unsigned int id,
-                                              unsigned int expected) {
-    IC::PropertyValue value;
+// The property as readProperty reads it, checked to be of `kind` (named
+// `kindName` in the failure message).
+inline ::testing::AssertionResult readOfKind(IC::Node const* node, unsigned int id,
+                                             IC::PropertyValue::KindType kind, char const* kindName,
+                                             IC::PropertyValue& value) {
     ::testing::AssertionResult read = readProperty(node, id, value);
     if (!read) {
         return read;
     }
-    if (value.getKind() != IC::PropertyValue::NUMBER) {
+    if (value.getKind() != kind) {
         return ::testing::AssertionFailure()
-               << "property " << id << " is of kind " << value.getKind() << ", not a number";
-    }
-    if (value.getNumber().getKind() != IC::Number::UNSIGNED) {
-        return ::testing::AssertionFailure() << "property " << id << " is a number of kind "
-                                             << value.getNumber().getKind() << ", not unsigned";
-    }
-    if (value.getNumber().getUnsigned() != expected) {
-        return ::testing::AssertionFailure()
-               << "property " << id << " is " << value.getNumber().getUnsigned() << ", expected "
-               << expected;
+               << "property " << id << " is of kind " << value.getKind() << ", not " << kindName;
     }
     return ::testing::AssertionSuccess();
+}
+
+// The property as readProperty reads it, checked to be an IC::Number of
+// `kind` (named `kindName` in the failure message).
+inline ::testing::AssertionResult readNumberOfKind(IC::Node const* node, unsigned int id,
+                                                   IC::Number::KindType kind, char const* kindName,
+                                                   IC::PropertyValue& value) {
+    ::testing::AssertionResult const read =
+        readOfKind(node, id, IC::PropertyValue::NUMBER, "a number", value);
+    if (read && value.getNumber().getKind() != kind) {
+        return ::testing::AssertionFailure() << "property " << id << " is a number of kind "
+                                             << value.getNumber().getKind() << ", not " << kindName;
+    }
+    return read;
+}
+
+// Property id holds an IC::Number of `kind` (named `kindName` in the
+// failure message) whose value, as `get` reads it, equals expected.
+template <typename T>
+inline ::testing::AssertionResult hasNumber(IC::Node const* node, unsigned int id,
+                                            IC::Number::KindType kind, char const* kindName,
+                                            T (IC::Number::*get)() const, T expected) {
+    IC::PropertyValue value;
+    ::testing::AssertionResult const read = readNumberOfKind(node, id, kind, kindName, value);
+    if (read && (value.getNumber().*get)() != expected) {
+        return ::testing::AssertionFailure()
+               << "property " << id << " is " << (value.getNumber().*get)() << ", expected "
+               << expected;
+    }
+    return read;
+}
+
+// Property id holds an IC::Number of kind UNSIGNED with the given value.
+inline ::testing::AssertionResult hasUnsigned(IC::Node const* node, unsigned int id,
+                                              unsigned int expected) {
+    return hasNumber(node, id, IC::Number::UNSIGNED, "unsigned", &IC::Number::getUnsigned,
+                     expected);
 }
 
 // Property id holds a vector of IC::Number, each of kind UNSIGNED, with the
@@ -175,13 +248,10 @@ inline ::testing::AssertionResult hasUnsigned(IC::Node const* node, unsigned int
 inline ::testing::AssertionResult hasUnsignedList(IC::Node const* node, unsigned int id,
                                                   std::vector<unsigned int> const& expected) {
     IC::PropertyValue value;
-    ::testing::AssertionResult read = readProperty(node, id, value);
+    ::testing::AssertionResult read =
+        readOfKind(node, id, IC::PropertyValue::NUMBERS, "a vector of numbers", value);
     if (!read) {
         return read;
-    }
-    if (value.getKind() != IC::PropertyValue::NUMBERS) {
-        return ::testing::AssertionFailure() << "property " << id << " is of kind "
-                                             << value.getKind() << ", not a vector of numbers";
     }
     std::vector<IC::Number> const& numbers = value.getNumbers();
     if (numbers.size() != expected.size()) {
@@ -204,13 +274,10 @@ inline ::testing::AssertionResult hasUnsignedList(IC::Node const* node, unsigned
 inline ::testing::AssertionResult hasStrings(IC::Node const* node, unsigned int id,
                                              std::vector<std::string> const& expected) {
     IC::PropertyValue value;
-    ::testing::AssertionResult read = readProperty(node, id, value);
+    ::testing::AssertionResult read =
+        readOfKind(node, id, IC::PropertyValue::STRINGS, "a vector of strings", value);
     if (!read) {
         return read;
-    }
-    if (value.getKind() != IC::PropertyValue::STRINGS) {
-        return ::testing::AssertionFailure() << "property " << id << " is of kind "
-                                             << value.getKind() << ", not a vector of strings";
     }
     if (value.getStrings() != expected) {
         std::ostringstream wanted;
@@ -227,20 +294,30 @@ inline ::testing::AssertionResult hasStrings(IC::Node const* node, unsigned int 
 inline ::testing::AssertionResult hasVersion(IC::Node const* node, unsigned int id,
                                              unsigned int major, unsigned int minor) {
     IC::PropertyValue value;
-    ::testing::AssertionResult read = readProperty(node, id, value);
+    ::testing::AssertionResult read =
+        readNumberOfKind(node, id, IC::Number::VERSION, "a version", value);
     if (!read) {
         return read;
-    }
-    if (value.getKind() != IC::PropertyValue::NUMBER ||
-        value.getNumber().getKind() != IC::Number::VERSION) {
-        return ::testing::AssertionFailure() << "property " << id << " is " << value << " (kind "
-                                             << value.getKind() << "), not a version number";
     }
     IC::Version2 const& version = value.getNumber().getVersion();
     if (version != IC::Version2(major, minor)) {
         return ::testing::AssertionFailure()
                << "property " << id << " is version " << version.getMajor() << "."
                << version.getMinor() << ", expected " << major << "." << minor;
+    }
+    return ::testing::AssertionSuccess();
+}
+
+// Each text is in `times` captured messages (LogCapture::count: the log and
+// the trace output each count).
+inline ::testing::AssertionResult loggedTimes(smbiostest::LogCapture const& log, size_t times,
+                                              std::vector<std::string> const& texts) {
+    for (std::string const& text : texts) {
+        if (log.count(text) != times) {
+            return ::testing::AssertionFailure() << "\"" << text << "\" is in " << log.count(text)
+                                                 << " messages, expected " << times << "\n"
+                                                 << log.dump();
+        }
     }
     return ::testing::AssertionSuccess();
 }

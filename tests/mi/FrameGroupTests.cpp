@@ -9,7 +9,9 @@
 
 #include "FrameFixture.h"
 
+using frametest::group;
 using frametest::StructureLists;
+using frametest::tableOf;
 using frametest::TestMI;
 using smbiostest::Structure;
 using smbiostest::TableBuilder;
@@ -18,20 +20,12 @@ namespace {
 
 typedef std::vector<std::pair<unsigned char, unsigned int>> Members;
 
-// A group association: its name and its items, each (type, handle).
-Structure group(uint16_t handle, std::string const& name, Members const& items) {
-    Structure structure(14, handle);
-    structure.str(name);
-    for (auto const& item : items) {
-        structure.byte(item.first).word(static_cast<uint16_t>(item.second));
-    }
-    return structure;
-}
-
 // The lookup over a table of the given structures.
 struct GroupLookup {
     explicit GroupLookup(TableBuilder const& table)
         : parsed(frametest::parse(table)), lists(parsed) {}
+    explicit GroupLookup(std::vector<Structure> const& structures)
+        : GroupLookup(tableOf(structures)) {}
 
     Members find(unsigned int type, unsigned int handle) {
         return mi.findGroup(lists.get(), type, handle);
@@ -46,10 +40,8 @@ struct GroupLookup {
 
 TEST(FrameGroup, NoGroupAssociationYieldsNothing) {
     smbiostest::LogCapture log;
-    TableBuilder table;
-    table.add(Structure(1, 0x0100).str("Corvane"));
-    table.add(Structure(3, 0x0300).str("Corvane").byte(0x17));
-    GroupLookup lookup(table);
+    GroupLookup lookup(
+        {Structure(1, 0x0100).str("Corvane"), Structure(3, 0x0300).str("Corvane").byte(0x17)});
 
     EXPECT_TRUE(lookup.find(1, 0x0100).empty());
     EXPECT_EQ(2u, log.count("findGroup entry")) << log.dump();
@@ -61,10 +53,7 @@ TEST(FrameGroup, NoGroupAssociationYieldsNothing) {
 
 TEST(FrameGroup, GroupWithoutItemsIsLoggedAndContributesNothing) {
     smbiostest::LogCapture log;
-    TableBuilder table;
-    table.add(Structure(1, 0x0100).str("Corvane"));
-    table.add(group(0x0E00, "Empty", {}));
-    GroupLookup lookup(table);
+    GroupLookup lookup({Structure(1, 0x0100).str("Corvane"), group(0x0E00, "Empty", {})});
     ASSERT_EQ(5u, lookup.parsed.getTables()[1].getLength());
 
     EXPECT_TRUE(lookup.find(1, 0x0100).empty());
@@ -75,18 +64,15 @@ TEST(FrameGroup, GroupWithoutItemsIsLoggedAndContributesNothing) {
 
 TEST(FrameGroup, TargetYieldsTheOtherMembersInItemOrder) {
     smbiostest::LogCapture log;
-    TableBuilder table;
-    table.add(group(0x0E00, "Cluster", {{1, 0x0100}, {3, 0x0300}, {2, 0x0200}}));
-    GroupLookup lookup(table);
+    GroupLookup lookup({group(0x0E00, "Cluster", {{1, 0x0100}, {3, 0x0300}, {2, 0x0200}})});
 
     EXPECT_EQ((Members{{3, 0x0300}, {2, 0x0200}}), lookup.find(1, 0x0100));
-    EXPECT_EQ(2u, log.count("Table 14 length = 14 entries=3")) << log.dump();
-    EXPECT_EQ(2u, log.count("  Target 1 handle 256 found in group Cluster handle 3584"))
-        << log.dump();
-    EXPECT_EQ(2u, log.count("  Member 3 handle 768 found in group Cluster handle 3584"))
-        << log.dump();
-    EXPECT_EQ(2u, log.count("  Member 2 handle 512 found in group Cluster handle 3584"))
-        << log.dump();
+    EXPECT_TRUE(
+        frametest::loggedTimes(log, 2,
+                               {"Table 14 length = 14 entries=3",
+                                "  Target 1 handle 256 found in group Cluster handle 3584",
+                                "  Member 3 handle 768 found in group Cluster handle 3584",
+                                "  Member 2 handle 512 found in group Cluster handle 3584"}));
     EXPECT_EQ(4u, log.count("  Member ")) << log.dump();
 
     // The members are logged in the order they are returned.
@@ -101,9 +87,7 @@ TEST(FrameGroup, TargetYieldsTheOtherMembersInItemOrder) {
 
 TEST(FrameGroup, HandleNotInAnyGroupYieldsNothing) {
     smbiostest::LogCapture log;
-    TableBuilder table;
-    table.add(group(0x0E00, "Cluster", {{1, 0x0100}, {3, 0x0300}, {2, 0x0200}}));
-    GroupLookup lookup(table);
+    GroupLookup lookup({group(0x0E00, "Cluster", {{1, 0x0100}, {3, 0x0300}, {2, 0x0200}})});
 
     EXPECT_TRUE(lookup.find(1, 0x0101).empty());
     EXPECT_EQ(0u, log.count("  Target ")) << log.dump();
@@ -112,9 +96,7 @@ TEST(FrameGroup, HandleNotInAnyGroupYieldsNothing) {
 
 TEST(FrameGroup, TypeMustMatchAsWellAsHandle) {
     smbiostest::LogCapture log;
-    TableBuilder table;
-    table.add(group(0x0E00, "Cluster", {{1, 0x0100}, {3, 0x0300}}));
-    GroupLookup lookup(table);
+    GroupLookup lookup({group(0x0E00, "Cluster", {{1, 0x0100}, {3, 0x0300}})});
 
     EXPECT_TRUE(lookup.find(2, 0x0100).empty());
     EXPECT_EQ(0u, log.count("  Target ")) << log.dump();
@@ -122,11 +104,9 @@ TEST(FrameGroup, TypeMustMatchAsWellAsHandle) {
 
 TEST(FrameGroup, MemberOfTwoGroupsIsReturnedTwiceGroupAfterGroup) {
     smbiostest::LogCapture log;
-    TableBuilder table;
-    table.add(group(0x0E00, "First", {{1, 0x0100}, {4, 0x0400}}));
-    table.add(group(0x0E01, "Unrelated", {{4, 0x0400}, {9, 0x0900}}));
-    table.add(group(0x0E02, "Second", {{4, 0x0400}, {1, 0x0100}, {7, 0x0700}}));
-    GroupLookup lookup(table);
+    GroupLookup lookup({group(0x0E00, "First", {{1, 0x0100}, {4, 0x0400}}),
+                        group(0x0E01, "Unrelated", {{4, 0x0400}, {9, 0x0900}}),
+                        group(0x0E02, "Second", {{4, 0x0400}, {1, 0x0100}, {7, 0x0700}})});
 
     EXPECT_EQ((Members{{4, 0x0400}, {4, 0x0400}, {7, 0x0700}}), lookup.find(1, 0x0100));
     EXPECT_EQ(2u, log.count("  Member 4 handle 1024 found in group First handle 3584"))
@@ -138,9 +118,7 @@ TEST(FrameGroup, MemberOfTwoGroupsIsReturnedTwiceGroupAfterGroup) {
 
 TEST(FrameGroup, TargetTwiceInOneGroupIsLeftOutBothTimes) {
     smbiostest::LogCapture log;
-    TableBuilder table;
-    table.add(group(0x0E00, "Cluster", {{1, 0x0100}, {3, 0x0300}, {1, 0x0100}}));
-    GroupLookup lookup(table);
+    GroupLookup lookup({group(0x0E00, "Cluster", {{1, 0x0100}, {3, 0x0300}, {1, 0x0100}})});
 
     EXPECT_EQ((Members{{3, 0x0300}}), lookup.find(1, 0x0100));
     EXPECT_EQ(4u, log.count("  Target 1 handle 256 found in group Cluster handle 3584"))

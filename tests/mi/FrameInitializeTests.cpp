@@ -118,12 +118,7 @@ TEST(FrameInitialize, EmptyTableLogsSizeZeroAndStillMakesInterfaceAndRootNodes) 
     ASSERT_EQ(2u, nodes.size()) << log.dump();
 
     IC::Node const* miNode = nodes[0];
-    EXPECT_TRUE(hasNodeType(miNode, 15));
-    EXPECT_EQ(1u, miNode->getNodeId());
-    EXPECT_EQ(0u, miNode->getLinkedId());
-    EXPECT_EQ(0u, miNode->getIndex());
-    EXPECT_EQ(1u, miNode->getStatus());
-    EXPECT_EQ("Corvane SMBIOS Management Interface", miNode->getDescription());
+    EXPECT_TRUE(frametest::isNode(miNode, 1, 0, 15, 0, 1, "Corvane SMBIOS Management Interface"));
     EXPECT_EQ(std::vector<unsigned int>{1}, miNode->getMIIds());
     EXPECT_TRUE(hasVersion(miNode, 306, 2, 7));
     EXPECT_TRUE(lacksProperty(miNode, 307));

@@ -93,6 +93,40 @@ protected:
         return ::testing::AssertionSuccess();
     }
 
+    // `write` (a writer call on the sample) fails its check: see refused.
+    template <typename Write>
+    ::testing::AssertionResult refuses(Write write, std::string const& text, unsigned int off) {
+        LogCapture log;
+        write();
+        return refused(log, text, off);
+    }
+
+    // `reads` (reader calls on the sample and their checks) logs no line
+    // that contains `text`.
+    template <typename Reads>
+    static void expectNoLine(std::string const& text, Reads reads) {
+        LogCapture log;
+        reads();
+        EXPECT_FALSE(log.contains(text)) << log.dump();
+    }
+
+    // `read` (a reader call on the sample) fails its check: it gives
+    // `expected` and logs the diagnostic line (text, offset, " length=24").
+    template <typename Read, typename Value>
+    static ::testing::AssertionResult failsReading(Read read, Value const& expected,
+                                                   std::string const& text, unsigned int off) {
+        LogCapture log;
+        auto const value = read();
+        if (!(value == expected)) {
+            return ::testing::AssertionFailure() << "the reader gave " << value;
+        }
+        std::string const line = failText(text, off, 24);
+        if (!log.contains(line)) {
+            return ::testing::AssertionFailure() << "no \"" << line << "\" logged\n" << log.dump();
+        }
+        return ::testing::AssertionSuccess();
+    }
+
     void expectBool(bool expected) {
         IC::PropertyValue const value = property();
         EXPECT_EQ(value.getKind(), IC::PropertyValue::NUMBER);
@@ -126,6 +160,33 @@ protected:
         EXPECT_EQ(value.getBytes(), expected);
     }
 
+    // The writer call `write`, then the check of what it set.
+    template <typename Write>
+    void expectBool(Write write, bool expected) {
+        write();
+        expectBool(expected);
+    }
+    template <typename Write>
+    void expectUnsigned(Write write, unsigned int expected) {
+        write();
+        expectUnsigned(expected);
+    }
+    template <typename Write>
+    void expectEnum(Write write, std::int64_t expected, unsigned int width) {
+        write();
+        expectEnum(expected, width);
+    }
+    template <typename Write>
+    void expectString(Write write, std::string const& expected) {
+        write();
+        expectString(expected);
+    }
+    template <typename Write>
+    void expectBytes(Write write, Bytes const& expected) {
+        write();
+        expectBytes(expected);
+    }
+
     SD::SmBios::Table const t;
     IC::SmBiosMI mi;
     IC::MutableNode node;
@@ -137,38 +198,36 @@ protected:
 // Readers
 
 TEST_F(ReaderWriter, GetBool16TestsTheWordAgainstTheMask) {
-    LogCapture log;
-    EXPECT_TRUE(mi.getBool16(&t, 6, 0x0200));
-    EXPECT_TRUE(mi.getBool16(&t, 6, 0x0080));
-    EXPECT_FALSE(mi.getBool16(&t, 6, 0x0100));
-    EXPECT_FALSE(log.contains("getBool16 offset=")) << log.dump();
+    expectNoLine("getBool16 offset=", [&] {
+        EXPECT_TRUE(mi.getBool16(&t, 6, 0x0200));
+        EXPECT_TRUE(mi.getBool16(&t, 6, 0x0080));
+        EXPECT_FALSE(mi.getBool16(&t, 6, 0x0100));
+    });
 }
 
 TEST_F(ReaderWriter, GetBool16FailsAtTheLength) {
-    LogCapture log;
-    EXPECT_FALSE(mi.getBool16(&t, 24, 0xFFFF));
-    EXPECT_TRUE(log.contains(failText("getBool16 offset=", 24, 24))) << log.dump();
+    EXPECT_TRUE(
+        failsReading([&] { return mi.getBool16(&t, 24, 0xFFFF); }, false, "getBool16 offset=", 24));
 }
 
 TEST_F(ReaderWriter, GetNumber16ReadsTheWord) {
-    LogCapture log;
-    EXPECT_EQ(mi.getNumber16(&t, 18), 0xBEEFu);
-    EXPECT_EQ(mi.getNumber16(&t, 22), 0x5A00u);
-    EXPECT_FALSE(log.contains("getNumber16 offset=")) << log.dump();
+    expectNoLine("getNumber16 offset=", [&] {
+        EXPECT_EQ(mi.getNumber16(&t, 18), 0xBEEFu);
+        EXPECT_EQ(mi.getNumber16(&t, 22), 0x5A00u);
+    });
 }
 
 TEST_F(ReaderWriter, GetNumber16FailsAtTheLength) {
-    LogCapture log;
-    EXPECT_EQ(mi.getNumber16(&t, 24), 0u);
-    EXPECT_TRUE(log.contains(failText("getNumber16 offset=", 24, 24))) << log.dump();
+    EXPECT_TRUE(
+        failsReading([&] { return mi.getNumber16(&t, 24); }, 0u, "getNumber16 offset=", 24));
 }
 
 TEST_F(ReaderWriter, GetEnumValue16MasksAndShifts) {
-    LogCapture log;
-    EXPECT_EQ(mi.getEnumValue16(&t, 6, 0x0380, 7), 5u);
-    EXPECT_EQ(mi.getEnumValue16(&t, 18, 0xFFFF, 0), 0xBEEFu);
-    EXPECT_EQ(mi.getEnumValue16(&t, 18, 0xF000, 12), 0xBu);
-    EXPECT_FALSE(log.contains("EnumValue16 offset=")) << log.dump();
+    expectNoLine("EnumValue16 offset=", [&] {
+        EXPECT_EQ(mi.getEnumValue16(&t, 6, 0x0380, 7), 5u);
+        EXPECT_EQ(mi.getEnumValue16(&t, 18, 0xFFFF, 0), 0xBEEFu);
+        EXPECT_EQ(mi.getEnumValue16(&t, 18, 0xF000, 12), 0xBu);
+    });
 }
 
 TEST_F(ReaderWriter, GetEnumValue16FailsWithItsOwnSpelling) {
@@ -199,23 +258,20 @@ TEST_F(ReaderWriter, GetBool8TestsTheByteAgainstTheMask) {
     EXPECT_FALSE(mi.getBool8(&t, 5, 0xFF));
 }
 
-TEST_F(ReaderWriter, GetBool8FailsAtTheLength) {
-    LogCapture log;
-    EXPECT_FALSE(mi.getBool8(&t, 24, 0xFF));
-    EXPECT_TRUE(log.contains(failText("getBool8 offset=", 24, 24))) << log.dump();
-}
-
 TEST_F(ReaderWriter, GetNumber8ReadsTheByteUpToTheLastOfTheFormattedArea) {
-    LogCapture log;
-    EXPECT_EQ(mi.getNumber8(&t, 0), 17u);
-    EXPECT_EQ(mi.getNumber8(&t, 23), 0x5Au);
-    EXPECT_FALSE(log.contains("getNumber8 offset=")) << log.dump();
+    expectNoLine("getNumber8 offset=", [&] {
+        EXPECT_EQ(mi.getNumber8(&t, 0), 17u);
+        EXPECT_EQ(mi.getNumber8(&t, 23), 0x5Au);
+    });
 }
 
 TEST_F(ReaderWriter, GetNumber8FailsAtTheLengthThoughStringsFollow) {
-    LogCapture log;
-    EXPECT_EQ(mi.getNumber8(&t, 24), 0u);
-    EXPECT_TRUE(log.contains(failText("getNumber8 offset=", 24, 24))) << log.dump();
+    EXPECT_TRUE(failsReading([&] { return mi.getNumber8(&t, 24); }, 0u, "getNumber8 offset=", 24));
+}
+
+TEST_F(ReaderWriter, GetBool8FailsAtTheLength) {
+    EXPECT_TRUE(
+        failsReading([&] { return mi.getBool8(&t, 24, 0xFF); }, false, "getBool8 offset=", 24));
 }
 
 TEST_F(ReaderWriter, GetEnumValueMasksTheByte) {
@@ -225,17 +281,16 @@ TEST_F(ReaderWriter, GetEnumValueMasksTheByte) {
 }
 
 TEST_F(ReaderWriter, GetEnumValueFailsAtTheLength) {
-    LogCapture log;
-    EXPECT_EQ(mi.getEnumValue(&t, 25, 0xFF), 0u);
-    EXPECT_TRUE(log.contains(failText("getEnumValue offset=", 25, 24))) << log.dump();
+    EXPECT_TRUE(failsReading([&] { return mi.getEnumValue(&t, 25, 0xFF); }, 0u,
+                             "getEnumValue offset=", 25));
 }
 
 TEST_F(ReaderWriter, GetNumber8UnprotReadsPastTheFormattedArea) {
-    LogCapture log;
-    EXPECT_EQ(mi.getNumber8Unprot(&t, 23), 0x5Au);
-    EXPECT_EQ(mi.getNumber8Unprot(&t, 24), static_cast<unsigned int>('C'));
-    EXPECT_EQ(mi.getNumber8Unprot(&t, 25), static_cast<unsigned int>('o'));
-    EXPECT_FALSE(log.contains(" offset=")) << log.dump();
+    expectNoLine(" offset=", [&] {
+        EXPECT_EQ(mi.getNumber8Unprot(&t, 23), 0x5Au);
+        EXPECT_EQ(mi.getNumber8Unprot(&t, 24), static_cast<unsigned int>('C'));
+        EXPECT_EQ(mi.getNumber8Unprot(&t, 25), static_cast<unsigned int>('o'));
+    });
 }
 
 TEST_F(ReaderWriter, GetStrByIdxReturnsTheStringOrEmpty) {
@@ -247,18 +302,17 @@ TEST_F(ReaderWriter, GetStrByIdxReturnsTheStringOrEmpty) {
 }
 
 TEST_F(ReaderWriter, GetStringFollowsTheStringNumberField) {
-    LogCapture log;
-    EXPECT_EQ(mi.getString(&t, 12), "Corvane");
-    EXPECT_EQ(mi.getString(&t, 13), "RS-7400");
-    EXPECT_EQ(mi.getString(&t, 14), "");
-    EXPECT_EQ(mi.getString(&t, 15), "");
-    EXPECT_FALSE(log.contains("getString invalid offset=")) << log.dump();
+    expectNoLine("getString invalid offset=", [&] {
+        EXPECT_EQ(mi.getString(&t, 12), "Corvane");
+        EXPECT_EQ(mi.getString(&t, 13), "RS-7400");
+        EXPECT_EQ(mi.getString(&t, 14), "");
+        EXPECT_EQ(mi.getString(&t, 15), "");
+    });
 }
 
 TEST_F(ReaderWriter, GetStringFailsAtTheLength) {
-    LogCapture log;
-    EXPECT_EQ(mi.getString(&t, 24), "");
-    EXPECT_TRUE(log.contains(failText("getString invalid offset=", 24, 24))) << log.dump();
+    EXPECT_TRUE(
+        failsReading([&] { return mi.getString(&t, 24); }, "", "getString invalid offset=", 24));
 }
 
 TEST_F(ReaderWriter, GetBufferKeepsMemoryOrder) {
@@ -278,10 +332,10 @@ TEST_F(ReaderWriter, GetBufferFailsPastTheLengthWithTheWritersText) {
 }
 
 TEST_F(ReaderWriter, GetBufferUnprotReadsPastTheFormattedArea) {
-    LogCapture log;
-    EXPECT_EQ(mi.getBufferUnprot(&t, 22, 5), (Bytes{0x00, 0x5A, 'C', 'o', 'r'}));
-    EXPECT_TRUE(mi.getBufferUnprot(&t, 0, 0).empty());
-    EXPECT_FALSE(log.contains(" offset=")) << log.dump();
+    expectNoLine(" offset=", [&] {
+        EXPECT_EQ(mi.getBufferUnprot(&t, 22, 5), (Bytes{0x00, 0x5A, 'C', 'o', 'r'}));
+        EXPECT_TRUE(mi.getBufferUnprot(&t, 0, 0).empty());
+    });
 }
 
 // ---------------------------------------------------------------------------
@@ -289,30 +343,23 @@ TEST_F(ReaderWriter, GetBufferUnprotReadsPastTheFormattedArea) {
 
 TEST_F(ReaderWriter, PropBool64SetsBoolFromTheByteAtTheOffset) {
     // 16 + 7 < 24: the whole 8-byte field is inside.
-    mi.propBool64(&t, 16, 0x01, ID, &node);
-    expectBool(true);
+    expectBool([&] { mi.propBool64(&t, 16, 0x01, ID, &node); }, true);
 }
 
 TEST_F(ReaderWriter, PropBool64ReadsOnlyTheByteAtTheOffset) {
     // The byte at 16 is 0x01 and the byte at 17 is 0x01 too: mask 0x100
     // would find the second one in a full-width read.
-    mi.propBool64(&t, 16, 0x100ull, ID, &node);
-    expectBool(false);
-    mi.propBool64(&t, 16, 0x0101010101010100ull, ID, &node);
-    expectBool(false);
+    expectBool([&] { mi.propBool64(&t, 16, 0x100ull, ID, &node); }, false);
+    expectBool([&] { mi.propBool64(&t, 16, 0x0101010101010100ull, ID, &node); }, false);
 }
 
 TEST_F(ReaderWriter, PropBool64FailsWhenTheFieldPassesTheLength) {
-    LogCapture log;
-    mi.propBool64(&t, 17, 0x01, ID, &node);
-    EXPECT_TRUE(refused(log, "propBool64 offset=", 17));
+    EXPECT_TRUE(refuses([&] { mi.propBool64(&t, 17, 0x01, ID, &node); }, "propBool64 offset=", 17));
 }
 
 TEST_F(ReaderWriter, PropBool32SetsBoolFromTheByteAtTheOffset) {
-    mi.propBool32(&t, 20, 0xFF, ID, &node);
-    expectBool(false);
-    mi.propBool32(&t, 16, 0x01, ID, &node);
-    expectBool(true);
+    expectBool([&] { mi.propBool32(&t, 20, 0xFF, ID, &node); }, false);
+    expectBool([&] { mi.propBool32(&t, 16, 0x01, ID, &node); }, true);
 }
 
 TEST_F(ReaderWriter, PropBool32WithMask0x100AlwaysSetsFalse) {
@@ -327,47 +374,34 @@ TEST_F(ReaderWriter, PropBool32WithMask0x100AlwaysSetsFalse) {
 }
 
 TEST_F(ReaderWriter, PropBool32FailsWhenTheFieldPassesTheLength) {
-    LogCapture log;
-    mi.propBool32(&t, 21, 0x01, ID, &node);
-    EXPECT_TRUE(refused(log, "propBool32 offset=", 21));
+    EXPECT_TRUE(refuses([&] { mi.propBool32(&t, 21, 0x01, ID, &node); }, "propBool32 offset=", 21));
 }
 
 TEST_F(ReaderWriter, PropBool16SetsBoolFromTheByteAtTheOffset) {
-    mi.propBool16(&t, 22, 0x01, ID, &node);
-    expectBool(false);
-    mi.propBool16(&t, 16, 0x0100, ID, &node);
-    expectBool(false);
-    mi.propBool16(&t, 4, 0x0080, ID, &node);
-    expectBool(true);
-}
-
-TEST_F(ReaderWriter, PropBool16FailsWhenTheWordPassesTheLength) {
-    LogCapture log;
-    mi.propBool16(&t, 23, 0x01, ID, &node);
-    EXPECT_TRUE(refused(log, "propBool16 offset=", 23));
+    expectBool([&] { mi.propBool16(&t, 22, 0x01, ID, &node); }, false);
+    expectBool([&] { mi.propBool16(&t, 16, 0x0100, ID, &node); }, false);
+    expectBool([&] { mi.propBool16(&t, 4, 0x0080, ID, &node); }, true);
 }
 
 TEST_F(ReaderWriter, PropBool8SetsBoolFromTheByte) {
-    mi.propBool8(&t, 23, 0x02, ID, &node);
-    expectBool(true);
-    mi.propBool8(&t, 23, 0x01, ID, &node);
-    expectBool(false);
+    expectBool([&] { mi.propBool8(&t, 23, 0x02, ID, &node); }, true);
+    expectBool([&] { mi.propBool8(&t, 23, 0x01, ID, &node); }, false);
+}
+
+TEST_F(ReaderWriter, PropBool16FailsWhenTheWordPassesTheLength) {
+    EXPECT_TRUE(refuses([&] { mi.propBool16(&t, 23, 0x01, ID, &node); }, "propBool16 offset=", 23));
 }
 
 TEST_F(ReaderWriter, PropBool8FailsAtTheLength) {
-    LogCapture log;
-    mi.propBool8(&t, 24, 0x01, ID, &node);
-    EXPECT_TRUE(refused(log, "propBool8 offset=", 24));
+    EXPECT_TRUE(refuses([&] { mi.propBool8(&t, 24, 0x01, ID, &node); }, "propBool8 offset=", 24));
 }
 
 // ---------------------------------------------------------------------------
 // Number and enumerated-value writers
 
 TEST_F(ReaderWriter, PropNumber16SetsTheWordAsUnsigned) {
-    mi.propNumber16(&t, 18, ID, &node);
-    expectUnsigned(0xBEEF);
-    mi.propNumber16(&t, 22, ID, &node);
-    expectUnsigned(0x5A00);
+    expectUnsigned([&] { mi.propNumber16(&t, 18, ID, &node); }, 0xBEEF);
+    expectUnsigned([&] { mi.propNumber16(&t, 22, ID, &node); }, 0x5A00);
 }
 
 TEST_F(ReaderWriter, PropNumber16AtTheLastByteSetsNothingWhileGetNumber16PassesItsCheck) {
@@ -383,63 +417,51 @@ TEST_F(ReaderWriter, PropNumber16AtTheLastByteSetsNothingWhileGetNumber16PassesI
 }
 
 TEST_F(ReaderWriter, PropNumber8SetsTheByteAsUnsigned) {
-    mi.propNumber8(&t, 4, ID, &node);
-    expectUnsigned(0x81);
-    mi.propNumber8(&t, 23, ID, &node);
-    expectUnsigned(0x5A);
+    expectUnsigned([&] { mi.propNumber8(&t, 4, ID, &node); }, 0x81);
+    expectUnsigned([&] { mi.propNumber8(&t, 23, ID, &node); }, 0x5A);
 }
 
 TEST_F(ReaderWriter, PropNumber8FailsAtTheLength) {
-    LogCapture log;
-    mi.propNumber8(&t, 24, ID, &node);
-    EXPECT_TRUE(refused(log, "propNumber8 offset=", 24));
+    EXPECT_TRUE(refuses([&] { mi.propNumber8(&t, 24, ID, &node); }, "propNumber8 offset=", 24));
 }
 
 TEST_F(ReaderWriter, PropEnumValue16SetsAWidthTwoEnum) {
-    mi.propEnumValue16(&t, 6, 0x0380, 7, ID, &node);
-    expectEnum(5, 2);
-    mi.propEnumValue16(&t, 18, 0xFFFF, 0, ID, &node);
-    expectEnum(0xBEEF, 2);
+    expectEnum([&] { mi.propEnumValue16(&t, 6, 0x0380, 7, ID, &node); }, 5, 2);
+    expectEnum([&] { mi.propEnumValue16(&t, 18, 0xFFFF, 0, ID, &node); }, 0xBEEF, 2);
 }
 
 TEST_F(ReaderWriter, PropEnumValue16FailsWhenTheWordPassesTheLength) {
-    LogCapture log;
-    mi.propEnumValue16(&t, 23, 0xFFFF, 0, ID, &node);
-    EXPECT_TRUE(refused(log, "propEnumValue16 offset=", 23));
+    EXPECT_TRUE(refuses([&] { mi.propEnumValue16(&t, 23, 0xFFFF, 0, ID, &node); },
+                        "propEnumValue16 offset=", 23));
 }
 
 TEST_F(ReaderWriter, PropEnumValueWithMaskSetsAWidthOneEnum) {
-    mi.propEnumValue(&t, 4, static_cast<unsigned char>(0x0F), ID, &node);
-    expectEnum(0x01, 1);
-    mi.propEnumValue(&t, 23, static_cast<unsigned char>(0xF0), ID, &node);
-    expectEnum(0x50, 1);
+    expectEnum([&] { mi.propEnumValue(&t, 4, static_cast<unsigned char>(0x0F), ID, &node); }, 0x01,
+               1);
+    expectEnum([&] { mi.propEnumValue(&t, 23, static_cast<unsigned char>(0xF0), ID, &node); }, 0x50,
+               1);
 }
 
 TEST_F(ReaderWriter, PropEnumValueWithMaskFailsAtTheLength) {
-    LogCapture log;
-    mi.propEnumValue(&t, 24, static_cast<unsigned char>(0xFF), ID, &node);
-    EXPECT_TRUE(refused(log, "propEnumValue offset=", 24));
+    EXPECT_TRUE(
+        refuses([&] { mi.propEnumValue(&t, 24, static_cast<unsigned char>(0xFF), ID, &node); },
+                "propEnumValue offset=", 24));
 }
 
 TEST_F(ReaderWriter, PropEnumValueWithoutMaskSetsTheByte) {
-    mi.propEnumValue(&t, 4, ID, &node);
-    expectEnum(0x81, 1);
-    mi.propEnumValue(&t, 23, ID, &node);
-    expectEnum(0x5A, 1);
+    expectEnum([&] { mi.propEnumValue(&t, 4, ID, &node); }, 0x81, 1);
+    expectEnum([&] { mi.propEnumValue(&t, 23, ID, &node); }, 0x5A, 1);
 }
 
 TEST_F(ReaderWriter, PropEnumValueWithoutMaskFailsAtTheLength) {
-    LogCapture log;
-    mi.propEnumValue(&t, 24, ID, &node);
-    EXPECT_TRUE(refused(log, "propEnumValue offset=", 24));
+    EXPECT_TRUE(refuses([&] { mi.propEnumValue(&t, 24, ID, &node); }, "propEnumValue offset=", 24));
 }
 
 // ---------------------------------------------------------------------------
 // String and buffer writers
 
 TEST_F(ReaderWriter, PropStringSetsTheNamedString) {
-    mi.propString(&t, 12, ID, &node);
-    expectString("Corvane");
+    expectString([&] { mi.propString(&t, 12, ID, &node); }, "Corvane");
     mi.propString(&t, 13, 8, &node);
     IC::PropertyValue const second = property(8);
     EXPECT_EQ(second.getKind(), IC::PropertyValue::STRING);
@@ -447,36 +469,28 @@ TEST_F(ReaderWriter, PropStringSetsTheNamedString) {
 }
 
 TEST_F(ReaderWriter, PropStringOnStringNumberZeroSetsEmpty) {
-    mi.propString(&t, 14, ID, &node);
-    expectString("");
+    expectString([&] { mi.propString(&t, 14, ID, &node); }, "");
 }
 
 TEST_F(ReaderWriter, PropStringOnANumberBeyondTheStringsSetsEmpty) {
-    mi.propString(&t, 15, ID, &node);
-    expectString("");
+    expectString([&] { mi.propString(&t, 15, ID, &node); }, "");
 }
 
 TEST_F(ReaderWriter, PropStringFailsAtTheLength) {
-    LogCapture log;
-    mi.propString(&t, 24, ID, &node);
-    EXPECT_TRUE(refused(log, "propString offset=", 24));
+    EXPECT_TRUE(refuses([&] { mi.propString(&t, 24, ID, &node); }, "propString offset=", 24));
 }
 
 TEST_F(ReaderWriter, PropBufferStoresTheBytesReversedAndGetBufferDoesNot) {
-    mi.propBuffer(&t, 8, 4, ID, &node);
-    expectBytes(Bytes{0x04, 0x03, 0x02, 0x01});
+    expectBytes([&] { mi.propBuffer(&t, 8, 4, ID, &node); }, Bytes{0x04, 0x03, 0x02, 0x01});
     EXPECT_EQ(mi.getBuffer(&t, 8, 4), (Bytes{0x01, 0x02, 0x03, 0x04}));
 }
 
 TEST_F(ReaderWriter, PropBufferReachesTheLastByteOfTheFormattedArea) {
-    mi.propBuffer(&t, 20, 4, ID, &node);
-    expectBytes(Bytes{0x5A, 0x00, 0x01, 0x00});
+    expectBytes([&] { mi.propBuffer(&t, 20, 4, ID, &node); }, Bytes{0x5A, 0x00, 0x01, 0x00});
 }
 
 TEST_F(ReaderWriter, PropBufferFailsPastTheLength) {
-    LogCapture log;
-    mi.propBuffer(&t, 21, 4, ID, &node);
-    EXPECT_TRUE(refused(log, "propBuffer offset=", 21));
+    EXPECT_TRUE(refuses([&] { mi.propBuffer(&t, 21, 4, ID, &node); }, "propBuffer offset=", 21));
 }
 
 // ---------------------------------------------------------------------------
@@ -484,8 +498,7 @@ TEST_F(ReaderWriter, PropBufferFailsPastTheLength) {
 
 TEST_F(ReaderWriter, FailedWriterKeepsThePreviousValue) {
     node.setProperty(ID, IC::PropertyValue("before", true));
-    mi.propNumber8(&t, 200, ID, &node);
-    expectString("before");
+    expectString([&] { mi.propNumber8(&t, 200, ID, &node); }, "before");
 }
 
 TEST_F(ReaderWriter, FailedCheckIsLoggedOnceThroughLogAndTrace) {

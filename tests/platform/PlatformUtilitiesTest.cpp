@@ -1,14 +1,11 @@
 // SD::PlatformUtilities: the agent's folders, line reading and UUID text.
-#include <fcntl.h>
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
 #include <cerrno>
-#include <chrono>
 #include <climits>
 #include <cstdlib>
-#include <future>
 #include <vector>
 
 #include "PlatformTestHelpers.h"
@@ -123,22 +120,12 @@ TEST(PlatformUtilities, OpenFifoIsRefusedWithoutWaitingForAWriter) {
     std::string const fifo = scratch.file("smbios.txt");
     ASSERT_EQ(0, mkfifo(fifo.c_str(), 0600));
     _FileHandle* file = reinterpret_cast<_FileHandle*>(&scratch);
-    std::future<int> opening = std::async(std::launch::async, [&fifo, &file] {
-        return PlatformUtilities::openFile(fifo.c_str(), &file, 0, 0);
-    });
     // An open that waits for a writer is released by one coming and going,
     // so that the test fails instead of hanging.
-    bool waited = false;
-    std::chrono::milliseconds patience(10000);
-    while (opening.wait_for(patience) != std::future_status::ready) {
-        waited = true;
-        patience = std::chrono::milliseconds(100);
-        int const writer = open(fifo.c_str(), O_WRONLY | O_NONBLOCK | O_CLOEXEC);
-        if (writer >= 0) {
-            close(writer);
-        }
-    }
-    int const result = opening.get();
+    int result = 0;
+    bool const waited = smbiostest::waitedOnFifo(fifo, [&fifo, &file, &result] {
+        result = PlatformUtilities::openFile(fifo.c_str(), &file, 0, 0);
+    });
     EXPECT_FALSE(waited) << "openFile waited for a writer on the FIFO";
     EXPECT_EQ(EINVAL, result);
     EXPECT_EQ(nullptr, file);

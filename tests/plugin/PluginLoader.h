@@ -5,6 +5,7 @@
 
 #include "IC/Error.h"
 #include "IC/ManagementInterface.h"
+#include "TestSupport.h"
 
 namespace plugintest {
 
@@ -13,12 +14,10 @@ std::string pluginPath();
 
 // A loaded plug-in and the interface its OpenMI handed out; unloaded when
 // the object goes (or by unload()).
-class LoadedPlugin {
+class LoadedPlugin : smbiostest::NonCopyable {
 public:
     LoadedPlugin();
     ~LoadedPlugin();
-    LoadedPlugin(LoadedPlugin const&) = delete;
-    LoadedPlugin& operator=(LoadedPlugin const&) = delete;
 
     // Whether dlopen and OpenMI succeeded; error() says why not.
     bool loaded() const { return mi_ != nullptr; }

@@ -27,6 +27,11 @@ protected:
         }
         return bytes;
     }
+    // The library loaded with an image of `bytes` at 0x2000.
+    PMemLibrary& loadImageAt0x2000(std::vector<uint8_t> const& bytes) {
+        env("PMEM_IMAGE", imageItem(file("m.bin", bytes), 0x2000));
+        return load();
+    }
     // `size` zero bytes with `text` at `at`.
     static std::vector<uint8_t> with(size_t size, size_t at, char const* text) {
         std::vector<uint8_t> bytes(size, 0);
@@ -39,9 +44,7 @@ protected:
 
 TEST_F(ImageSource, SmEntryPointInBiosAreaIsFoundAndItsTableIsReadElsewhere) {
     std::vector<uint8_t> const table = pmemtest::sampleTable();
-    std::vector<uint8_t> const ep = pmemtest::smEntryPoint(table, 2, 7, kTableAddress);
-    env("PMEM_IMAGE", imageItem(file("bios.bin", pmemtest::biosArea(ep, kAnchor)), kBiosArea) +
-                          "," + imageItem(file("table.bin", table), kTableAddress));
+    std::vector<uint8_t> const ep = serveSampleImage();
     PMemLibrary& pm = load();
     ASSERT_NE(pm.isInitialized(), 0);
     ASSERT_NE(pm.open(), 0);
@@ -141,8 +144,7 @@ TEST_F(ImageSource, SearchAdvancesByStepAndStopsAfterTheEnd) {
 }
 
 TEST_F(ImageSource, UnalignedAnchorIsNotFoundWithStep16) {
-    env("PMEM_IMAGE", imageItem(file("m.bin", with(64, 4, "_SM_")), 0x2000));
-    PMemLibrary& pm = load();
+    PMemLibrary& pm = loadImageAt0x2000(with(64, 4, "_SM_"));
     ASSERT_NE(pm.isInitialized(), 0);
     EXPECT_EQ(pm.search("_SM_", 0x2000, 0x203F, 16), 0ul);
     EXPECT_EQ(pm.search("_SM_", 0x2000, 0x203F, 4), 0x2004ul);
@@ -150,8 +152,7 @@ TEST_F(ImageSource, UnalignedAnchorIsNotFoundWithStep16) {
 }
 
 TEST_F(ImageSource, AnchorRunningPastTheLastFileDoesNotMatch) {
-    env("PMEM_IMAGE", imageItem(file("m.bin", with(16, 13, "_SM")), 0x2000));
-    PMemLibrary& pm = load();
+    PMemLibrary& pm = loadImageAt0x2000(with(16, 13, "_SM"));
     ASSERT_NE(pm.isInitialized(), 0);
     EXPECT_EQ(pm.search("_SM_", 0x2000, 0x2FFF, 1), 0ul);
     EXPECT_EQ(pm.search("_SM", 0x2000, 0x2FFF, 1), 0x200Dul);
@@ -207,8 +208,7 @@ TEST_F(ImageSource, EmptyFilePresentsNothing) {
 }
 
 TEST_F(ImageSource, OpenAndCloseJustSucceedAndReadsNeedNoOpen) {
-    env("PMEM_IMAGE", imageItem(file("m.bin", counting(4, 1)), 0x2000));
-    PMemLibrary& pm = load();
+    PMemLibrary& pm = loadImageAt0x2000(counting(4, 1));
     ASSERT_NE(pm.isInitialized(), 0);
     unsigned char buffer[4] = {};
     EXPECT_EQ(pm.read(buffer, 0x2000, 4), 0);

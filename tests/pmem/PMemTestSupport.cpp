@@ -151,6 +151,19 @@ std::string PMemTest::file(std::string const& name, std::vector<uint8_t> const& 
     return path;
 }
 
+void PMemTest::serveImage(std::vector<uint8_t> const& entryPoint,
+                          std::vector<uint8_t> const& table) {
+    env("PMEM_IMAGE", imageItem(file("bios.bin", biosArea(entryPoint, kAnchor)), kBiosArea) + "," +
+                          imageItem(file("table.bin", table), kTableAddress));
+}
+
+std::vector<uint8_t> PMemTest::serveSampleImage() {
+    std::vector<uint8_t> const table = sampleTable();
+    std::vector<uint8_t> const ep = smEntryPoint(table, 2, 7, kTableAddress);
+    serveImage(ep, table);
+    return ep;
+}
+
 std::string PMemTest::sysfsFolder(std::vector<uint8_t> const* entryPoint,
                                   std::vector<uint8_t> const* table) {
     std::string const folder = work_.file("sysfs");
@@ -205,23 +218,6 @@ std::vector<uint8_t> smEntryPoint(std::vector<uint8_t> const& table, uint8_t maj
     smbiosdump::TableStats const stats = smbiosdump::tableStats(table);
     return smbiosdump::makeSmEntryPoint(major, minor, static_cast<uint16_t>(table.size()), address,
                                         stats.count, stats.maxSize);
-}
-
-uint8_t byteSum(std::vector<uint8_t> const& bytes, size_t begin, size_t end) {
-    uint8_t sum = 0;
-    for (size_t i = begin; i < end && i < bytes.size(); ++i) {
-        sum = static_cast<uint8_t>(sum + bytes[i]);
-    }
-    return sum;
-}
-
-uint16_t word(std::vector<uint8_t> const& bytes, size_t at) {
-    return static_cast<uint16_t>(bytes.at(at) | (bytes.at(at + 1) << 8));
-}
-
-uint32_t dword(std::vector<uint8_t> const& bytes, size_t at) {
-    return static_cast<uint32_t>(word(bytes, at)) |
-           (static_cast<uint32_t>(word(bytes, at + 2)) << 16);
 }
 
 void putDword(std::vector<uint8_t>& bytes, size_t at, uint32_t value) {

@@ -36,12 +36,10 @@ std::string libraryPath();
 // libpmem.so loaded and its five functions bound, through the contract's
 // binder. When it cannot be loaded or lacks a function the test fails and
 // the functions answer as an unusable library.
-class PMemLibrary {
+class PMemLibrary : smbiostest::NonCopyable {
 public:
     PMemLibrary();
     ~PMemLibrary();
-    PMemLibrary(PMemLibrary const&) = delete;
-    PMemLibrary& operator=(PMemLibrary const&) = delete;
 
     // Whether the library was loaded and its five functions bound.
     bool loaded() const { return functions_.isInitialized != nullptr; }
@@ -112,6 +110,12 @@ protected:
     // A folder holding smbios_entry_point and DMI (each only when given).
     std::string sysfsFolder(std::vector<uint8_t> const* entryPoint,
                             std::vector<uint8_t> const* table);
+    // The memory image (PMEM_IMAGE) of a machine: the BIOS area with
+    // `entryPoint` at kAnchor, and `table` at kTableAddress.
+    void serveImage(std::vector<uint8_t> const& entryPoint, std::vector<uint8_t> const& table);
+    // serveImage of the sample table under a 2.7 "_SM_" entry point; the
+    // entry point.
+    std::vector<uint8_t> serveSampleImage();
     PMemLibrary& load();
 
     smbiostest::TempDir work_;
@@ -145,9 +149,9 @@ std::vector<uint8_t> smEntryPoint(std::vector<uint8_t> const& table, uint8_t maj
 // The 24-byte "_SM3_" entry point, its checksum set.
 using smbiostest::sm3EntryPoint;
 
-uint8_t byteSum(std::vector<uint8_t> const& bytes, size_t begin, size_t end);
-uint16_t word(std::vector<uint8_t> const& bytes, size_t at);
-uint32_t dword(std::vector<uint8_t> const& bytes, size_t at);
+using smbiostest::byteSum;
+using smbiostest::dword;
+using smbiostest::word;
 void putDword(std::vector<uint8_t>& bytes, size_t at, uint32_t value);
 void putQword(std::vector<uint8_t>& bytes, size_t at, uint64_t value);
 // Sets bytes[at] so that the 8-bit sum of bytes[begin, end) is zero.

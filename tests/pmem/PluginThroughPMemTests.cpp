@@ -39,19 +39,22 @@ std::vector<unsigned int> handlesOf(SD::SmBios const& smbios) {
     return handles;
 }
 
+// The plug-in acquired the sample table, of version major.minor, its
+// structures in handle order.
+void expectSampleTable(SD::SmBios const& smbios, int major, int minor) {
+    EXPECT_EQ(smbios.getMajorVersion(), major);
+    EXPECT_EQ(smbios.getMinorVersion(), minor);
+    EXPECT_EQ(handlesOf(smbios),
+              (std::vector<unsigned int>{0x0000, 0x0100, 0x0200, 0x0400, 0x0500}));
+}
+
 }  // namespace
 
 TEST_F(PluginThroughPMem, ReadsTheTableThroughAnImage) {
-    std::vector<uint8_t> const table = pmemtest::sampleTable();
-    std::vector<uint8_t> const ep = pmemtest::smEntryPoint(table, 2, 7, kTableAddress);
-    env("PMEM_IMAGE", imageItem(file("bios.bin", pmemtest::biosArea(ep, kAnchor)), kBiosArea) +
-                          "," + imageItem(file("table.bin", table), kTableAddress));
+    serveSampleImage();
     smbiostest::LogCapture log;
     SD::SmBios smbios;
-    EXPECT_EQ(smbios.getMajorVersion(), 2);
-    EXPECT_EQ(smbios.getMinorVersion(), 7);
-    EXPECT_EQ(handlesOf(smbios),
-              (std::vector<unsigned int>{0x0000, 0x0100, 0x0200, 0x0400, 0x0500}));
+    expectSampleTable(smbios, 2, 7);
     EXPECT_TRUE(log.contains("Constructor found _SM_ header at " + std::to_string(kAnchor)))
         << log.dump();
     EXPECT_TRUE(log.contains("Constructor success")) << log.dump();
@@ -81,10 +84,7 @@ TEST_F(PluginThroughPMem, ReadsA3xTableThroughAFakeSysfsFolder) {
     env("PMEM_SYSFS_DIR", sysfsFolder(&ep, &table));
     smbiostest::LogCapture log;
     SD::SmBios smbios;
-    EXPECT_EQ(smbios.getMajorVersion(), 3);
-    EXPECT_EQ(smbios.getMinorVersion(), 3);
-    EXPECT_EQ(handlesOf(smbios),
-              (std::vector<unsigned int>{0x0000, 0x0100, 0x0200, 0x0400, 0x0500}));
+    expectSampleTable(smbios, 3, 3);
     EXPECT_TRUE(log.contains("Constructor found _SM_ header at " + std::to_string(kBiosArea)))
         << log.dump();
 }
@@ -152,14 +152,6 @@ std::map<std::string, std::vector<uint8_t>> corpusImagesStartingWith(std::string
     return images;
 }
 
-#define REQUIRE_CORPUS()                                                            \
-    do {                                                                            \
-        if (smbiostest::corpusDir().empty()) {                                      \
-            GTEST_SKIP() << "no SMBIOS corpus folder (SMBIOS_CORPUS_DIR); no real " \
-                            "machine's dump to serve";                              \
-        }                                                                           \
-    } while (0)
-
 }  // namespace
 
 // A 2.x dump served as an image at 0: dmidecode's --dump-bin layout puts the
@@ -170,7 +162,7 @@ std::map<std::string, std::vector<uint8_t>> corpusImagesStartingWith(std::string
 // byte (0x1E of the dump), which for some machines differs from the "_SM_"
 // version (a BCD byte of 0 gives 0.0).
 TEST(PluginThroughPMemCorpus, Sm2DumpsServedAsAnImageAtZeroGiveTheOverrideFilesStructures) {
-    REQUIRE_CORPUS();
+    SMBIOS_SKIP_WITHOUT_CORPUS("to serve");
     smbiostest::TempDir work;
     std::map<std::string, std::vector<uint8_t>> const images = corpusImagesStartingWith("_SM_");
     for (auto const& [name, bin] : images) {
@@ -196,7 +188,7 @@ TEST(PluginThroughPMemCorpus, Sm2DumpsServedAsAnImageAtZeroGiveTheOverrideFilesS
 // point's maximum size. The plug-in sees the equivalent "_SM_" entry point
 // and gets the dump's structures and the version dmidecode printed.
 TEST(PluginThroughPMemCorpus, Sm3DumpsServedThroughSysfsGiveTheirStructuresAndVersion) {
-    REQUIRE_CORPUS();
+    SMBIOS_SKIP_WITHOUT_CORPUS("to serve");
     smbiostest::TempDir work;
     std::map<std::string, std::vector<uint8_t>> const images = corpusImagesStartingWith("_SM3_");
     for (auto const& [name, bin] : images) {

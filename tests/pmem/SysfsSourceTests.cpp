@@ -24,8 +24,12 @@ namespace {
 
 class SysfsSource : public pmemtest::PMemTest {
 protected:
-    void serve(std::vector<uint8_t> const& entryPoint, std::vector<uint8_t> const& table) {
+    // The library loaded with the entry point and the table as the kernel's
+    // copies.
+    PMemLibrary& loadServing(std::vector<uint8_t> const& entryPoint,
+                             std::vector<uint8_t> const& table) {
         env("PMEM_SYSFS_DIR", sysfsFolder(&entryPoint, &table));
+        return load();
     }
     // The presented entry point: the 64 bytes read where "_SM_" is found.
     std::vector<uint8_t> presentedSm(PMemLibrary& pm) {
@@ -49,6 +53,20 @@ protected:
         EXPECT_EQ(byteSum(ep, 0x10, 0x1F), 0) << "intermediate checksum";
         EXPECT_EQ(word(ep, 0x16), tableSize);
     }
+    // The sample table under the 3.x entry point `ep3` of version 3.minor
+    // is served at 1 MiB, which the presented "_SM_" entry point names;
+    // with `equivalent`, that is the equivalent entry point.
+    void expectServedAt1MiB(std::vector<uint8_t> const& ep3, uint8_t minor, bool equivalent) {
+        std::vector<uint8_t> const table = pmemtest::sampleTable();
+        PMemLibrary& pm = loadServing(ep3, table);
+        ASSERT_NE(pm.isInitialized(), 0);
+        std::vector<uint8_t> const ep = presentedSm(pm);
+        if (equivalent) {
+            expectEquivalentSm(ep, 3, minor, table.size());
+        }
+        EXPECT_EQ(dword(ep, 0x18), 0x100000u);
+        EXPECT_TRUE(readsBytes(pm, 0x100000, table));
+    }
     // A table of exactly `size` bytes: the sample table, then a structure
     // of type 126 (inactive) whose strings fill the rest.
     static std::vector<uint8_t> tableOfSize(size_t size) {
@@ -68,8 +86,7 @@ protected:
 TEST_F(SysfsSource, SmEntryPointIsPresentedAsItIsAtF0000AndItsTableAtItsAddress) {
     std::vector<uint8_t> const table = pmemtest::sampleTable();
     std::vector<uint8_t> const ep = pmemtest::smEntryPoint(table, 2, 8, kTableAddress);
-    serve(ep, table);
-    PMemLibrary& pm = load();
+    PMemLibrary& pm = loadServing(ep, table);
     ASSERT_NE(pm.isInitialized(), 0);
     ASSERT_NE(pm.open(), 0);
     std::vector<uint8_t> const presented = presentedSm(pm);
@@ -83,8 +100,7 @@ TEST_F(SysfsSource, SmEntryPointIsPresentedAsItIsAtF0000AndItsTableAtItsAddress)
 TEST_F(SysfsSource, SmTableOnTheEntryPointIsMovedAndTheEntryPointSaysWhere) {
     std::vector<uint8_t> const table = pmemtest::sampleTable();
     std::vector<uint8_t> const ep = pmemtest::smEntryPoint(table, 2, 7, 0xF0010);
-    serve(ep, table);
-    PMemLibrary& pm = load();
+    PMemLibrary& pm = loadServing(ep, table);
     ASSERT_NE(pm.isInitialized(), 0);
     std::vector<uint8_t> const presented = presentedSm(pm);
     unsigned long const address = dword(presented, 0x18);
@@ -103,8 +119,7 @@ TEST_F(SysfsSource, SmTableOnTheEntryPointIsMovedAndTheEntryPointSaysWhere) {
 TEST_F(SysfsSource, SmTableInsideTheBiosAreaBesideTheEntryPointStaysWhereItIs) {
     std::vector<uint8_t> const table = pmemtest::sampleTable();
     std::vector<uint8_t> const ep = pmemtest::smEntryPoint(table, 2, 4, 0xF1000);
-    serve(ep, table);
-    PMemLibrary& pm = load();
+    PMemLibrary& pm = loadServing(ep, table);
     ASSERT_NE(pm.isInitialized(), 0);
     EXPECT_EQ(slice(presentedSm(pm), 0, ep.size()), ep);
     EXPECT_TRUE(readsBytes(pm, 0xF1000, table));
@@ -113,8 +128,7 @@ TEST_F(SysfsSource, SmTableInsideTheBiosAreaBesideTheEntryPointStaysWhereItIs) {
 TEST_F(SysfsSource, SmTableRunningOutOfTheBiosAreaIsServedWholeWithIt) {
     std::vector<uint8_t> const table = tableOfSize(0x200);
     std::vector<uint8_t> const ep = pmemtest::smEntryPoint(table, 2, 6, 0xFFF00);
-    serve(ep, table);
-    PMemLibrary& pm = load();
+    PMemLibrary& pm = loadServing(ep, table);
     ASSERT_NE(pm.isInitialized(), 0);
     EXPECT_EQ(slice(presentedSm(pm), 0, ep.size()), ep);
     EXPECT_TRUE(readsBytes(pm, 0xFFF00, table));
@@ -126,8 +140,7 @@ TEST_F(SysfsSource, Sm3EntryPointIsPresentedAsTheEquivalentSmEntryPoint) {
     std::vector<uint8_t> const table = pmemtest::sampleTable();
     smbiosdump::TableStats const stats = smbiosdump::tableStats(table);
     std::vector<uint8_t> const ep3 = pmemtest::sm3EntryPoint(3, 2, 1, 0x10000, kTableAddress);
-    serve(ep3, table);
-    PMemLibrary& pm = load();
+    PMemLibrary& pm = loadServing(ep3, table);
     ASSERT_NE(pm.isInitialized(), 0);
     ASSERT_NE(pm.open(), 0);
     EXPECT_EQ(pm.search("_SM3_", 0xF0000, 0xFFFFF, 16), 0ul);
@@ -142,41 +155,21 @@ TEST_F(SysfsSource, Sm3EntryPointIsPresentedAsTheEquivalentSmEntryPoint) {
 }
 
 TEST_F(SysfsSource, Sm3TableAbove4GiBIsServedAt1MiB) {
-    std::vector<uint8_t> const table = pmemtest::sampleTable();
-    serve(pmemtest::sm3EntryPoint(3, 4, 0, 0x10000, 0x1234560000ull), table);
-    PMemLibrary& pm = load();
-    ASSERT_NE(pm.isInitialized(), 0);
-    std::vector<uint8_t> const ep = presentedSm(pm);
-    expectEquivalentSm(ep, 3, 4, table.size());
-    EXPECT_EQ(dword(ep, 0x18), 0x100000u);
-    EXPECT_TRUE(readsBytes(pm, 0x100000, table));
+    expectServedAt1MiB(pmemtest::sm3EntryPoint(3, 4, 0, 0x10000, 0x1234560000ull), 4, true);
 }
 
 TEST_F(SysfsSource, Sm3TableEndingAbove4GiBIsServedAt1MiB) {
-    std::vector<uint8_t> const table = pmemtest::sampleTable();
-    serve(pmemtest::sm3EntryPoint(3, 0, 0, 0x10000, 0xFFFFFFF0ull), table);
-    PMemLibrary& pm = load();
-    ASSERT_NE(pm.isInitialized(), 0);
-    std::vector<uint8_t> const ep = presentedSm(pm);
-    EXPECT_EQ(dword(ep, 0x18), 0x100000u);
-    EXPECT_TRUE(readsBytes(pm, 0x100000, table));
+    // The presented entry point is looked at for its table address alone.
+    expectServedAt1MiB(pmemtest::sm3EntryPoint(3, 0, 0, 0x10000, 0xFFFFFFF0ull), 0, false);
 }
 
 TEST_F(SysfsSource, Sm3TableOnTheEntryPointIsServedAt1MiB) {
-    std::vector<uint8_t> const table = pmemtest::sampleTable();
-    serve(pmemtest::sm3EntryPoint(3, 1, 1, 0x10000, 0xF0000), table);
-    PMemLibrary& pm = load();
-    ASSERT_NE(pm.isInitialized(), 0);
-    std::vector<uint8_t> const ep = presentedSm(pm);
-    expectEquivalentSm(ep, 3, 1, table.size());
-    EXPECT_EQ(dword(ep, 0x18), 0x100000u);
-    EXPECT_TRUE(readsBytes(pm, 0x100000, table));
+    expectServedAt1MiB(pmemtest::sm3EntryPoint(3, 1, 1, 0x10000, 0xF0000), 1, true);
 }
 
 TEST_F(SysfsSource, Sm3TableOf65535BytesIsServed) {
     std::vector<uint8_t> const table = tableOfSize(0xFFFF);
-    serve(pmemtest::sm3EntryPoint(3, 3, 0, 0x20000, kTableAddress), table);
-    PMemLibrary& pm = load();
+    PMemLibrary& pm = loadServing(pmemtest::sm3EntryPoint(3, 3, 0, 0x20000, kTableAddress), table);
     ASSERT_NE(pm.isInitialized(), 0);
     std::vector<uint8_t> const ep = presentedSm(pm);
     expectEquivalentSm(ep, 3, 3, 0xFFFF);
@@ -194,9 +187,9 @@ TEST_F(SysfsSource, Sm3TableLongerThan65535BytesIsServedAsTheWholeStructuresThat
     // The devices that fit after the head; the 5 head structures before them.
     size_t const devicesServed = (0xFFFF - headSize) / deviceSize;
     size_t const served = headSize + devicesServed * deviceSize;
-    serve(pmemtest::sm3EntryPoint(3, 3, 0, static_cast<uint32_t>(table.size()), kTableAddress),
-          table);
-    PMemLibrary& pm = load();
+    PMemLibrary& pm = loadServing(
+        pmemtest::sm3EntryPoint(3, 3, 0, static_cast<uint32_t>(table.size()), kTableAddress),
+        table);
     ASSERT_NE(pm.isInitialized(), 0) << pm.sourceReport();
     std::vector<uint8_t> const ep = presentedSm(pm);
     expectEquivalentSm(ep, 3, 3, served);
@@ -217,9 +210,9 @@ TEST_F(SysfsSource, Sm3TableJustUnder64KiBIsServedWholeAndNotCut) {
     std::vector<uint8_t> const table = smbiostest::largeServerTable(680);
     ASSERT_GT(table.size(), 60000u);
     ASSERT_LE(table.size(), 0xFFFFu);
-    serve(pmemtest::sm3EntryPoint(3, 3, 0, static_cast<uint32_t>(table.size()), kTableAddress),
-          table);
-    PMemLibrary& pm = load();
+    PMemLibrary& pm = loadServing(
+        pmemtest::sm3EntryPoint(3, 3, 0, static_cast<uint32_t>(table.size()), kTableAddress),
+        table);
     ASSERT_NE(pm.isInitialized(), 0) << pm.sourceReport();
     std::vector<uint8_t> const ep = presentedSm(pm);
     expectEquivalentSm(ep, 3, 3, table.size());
@@ -233,8 +226,7 @@ TEST_F(SysfsSource, LegacyDmiEntryPointIsPresentedAsItIs) {
     std::vector<uint8_t> const table = pmemtest::sampleTable();
     std::vector<uint8_t> const ep =
         smbiosdump::makeDmiEntryPoint(0x21, static_cast<uint16_t>(table.size()), kTableAddress, 5);
-    serve(ep, table);
-    PMemLibrary& pm = load();
+    PMemLibrary& pm = loadServing(ep, table);
     ASSERT_NE(pm.isInitialized(), 0);
     EXPECT_EQ(pm.search("_SM_", 0xF0000, 0xFFFFF, 16), 0ul);
     EXPECT_EQ(pm.search("_DMI_", 0, 0xFFFFF, 16), kBiosArea);
@@ -246,8 +238,7 @@ TEST_F(SysfsSource, LegacyDmiTableOnTheEntryPointIsMovedAndItsChecksumKeptRight)
     std::vector<uint8_t> const table = pmemtest::sampleTable();
     std::vector<uint8_t> const ep =
         smbiosdump::makeDmiEntryPoint(0x21, static_cast<uint16_t>(table.size()), 0xF0008, 5);
-    serve(ep, table);
-    PMemLibrary& pm = load();
+    PMemLibrary& pm = loadServing(ep, table);
     ASSERT_NE(pm.isInitialized(), 0);
     int status = -2;
     std::vector<uint8_t> const presented = pm.bytes(kBiosArea, 15, status);

@@ -5,6 +5,7 @@
 
 #include <cstdint>
 #include <fstream>
+#include <functional>
 #include <regex>
 #include <sstream>
 #include <string>
@@ -44,90 +45,73 @@ Decoding readDecoding(std::string const& path) {
     return decoding;
 }
 
-uint16_t word(std::vector<uint8_t> const& b, size_t at) {
-    return static_cast<uint16_t>(b[at] | (b[at + 1] << 8));
-}
+typedef std::vector<uint8_t> Bytes;
 
-uint8_t sum(std::vector<uint8_t> const& bytes, size_t begin, size_t end) {
-    uint8_t total = 0;
-    for (size_t i = begin; i < end; ++i) {
-        total = static_cast<uint8_t>(total + bytes[i]);
+// Calls `check` on every corpus dump whose entry point is (`sm3`) or is not
+// a "_SM3_" one, under the dump's name, with the path of its files without
+// their endings, the --dump-bin file and the image read from it; fails the
+// test for a dump that does not read. Returns how many were checked.
+size_t forEachImage(bool sm3, std::function<void(std::string const&, Bytes const&,
+                                                 smbiosdump::DumpImage const&)> const& check) {
+    size_t checked = 0;
+    for (std::string const& name : smbiostest::corpusNames()) {
+        SCOPED_TRACE(name);
+        std::string const base = smbiostest::corpusDir() + "/" + name;
+        Bytes const file = smbiostest::fileBytes(base + ".bin");
+        smbiosdump::DumpImage image;
+        std::string error;
+        bool const read = smbiosdump::readDumpBin(file, image, error);
+        EXPECT_TRUE(read) << error;
+        if (read && (image.anchor == "_SM3_") == sm3) {
+            check(base, file, image);
+            ++checked;
+        }
     }
-    return total;
+    return checked;
 }
-
-#define REQUIRE_CORPUS()                                                                    \
-    do {                                                                                    \
-        if (smbiostest::corpusDir().empty()) {                                              \
-            GTEST_SKIP() << "SMBIOS_CORPUS_DIR is unset or not a folder; no real dumps to " \
-                            "read";                                                         \
-        }                                                                                   \
-        ASSERT_FALSE(smbiostest::corpusNames().empty())                                     \
-            << "no .bin dumps in " << smbiostest::corpusDir();                              \
-    } while (0)
 
 }  // namespace
 
 TEST(CorpusDumps, Sm2DumpsMatchDmidecodeStructureCountAndSize) {
-    REQUIRE_CORPUS();
-    int checked = 0;
-    for (std::string const& name : smbiostest::corpusNames()) {
-        SCOPED_TRACE(name);
-        std::string const base = smbiostest::corpusDir() + "/" + name;
-        smbiosdump::DumpImage image;
-        std::string error;
-        ASSERT_TRUE(smbiosdump::readDumpBin(smbiostest::fileBytes(base + ".bin"), image, error))
-            << error;
-        if (image.anchor == "_SM3_") {
-            continue;
-        }
-        Decoding const decoding = readDecoding(base + ".orig.txt");
-        ASSERT_TRUE(decoding.hasSummary) << "no 'N structures occupying M bytes.' line";
-        EXPECT_EQ(image.anchor, "_SM_");
-        EXPECT_EQ(word(image.header, 0x1C), decoding.structures);
-        EXPECT_EQ(smbiosdump::tableStats(image.table).count, decoding.structures);
-        EXPECT_EQ(image.table.size(), decoding.bytes);
-        EXPECT_EQ(decoding.handles, decoding.structures);
-        ++checked;
-    }
-    EXPECT_GT(checked, 0) << "the corpus holds no 2.x dump";
+    SMBIOS_REQUIRE_CORPUS("to read");
+    size_t const checked = forEachImage(
+        false, [](std::string const& base, Bytes const&, smbiosdump::DumpImage const& image) {
+            Decoding const decoding = readDecoding(base + ".orig.txt");
+            ASSERT_TRUE(decoding.hasSummary) << "no 'N structures occupying M bytes.' line";
+            EXPECT_EQ(image.anchor, "_SM_");
+            EXPECT_EQ(smbiostest::word(image.header, 0x1C), decoding.structures);
+            EXPECT_EQ(smbiosdump::tableStats(image.table).count, decoding.structures);
+            EXPECT_EQ(image.table.size(), decoding.bytes);
+            EXPECT_EQ(decoding.handles, decoding.structures);
+        });
+    EXPECT_GT(checked, 0u) << "the corpus holds no 2.x dump";
 }
 
 TEST(CorpusDumps, Sm3DumpsConvertWithDmidecodeStructureCount) {
-    REQUIRE_CORPUS();
-    int checked = 0;
-    for (std::string const& name : smbiostest::corpusNames()) {
-        SCOPED_TRACE(name);
-        std::string const base = smbiostest::corpusDir() + "/" + name;
-        std::vector<uint8_t> const file = smbiostest::fileBytes(base + ".bin");
-        smbiosdump::DumpImage image;
-        std::string error;
-        ASSERT_TRUE(smbiosdump::readDumpBin(file, image, error)) << error;
-        if (image.anchor != "_SM3_") {
-            continue;
-        }
-        // dmidecode states no summary line for these: count its decoded
-        // structures. The table may run on past the end-of-table structure;
-        // tableStats counts up to and including it.
-        Decoding const decoding = readDecoding(base + ".orig.txt");
-        ASSERT_GT(decoding.handles, 0u);
-        smbiosdump::TableStats const stats = smbiosdump::tableStats(image.table);
-        EXPECT_EQ(stats.count, decoding.handles);
-        ASSERT_EQ(image.header.size(), 31u);
-        EXPECT_EQ(word(image.header, 0x1C), decoding.handles);
-        EXPECT_EQ(word(image.header, 0x08), stats.maxSize);
-        EXPECT_EQ(word(image.header, 0x16), image.table.size());
-        EXPECT_EQ(sum(image.header, 0, 0x1F), 0);
-        EXPECT_EQ(sum(image.header, 0x10, 0x1F), 0);
-        EXPECT_EQ(image.header[6], file[7]);
-        EXPECT_EQ(image.header[7], file[8]);
-        ++checked;
-    }
-    EXPECT_GT(checked, 0) << "the corpus holds no _SM3_ dump";
+    SMBIOS_REQUIRE_CORPUS("to read");
+    size_t const checked = forEachImage(
+        true, [](std::string const& base, Bytes const& file, smbiosdump::DumpImage const& image) {
+            // dmidecode states no summary line for these: count its decoded
+            // structures. The table may run on past the end-of-table structure;
+            // tableStats counts up to and including it.
+            Decoding const decoding = readDecoding(base + ".orig.txt");
+            ASSERT_GT(decoding.handles, 0u);
+            smbiosdump::TableStats const stats = smbiosdump::tableStats(image.table);
+            EXPECT_EQ(stats.count, decoding.handles);
+            ASSERT_EQ(image.header.size(), 31u);
+            EXPECT_EQ(smbiostest::word(image.header, 0x1C), decoding.handles);
+            EXPECT_EQ(smbiostest::word(image.header, 0x08), stats.maxSize);
+            EXPECT_EQ(smbiostest::word(image.header, 0x16), image.table.size());
+            EXPECT_EQ(smbiostest::byteSum(image.header, 0, 0x1F), 0);
+            EXPECT_EQ(smbiostest::byteSum(image.header, 0x10, 0x1F), 0);
+            EXPECT_EQ(image.header[6], file[7]);
+            EXPECT_EQ(image.header[7], file[8]);
+        });
+    EXPECT_GT(checked, 0u) << "the corpus holds no _SM3_ dump";
 }
 
 TEST(CorpusDumps, EveryDumpSurvivesOverrideRoundTrip) {
-    REQUIRE_CORPUS();
+    SMBIOS_REQUIRE_CORPUS("to read");
     for (std::string const& name : smbiostest::corpusNames()) {
         SCOPED_TRACE(name);
         smbiosdump::DumpImage image;

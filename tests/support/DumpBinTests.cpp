@@ -11,18 +11,11 @@
 
 using smbiosdump::DumpImage;
 using smbiosdump::readDumpBin;
+using smbiostest::byteSum;
 using smbiostest::Structure;
 using smbiostest::TableBuilder;
 
 namespace {
-
-uint8_t sum(std::vector<uint8_t> const& bytes, size_t begin, size_t end) {
-    uint8_t total = 0;
-    for (size_t i = begin; i < end; ++i) {
-        total = static_cast<uint8_t>(total + bytes[i]);
-    }
-    return total;
-}
 
 std::vector<uint8_t> sampleTable() {
     TableBuilder table;
@@ -48,6 +41,30 @@ std::vector<uint8_t> sm3EntryPoint(uint8_t major, uint8_t minor, uint32_t maxSiz
     return smbiostest::sm3EntryPoint(major, minor, 1, maxSize, address);
 }
 
+// readDumpBin reads the file as an image of the entry point `header` with
+// the anchor, the table and the version major.minor.
+::testing::AssertionResult readsImage(std::vector<uint8_t> const& file, std::string const& anchor,
+                                      std::vector<uint8_t> const& header,
+                                      std::vector<uint8_t> const& table, int major, int minor) {
+    DumpImage out;
+    std::string error;
+    if (!readDumpBin(file, out, error)) {
+        return ::testing::AssertionFailure() << "refused: " << error;
+    }
+    if (out.anchor != anchor || out.header != header || out.table != table) {
+        return ::testing::AssertionFailure()
+               << "read an image of anchor " << out.anchor << ", " << out.header.size()
+               << " header bytes and " << out.table.size() << " table bytes; expected " << anchor
+               << ", " << header.size() << " and " << table.size();
+    }
+    if (out.major != major || out.minor != minor) {
+        return ::testing::AssertionFailure()
+               << "read version " << int(out.major) << "." << int(out.minor) << ", expected "
+               << major << "." << minor;
+    }
+    return ::testing::AssertionSuccess();
+}
+
 // Expects readDumpBin to refuse the file with a message containing `what`,
 // leaving the output untouched.
 void expectRefused(std::vector<uint8_t> const& file, std::string const& what) {
@@ -67,14 +84,7 @@ TEST(ReadDumpBin, ReadsSmImage) {
     std::vector<uint8_t> const table = sampleTable();
     std::vector<uint8_t> const header =
         smbiosdump::makeSmEntryPoint(2, 7, static_cast<uint16_t>(table.size()), 0x20, 4, 40);
-    DumpImage out;
-    std::string error;
-    ASSERT_TRUE(readDumpBin(image(header, table), out, error)) << error;
-    EXPECT_EQ(out.anchor, "_SM_");
-    EXPECT_EQ(out.header, header);
-    EXPECT_EQ(out.table, table);
-    EXPECT_EQ(out.major, 2);
-    EXPECT_EQ(out.minor, 7);
+    EXPECT_TRUE(readsImage(image(header, table), "_SM_", header, table, 2, 7));
 }
 
 TEST(ReadDumpBin, SmImageTableIsTakenAtStatedAddressAndLength) {
@@ -107,14 +117,7 @@ TEST(ReadDumpBin, ReadsLegacyDmiImage) {
     std::vector<uint8_t> const table = sampleTable();
     std::vector<uint8_t> const header =
         smbiosdump::makeDmiEntryPoint(0x21, static_cast<uint16_t>(table.size()), 0x20, 4);
-    DumpImage out;
-    std::string error;
-    ASSERT_TRUE(readDumpBin(image(header, table), out, error)) << error;
-    EXPECT_EQ(out.anchor, "_DMI_");
-    EXPECT_EQ(out.header, header);
-    EXPECT_EQ(out.table, table);
-    EXPECT_EQ(out.major, 2);
-    EXPECT_EQ(out.minor, 1);
+    EXPECT_TRUE(readsImage(image(header, table), "_DMI_", header, table, 2, 1));
 }
 
 TEST(ReadDumpBin, Sm3ImageGetsEquivalentSmHeader) {
@@ -133,8 +136,8 @@ TEST(ReadDumpBin, Sm3ImageGetsEquivalentSmHeader) {
     EXPECT_EQ(out.header, smbiosdump::makeSmEntryPoint(3, 2, static_cast<uint16_t>(table.size()),
                                                        0x20, stats.count, stats.maxSize));
     EXPECT_EQ(std::string(out.header.begin(), out.header.begin() + 4), "_SM_");
-    EXPECT_EQ(sum(out.header, 0, out.header[5]), 0);
-    EXPECT_EQ(sum(out.header, 0x10, 0x1F), 0);
+    EXPECT_EQ(byteSum(out.header, 0, out.header[5]), 0);
+    EXPECT_EQ(byteSum(out.header, 0x10, 0x1F), 0);
     EXPECT_EQ(out.header[6], 3);
     EXPECT_EQ(out.header[7], 2);
     EXPECT_EQ(out.header[0x1E], 0x32);

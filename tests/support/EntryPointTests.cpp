@@ -6,29 +6,13 @@
 
 #include "DumpFormat.h"
 #include "TableBuilder.h"
+#include "TestSupport.h"
 
+using smbiostest::byteSum;
+using smbiostest::dword;
 using smbiostest::Structure;
 using smbiostest::TableBuilder;
-
-namespace {
-
-uint8_t sum(std::vector<uint8_t> const& bytes, size_t begin, size_t end) {
-    uint8_t total = 0;
-    for (size_t i = begin; i < end; ++i) {
-        total = static_cast<uint8_t>(total + bytes[i]);
-    }
-    return total;
-}
-
-uint16_t word(std::vector<uint8_t> const& b, size_t at) {
-    return static_cast<uint16_t>(b[at] | (b[at + 1] << 8));
-}
-
-uint32_t dword(std::vector<uint8_t> const& b, size_t at) {
-    return static_cast<uint32_t>(word(b, at)) | (static_cast<uint32_t>(word(b, at + 2)) << 16);
-}
-
-}  // namespace
+using smbiostest::word;
 
 TEST(SmEntryPoint, FieldsLandAtTheirOffsets) {
     std::vector<uint8_t> const ep =
@@ -55,8 +39,8 @@ TEST(SmEntryPoint, BothChecksumsSumToZero) {
         for (uint32_t address : {0x00000020u, 0x000F0000u, 0xFFFFFFFFu}) {
             std::vector<uint8_t> const ep =
                 smbiosdump::makeSmEntryPoint(2, 8, length, address, 27, 276);
-            EXPECT_EQ(sum(ep, 0, ep[5]), 0) << length << " " << address;
-            EXPECT_EQ(sum(ep, 0x10, 0x1F), 0) << length << " " << address;
+            EXPECT_EQ(byteSum(ep, 0, ep[5]), 0) << length << " " << address;
+            EXPECT_EQ(byteSum(ep, 0x10, 0x1F), 0) << length << " " << address;
         }
     }
 }
@@ -67,7 +51,7 @@ TEST(SmEntryPoint, BcdRevisionIsZeroWhenMajorOrMinorAboveNine) {
     EXPECT_EQ(smbiosdump::makeSmEntryPoint(2, 10, 1, 0, 1, 1)[0x1E], 0);
     EXPECT_EQ(smbiosdump::makeSmEntryPoint(10, 0, 1, 0, 1, 1)[0x1E], 0);
     std::vector<uint8_t> const ep = smbiosdump::makeSmEntryPoint(2, 10, 1, 0, 1, 1);
-    EXPECT_EQ(sum(ep, 0, 0x1F), 0);
+    EXPECT_EQ(byteSum(ep, 0, 0x1F), 0);
 }
 
 TEST(DmiEntryPoint, FieldsLandAtTheirOffsetsAndChecksumSumsToZero) {
@@ -78,7 +62,7 @@ TEST(DmiEntryPoint, FieldsLandAtTheirOffsetsAndChecksumSumsToZero) {
     EXPECT_EQ(dword(ep, 8), 0x000E8000u);
     EXPECT_EQ(word(ep, 12), 42);
     EXPECT_EQ(ep[14], 0x21);
-    EXPECT_EQ(sum(ep, 0, 15), 0);
+    EXPECT_EQ(byteSum(ep, 0, 15), 0);
 }
 
 TEST(TableStats, CountsStructuresAndFindsLargestOnBuiltTable) {

@@ -1,14 +1,18 @@
 #include "TestSupport.h"
 
 #include <dirent.h>
+#include <fcntl.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
 #include <algorithm>
 #include <cerrno>
+#include <chrono>
 #include <cstdlib>
 #include <cstring>
 #include <filesystem>
 #include <fstream>
+#include <future>
 #include <iterator>
 #include <regex>
 #include <sstream>
@@ -186,6 +190,24 @@ std::vector<std::string> commandLine(std::string const& program,
     return line;
 }
 
+bool waitedOnFifo(std::string const& fifo, std::function<void()> const& work) {
+    std::future<void> working = std::async(std::launch::async, work);
+    bool waited = false;
+    std::chrono::milliseconds patience(10000);
+    while (working.wait_for(patience) != std::future_status::ready) {
+        waited = true;
+        patience = std::chrono::milliseconds(100);
+        for (int side : {O_RDONLY, O_WRONLY}) {
+            int const fd = ::open(fifo.c_str(), side | O_NONBLOCK | O_CLOEXEC);
+            if (fd >= 0) {
+                ::close(fd);
+            }
+        }
+    }
+    working.get();
+    return waited;
+}
+
 std::vector<std::string> corpusNames() {
     std::vector<std::string> names;
     std::string const dir = corpusDir();
@@ -207,6 +229,23 @@ std::vector<std::string> corpusNames() {
     ::closedir(handle);
     std::sort(names.begin(), names.end());
     return names;
+}
+
+uint8_t byteSum(std::vector<uint8_t> const& bytes, size_t begin, size_t end) {
+    uint8_t sum = 0;
+    for (size_t i = begin; i < end && i < bytes.size(); ++i) {
+        sum = static_cast<uint8_t>(sum + bytes[i]);
+    }
+    return sum;
+}
+
+uint16_t word(std::vector<uint8_t> const& bytes, size_t at) {
+    return static_cast<uint16_t>(bytes.at(at) | (bytes.at(at + 1) << 8));
+}
+
+uint32_t dword(std::vector<uint8_t> const& bytes, size_t at) {
+    return static_cast<uint32_t>(word(bytes, at)) |
+           (static_cast<uint32_t>(word(bytes, at + 2)) << 16);
 }
 
 void writeOverrideDir(std::string const& dataDir, std::vector<uint8_t> const& header,

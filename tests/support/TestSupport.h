@@ -5,6 +5,7 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <functional>
 #include <string>
 #include <vector>
 
@@ -22,14 +23,25 @@ void writeFile(std::string const& path, std::vector<uint8_t> const& bytes);
 void writeFile(std::string const& path, std::string const& text);
 void writeFile(std::string const& path, char const* text);
 
+// The base of an object that holds something only it may give back (a
+// folder, a setting, a capture, a loaded library): neither copied nor
+// assigned.
+class NonCopyable {
+public:
+    NonCopyable(NonCopyable const&) = delete;
+    NonCopyable& operator=(NonCopyable const&) = delete;
+
+protected:
+    NonCopyable() = default;
+    ~NonCopyable() = default;
+};
+
 // A private folder under $TMPDIR (or /tmp), removed with everything in it
 // when the object goes. path() has no trailing '/'.
-class TempDir {
+class TempDir : NonCopyable {
 public:
     TempDir();
     ~TempDir();
-    TempDir(TempDir const&) = delete;
-    TempDir& operator=(TempDir const&) = delete;
 
     std::string const& path() const { return path_; }
     // path() + "/" + name
@@ -41,13 +53,11 @@ private:
 
 // Sets an environment variable for the object's lifetime, then restores its
 // previous value or unsets it again. A null value unsets it meanwhile.
-class ScopedEnv {
+class ScopedEnv : NonCopyable {
 public:
     ScopedEnv(std::string const& name, char const* value);
     ScopedEnv(std::string const& name, std::string const& value);
     ~ScopedEnv();
-    ScopedEnv(ScopedEnv const&) = delete;
-    ScopedEnv& operator=(ScopedEnv const&) = delete;
 
 private:
     std::string name_;
@@ -57,12 +67,10 @@ private:
 
 // Captures every log and trace message while it lives (QNLog's in-memory
 // capture, cleared when it starts).
-class LogCapture {
+class LogCapture : NonCopyable {
 public:
     LogCapture();
     ~LogCapture();
-    LogCapture(LogCapture const&) = delete;
-    LogCapture& operator=(LogCapture const&) = delete;
 
     // Whether any captured message's text contains `text`.
     bool contains(std::string const& text) const;
@@ -85,6 +93,23 @@ std::vector<std::string> corpusNames();
 // false when the file has no such line.
 bool dmidecodeVersion(std::string const& name, unsigned int& major, unsigned int& minor);
 
+// In a test: skips it when there is no corpus folder, saying that there are
+// no real dumps for `purpose` ("to read"). The second also fails it when the
+// folder holds no dump.
+#define SMBIOS_SKIP_WITHOUT_CORPUS(purpose)                                              \
+    do {                                                                                 \
+        if (smbiostest::corpusDir().empty()) {                                           \
+            GTEST_SKIP() << "SMBIOS_CORPUS_DIR is unset or not a folder; no real dumps " \
+                         << purpose;                                                     \
+        }                                                                                \
+    } while (0)
+#define SMBIOS_REQUIRE_CORPUS(purpose)                         \
+    do {                                                       \
+        SMBIOS_SKIP_WITHOUT_CORPUS(purpose);                   \
+        ASSERT_FALSE(smbiostest::corpusNames().empty())        \
+            << "no .bin dumps in " << smbiostest::corpusDir(); \
+    } while (0)
+
 // The names in a folder (without "." and ".."), sorted; empty when it cannot
 // be read.
 std::vector<std::string> folderEntries(std::string const& folder);
@@ -94,6 +119,21 @@ std::vector<std::string> folderEntries(std::string const& folder);
 // on a kernel that cannot run it), that program first.
 std::vector<std::string> commandLine(std::string const& program,
                                      std::vector<std::string> const& args);
+
+// Runs `work` on a thread of its own. Should it still run after 10 s, it is
+// taken to wait on the FIFO `fifo`: the FIFO is then opened from both sides
+// and closed again, every 100 ms until the work ends, which releases a
+// reader waiting for a writer and a writer waiting for a reader. Returns
+// whether that was needed, so that a test fails instead of hanging.
+bool waitedOnFifo(std::string const& fifo, std::function<void()> const& work);
+
+// The 8-bit sum of bytes[begin, end) (as far as the bytes go): 0 over a
+// structure whose checksum is right.
+uint8_t byteSum(std::vector<uint8_t> const& bytes, size_t begin, size_t end);
+// The little-endian word and double word at `at`; std::out_of_range past
+// the end.
+uint16_t word(std::vector<uint8_t> const& bytes, size_t at);
+uint32_t dword(std::vector<uint8_t> const& bytes, size_t at);
 
 // Writes dataDir/SmBiosOverride/smbios.txt (creating the folder) with the
 // override text of the entry point and table. dataDir may end with '/'.
