@@ -20,6 +20,7 @@
 #include <string>
 #include <vector>
 
+#include "HostFixture.h"
 #include "HostRunner.h"
 #include "InventoryJson.h"
 #include "TestSupport.h"
@@ -35,15 +36,8 @@ bool updating() {
     return update != nullptr && std::string(update) == "1";
 }
 
-class DemoGolden : public ::testing::Test {
+class DemoGolden : public hosttest::BuiltProgramsTest {
 protected:
-    void SetUp() override {
-        ASSERT_FALSE(hosttest::outDir().empty())
-            << "SMBIOS_OUT_DIR is not set; run the tests through ctest";
-        ASSERT_FALSE(hosttest::sourceDir().empty())
-            << "SMBIOS_SOURCE_DIR is not set; run the tests through ctest";
-    }
-
     // The host's JSON of the example with the processor probes and the BMC,
     // its clock values masked.
     std::string maskedDemoInventory() {

@@ -13,6 +13,7 @@
 #include <string>
 #include <vector>
 
+#include "HostFixture.h"
 #include "HostRunner.h"
 #include "IC/MutableNode.h"
 #include "IC/PropertyValue.h"
@@ -158,15 +159,8 @@ std::vector<PageNode> pageNodes(std::string const& html) {
     return nodes;
 }
 
-class HtmlPageHost : public ::testing::Test {
+class HtmlPageHost : public hosttest::BuiltProgramsTest {
 protected:
-    void SetUp() override {
-        ASSERT_FALSE(hosttest::outDir().empty())
-            << "SMBIOS_OUT_DIR is not set; run the tests through ctest";
-        ASSERT_FALSE(hosttest::sourceDir().empty())
-            << "SMBIOS_SOURCE_DIR is not set; run the tests through ctest";
-    }
-
     // The host's output in a format; fails the test when the run fails.
     static std::string output(std::vector<std::string> args, char const* format) {
         args.insert(args.end(), {"--format", format});

@@ -14,6 +14,7 @@
 #include <vector>
 
 #include "DmidecodeText.h"
+#include "HostFixture.h"
 #include "HostRunner.h"
 #include "IC/MutableNode.h"
 #include "IC/Number.h"
@@ -70,15 +71,8 @@ std::string valueOf(Lines const& lines, std::string const& label) {
     return values.empty() ? "<no line '" + label + "'>" : values.front();
 }
 
-class SummaryHost : public ::testing::Test {
+class SummaryHost : public hosttest::BuiltProgramsTest {
 protected:
-    void SetUp() override {
-        ASSERT_FALSE(hosttest::outDir().empty())
-            << "SMBIOS_OUT_DIR is not set; run the tests through ctest";
-        ASSERT_FALSE(hosttest::sourceDir().empty())
-            << "SMBIOS_SOURCE_DIR is not set; run the tests through ctest";
-    }
-
     // The host's summary; fails the test when the run fails.
     std::string summary(std::vector<std::string> args) {
         args.insert(args.end(), {"--format", "summary"});
