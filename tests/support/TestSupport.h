@@ -116,7 +116,8 @@ std::vector<std::string> folderEntries(std::string const& folder);
 
 // The command line that starts PROGRAM with ARGS in a test: PROGRAM first,
 // or, when SMBIOS_TEST_EMULATOR names a program (qemu-i386 for a 32-bit build
-// on a kernel that cannot run it), that program first.
+// on a kernel that cannot run it), that program first, unless PROGRAM is
+// one of the system's own (under /bin, /sbin or /usr).
 std::vector<std::string> commandLine(std::string const& program,
                                      std::vector<std::string> const& args);
 
