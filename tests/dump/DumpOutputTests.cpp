@@ -195,21 +195,32 @@ TEST(DumpWrite, MissingFolderIsAnError) {
     EXPECT_TRUE(dumptest::folderEntries(dir.path()).empty());
 }
 
+// The write runs in a child as an unprivileged user (nobody when this
+// process is root, since root may write anywhere), which answers with one
+// of these.
+enum UnwritableOutcome { kFailedAndSaidWhere = 0, kDidNotFail = 1, kSaidSomethingElse = 2 };
+
 TEST(DumpWrite, UnwritableFolderLeavesNothing) {
     TempDir dir;
+    ASSERT_EQ(chmod(dir.path().c_str(), 0755), 0);
     std::string const folder = dir.file("locked");
     ASSERT_EQ(mkdir(folder.c_str(), 0555), 0);
-    if (access(folder.c_str(), W_OK) == 0) {
-        chmod(folder.c_str(), 0755);
-        GTEST_SKIP() << "this process may write into a read-only folder (it runs as root)";
-    }
-    std::string error;
-    WriteResult const result =
-        smbiosdump::writeFileAtomically(folder + "/smbios.txt", "x", false, error);
+    int const outcome = smbiostest::runAsUnprivilegedUser([&folder] {
+        std::string error;
+        if (smbiosdump::writeFileAtomically(folder + "/smbios.txt", "x", false, error) !=
+            WriteResult::FAILED) {
+            return kDidNotFail;
+        }
+        return error.find("cannot create a temporary file in " + folder) != std::string::npos
+                   ? kFailedAndSaidWhere
+                   : kSaidSomethingElse;
+    });
     chmod(folder.c_str(), 0755);
-    EXPECT_EQ(result, WriteResult::FAILED);
-    EXPECT_NE(error.find("cannot create a temporary file in " + folder), std::string::npos)
-        << error;
+    if (outcome == smbiostest::kNoUnprivilegedUser) {
+        GTEST_SKIP() << "running as root, this process cannot become nobody here";
+    }
+    EXPECT_EQ(outcome, kFailedAndSaidWhere)
+        << "1: the write did not fail; 2: its message does not name the folder";
     EXPECT_TRUE(dumptest::folderEntries(folder).empty());
 }
 

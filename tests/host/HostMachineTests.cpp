@@ -140,7 +140,7 @@ TEST(DumpOnThisMachine, NoSourceAtAllSaysWhyForEachSourceAndExits1) {
 }
 
 // An ordinary user on a server: the kernel's tables are there but root's
-// only. As root the host runs as nobody (setpriv), as anyone else as itself.
+// only. As root the host runs as nobody, as anyone else as itself.
 TEST(HostOnThisMachine, TablesOnlyRootMayReadArePermissionDenied) {
     Machine machine;
     machine.sysfsTables(smbiostest::largeServerTable(4));
@@ -148,24 +148,10 @@ TEST(HostOnThisMachine, TablesOnlyRootMayReadArePermissionDenied) {
     ASSERT_EQ(::chmod((machine.sysfs() + "/DMI").c_str(), 0), 0);
     ASSERT_EQ(::chmod(machine.sysfs().c_str(), 0755), 0);
     ASSERT_EQ(::chmod(machine.scratch().path().c_str(), 0755), 0);
-    hosttest::RunResult run;
-    if (::geteuid() == 0) {
-        if (::access("/usr/bin/setpriv", X_OK) != 0) {
-            GTEST_SKIP() << "running as root without setpriv to become an unprivileged user";
-        }
-        // setpriv starts the host itself, so the host's own command line
-        // (with the emulator in front in a 32-bit build on a 64-bit-only
-        // kernel) follows setpriv's options.
-        std::vector<std::string> args = {"--reuid=65534", "--regid=65534", "--clear-groups"};
-        for (std::string const& part : smbiostest::commandLine(hosttest::hostPath(), {})) {
-            args.push_back(part);
-        }
-        run = hosttest::runProgram("/usr/bin/setpriv", args, machine.env());
-        if (run.exitStatus != 1 && run.err.find("setpriv") != std::string::npos) {
-            GTEST_SKIP() << "cannot become nobody here: " << run.err;
-        }
-    } else {
-        run = hosttest::runHost({}, machine.env());
+    hosttest::RunResult const run =
+        hosttest::runProgramUnprivileged(hosttest::hostPath(), {}, machine.env());
+    if (!run.startError.empty()) {
+        GTEST_SKIP() << run.startError;
     }
     EXPECT_EQ(run.exitStatus, 1) << hosttest::describe(run);
     EXPECT_NE(run.err.find("smbios-inventory:   sysfs: " + machine.sysfs() +

@@ -183,6 +183,32 @@ RunResult runProgramWithin(std::string const& program, std::vector<std::string> 
     return runChild(program, args, environment, 0, std::function<bool()>(), seconds);
 }
 
+RunResult runProgramUnprivileged(std::string const& program, std::vector<std::string> const& args,
+                                 Environment const& environment) {
+    if (::geteuid() != 0) {
+        return runProgram(program, args, environment);
+    }
+    char const setpriv[] = "/usr/bin/setpriv";
+    if (::access(setpriv, X_OK) != 0) {
+        RunResult missing;
+        missing.startError =
+            std::string("running as root without ") + setpriv + " to become an unprivileged user";
+        return missing;
+    }
+    // setpriv starts the program itself, so the program's own command line
+    // (with the emulator in front in a 32-bit build on a 64-bit-only kernel)
+    // follows setpriv's options.
+    std::vector<std::string> line = {"--reuid=65534", "--regid=65534", "--clear-groups"};
+    for (std::string const& part : smbiostest::commandLine(program, args)) {
+        line.push_back(part);
+    }
+    RunResult run = runProgram(setpriv, line, environment);
+    if (run.startError.empty() && run.err.rfind("setpriv: ", 0) == 0) {
+        run.startError = "cannot become nobody here: " + run.err;
+    }
+    return run;
+}
+
 RunResult runHost(std::vector<std::string> const& args, Environment const& environment) {
     return runProgram(hostPath(), args, environment);
 }

@@ -57,6 +57,14 @@ RunResult runProgramAndSignal(std::string const& program, std::vector<std::strin
 RunResult runProgramWithin(std::string const& program, std::vector<std::string> const& args,
                            Environment const& environment, double seconds);
 
+// Runs program with args as an unprivileged user, to whom files and folders
+// that only root may use are closed as to an ordinary user: as this
+// process's user when it is not root, else as "nobody" (65534) through
+// setpriv. When this process is root and cannot become nobody (no setpriv,
+// or setpriv refused), nothing of the program ran and startError says why.
+RunResult runProgramUnprivileged(std::string const& program, std::vector<std::string> const& args,
+                                 Environment const& environment = Environment());
+
 // Runs the built smbios-inventory.
 RunResult runHost(std::vector<std::string> const& args,
                   Environment const& environment = Environment());

@@ -1,18 +1,14 @@
 #include "PMemTestSupport.h"
 
-#include <grp.h>
-#include <signal.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
 #include <cerrno>
-#include <chrono>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
 #include <sstream>
-#include <thread>
 
 namespace pmemtest {
 
@@ -81,54 +77,6 @@ std::vector<uint8_t> PMemLibrary::bytes(unsigned long address, size_t n, int& st
                << "the " << expected.size() << " bytes at " << hex(address) << " differ";
     }
     return ::testing::AssertionSuccess();
-}
-
-int runInChild(std::function<int()> const& body, unsigned seconds) {
-    std::fflush(stdout);
-    std::fflush(stderr);
-    pid_t const pid = ::fork();
-    if (pid < 0) {
-        return kChildFailed;
-    }
-    if (pid == 0) {
-        int result = 255;
-        try {
-            result = body();
-        } catch (...) {
-        }
-        ::_exit(result & 0xFF);
-    }
-    auto const deadline = std::chrono::steady_clock::now() + std::chrono::seconds(seconds);
-    int status = 0;
-    for (;;) {
-        pid_t const ended = ::waitpid(pid, &status, WNOHANG);
-        if (ended == pid) {
-            return WIFEXITED(status) ? WEXITSTATUS(status) : kChildFailed;
-        }
-        if (ended < 0 && errno != EINTR) {
-            return kChildFailed;
-        }
-        if (std::chrono::steady_clock::now() >= deadline) {
-            ::kill(pid, SIGKILL);
-            while (::waitpid(pid, &status, 0) < 0 && errno == EINTR) {
-            }
-            return kChildHung;
-        }
-        std::this_thread::sleep_for(std::chrono::milliseconds(10));
-    }
-}
-
-int runAsUnprivilegedUser(std::function<int()> const& body) {
-    return runInChild([&body] {
-        if (::geteuid() == 0) {
-            uid_t const nobody = 65534;
-            if (::setgroups(0, nullptr) != 0 || ::setgid(nobody) != 0 || ::setuid(nobody) != 0 ||
-                ::geteuid() == 0) {
-                return kNoUnprivilegedUser;
-            }
-        }
-        return body();
-    });
 }
 
 int isInitializedInChild() {

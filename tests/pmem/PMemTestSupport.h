@@ -66,28 +66,13 @@ private:
 ::testing::AssertionResult readsBytes(PMemLibrary const& pm, unsigned long address,
                                       std::vector<uint8_t> const& expected);
 
-// What runInChild returns when the child did not exit by itself.
-constexpr int kChildHung = -1;    // still running when its time was up: killed
-constexpr int kChildFailed = -2;  // not started, or ended by a signal
-// The time a child gets: far more than loading the library ever takes, so
-// that only a child that waits for something that never comes runs out.
-constexpr unsigned kChildSeconds = 10;
-
-// Runs body in a child process (which has this process's environment and
-// sees the files made so far) and returns its result as the child's exit
-// status (0-255), or kChildHung or kChildFailed. The guard of the tests
-// that, should the library regress, would wait forever (a FIFO opened for
-// reading waits for a writer): the child is killed instead.
-int runInChild(std::function<int()> const& body, unsigned seconds = kChildSeconds);
-
-// What runAsUnprivilegedUser returns when this process, running as root,
-// cannot become the unprivileged user "nobody" (65534).
-constexpr int kNoUnprivilegedUser = 77;
-
-// runInChild, with the child running as an unprivileged user: as this
-// process's user when it is not root, else as "nobody", to whom files that
-// only root may read are unreadable as they are to an ordinary user.
-int runAsUnprivilegedUser(std::function<int()> const& body);
+// Children of a test, from the shared test support.
+using smbiostest::kChildFailed;
+using smbiostest::kChildHung;
+using smbiostest::kChildSeconds;
+using smbiostest::kNoUnprivilegedUser;
+using smbiostest::runAsUnprivilegedUser;
+using smbiostest::runInChild;
 
 // What isInitializedInChild returns when the library could not be loaded.
 constexpr int kNotLoaded = 3;

@@ -2,12 +2,16 @@
 
 #include <dirent.h>
 #include <fcntl.h>
+#include <grp.h>
+#include <signal.h>
 #include <sys/stat.h>
+#include <sys/wait.h>
 #include <unistd.h>
 
 #include <algorithm>
 #include <cerrno>
 #include <chrono>
+#include <cstdio>
 #include <cstdlib>
 #include <cstring>
 #include <filesystem>
@@ -18,6 +22,7 @@
 #include <sstream>
 #include <stdexcept>
 #include <system_error>
+#include <thread>
 
 #include "QNLog/QNLogger.h"
 
@@ -192,6 +197,54 @@ std::vector<std::string> commandLine(std::string const& program,
     line.push_back(program);
     line.insert(line.end(), args.begin(), args.end());
     return line;
+}
+
+int runInChild(std::function<int()> const& body, unsigned seconds) {
+    std::fflush(stdout);
+    std::fflush(stderr);
+    pid_t const pid = ::fork();
+    if (pid < 0) {
+        return kChildFailed;
+    }
+    if (pid == 0) {
+        int result = 255;
+        try {
+            result = body();
+        } catch (...) {
+        }
+        ::_exit(result & 0xFF);
+    }
+    auto const deadline = std::chrono::steady_clock::now() + std::chrono::seconds(seconds);
+    int status = 0;
+    for (;;) {
+        pid_t const ended = ::waitpid(pid, &status, WNOHANG);
+        if (ended == pid) {
+            return WIFEXITED(status) ? WEXITSTATUS(status) : kChildFailed;
+        }
+        if (ended < 0 && errno != EINTR) {
+            return kChildFailed;
+        }
+        if (std::chrono::steady_clock::now() >= deadline) {
+            ::kill(pid, SIGKILL);
+            while (::waitpid(pid, &status, 0) < 0 && errno == EINTR) {
+            }
+            return kChildHung;
+        }
+        std::this_thread::sleep_for(std::chrono::milliseconds(10));
+    }
+}
+
+int runAsUnprivilegedUser(std::function<int()> const& body) {
+    return runInChild([&body] {
+        if (::geteuid() == 0) {
+            uid_t const nobody = 65534;
+            if (::setgroups(0, nullptr) != 0 || ::setgid(nobody) != 0 || ::setuid(nobody) != 0 ||
+                ::geteuid() == 0) {
+                return kNoUnprivilegedUser;
+            }
+        }
+        return body();
+    });
 }
 
 bool waitedOnFifo(std::string const& fifo, std::function<void()> const& work) {
